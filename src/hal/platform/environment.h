@@ -1,0 +1,9 @@
+#pragma once
+
+namespace ZV {
+
+/// Value of a variable of the process's environment, or null. Always null in a process that runs with
+/// privileges it was not started with, which so ignores every variable of the library.
+const char* GetLibraryVariable(const char* name);
+
+}  // namespace ZV

@@ -1,0 +1,34 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+namespace ZV {
+
+/// Error numbers of the system as the seam reports them, the same on every platform: those of the Windows
+/// system error table.
+inline constexpr std::uint32_t PlatformErrorNone = 0;
+inline constexpr std::uint32_t PlatformErrorFileNotFound = 2;
+inline constexpr std::uint32_t PlatformErrorAccessDenied = 5;
+inline constexpr std::uint32_t PlatformErrorInvalidHandle = 6;
+inline constexpr std::uint32_t PlatformErrorNotEnoughMemory = 8;
+inline constexpr std::uint32_t PlatformErrorBadLength = 24;
+inline constexpr std::uint32_t PlatformErrorGeneralFailure = 31;
+inline constexpr std::uint32_t PlatformErrorInvalidParameter = 87;
+inline constexpr std::uint32_t PlatformErrorInsufficientBuffer = 122;
+inline constexpr std::uint32_t PlatformErrorBusy = 170;
+inline constexpr std::uint32_t PlatformErrorNoMoreItems = 259;
+inline constexpr std::uint32_t PlatformErrorNotOwner = 288;
+inline constexpr std::uint32_t PlatformErrorOperationAborted = 995;
+inline constexpr std::uint32_t PlatformErrorIoPending = 997;
+inline constexpr std::uint32_t PlatformErrorDeviceNotConnected = 1167;
+inline constexpr std::uint32_t PlatformErrorNoSystemResources = 1450;
+
+/// Last error of the calling thread, set by every operation of the seam that fails.
+std::uint32_t GetLastPlatformError();
+void SetLastPlatformError(std::uint32_t error);
+
+/// The system's text for `error`, with whatever line end the system gives it; empty if it has none.
+std::string GetPlatformErrorText(std::uint32_t error);
+
+}  // namespace ZV

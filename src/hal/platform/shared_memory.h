@@ -1,0 +1,19 @@
+#pragma once
+
+#include <cstddef>
+
+namespace ZV {
+
+/// A block of memory that all processes of the machine see under one name, zeroed when it is new.
+struct SharedMemory;
+
+/// Opens or makes the block, read-write. Null when the system refuses.
+SharedMemory* OpenSharedMemory(const char* name, std::size_t bytes);
+
+/// The block in this process, for the life of `memory`.
+void* GetSharedMemoryAddress(SharedMemory* memory);
+
+/// Unmaps the block; null is ignored.
+void CloseSharedMemory(SharedMemory* memory);
+
+}  // namespace ZV
