@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <memory>
 #include <vector>
@@ -365,20 +366,13 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     std::uint32_t GetControlVersion() const;
     std::uint32_t GetConfigurationVersion() const;
 
-    // Gain conversions on the gain model; false for a failed conversion.
-    bool ConvertDacTodB(std::int64_t dac, std::int32_t* gaindB) const;
-    bool ConvertdBToDac(std::int32_t gaindB, std::int64_t* dac) const;
-    /// Rounds and clamps `normGain` in place.
-    bool ConvertNormTodB(std::uint32_t* normGain, std::int32_t* gaindB) const;
-    std::uint32_t ConvertdBToNorm(std::int32_t gaindB) const;
-
     HALCamera halCamera;
     bool shouldDeleteHALCamera = true;
     std::unique_ptr<Registers> registers;
     std::unique_ptr<Streaming> streaming;
-    std::unique_ptr<GainModel> gainModel;
+    GainModel gainModel;
     std::int32_t defaultGaindB = 0;
-    std::unique_ptr<char[]> serialText;  ///< 256 bytes, zeroed at construction.
+    std::array<char, 256> serialText{};
 
   private:
     CameraResult SetupCamera() override;
