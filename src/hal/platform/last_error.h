@@ -1,7 +1,7 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
-#include <string>
 
 namespace ZV {
 
@@ -28,7 +28,8 @@ inline constexpr std::uint32_t PlatformErrorNoSystemResources = 1450;
 std::uint32_t GetLastPlatformError();
 void SetLastPlatformError(std::uint32_t error);
 
-/// The system's text for `error`, with whatever line end the system gives it; empty if it has none.
-std::string GetPlatformErrorText(std::uint32_t error);
+/// Writes the system's text for `error`, with whatever line end the system gives it, to `text`, cut to
+/// `capacity` - 1 bytes and always terminated. False, and an empty text, if the system has none.
+bool GetPlatformErrorText(std::uint32_t error, char* text, std::size_t capacity);
 
 }  // namespace ZV
