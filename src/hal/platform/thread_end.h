@@ -1,0 +1,36 @@
+#pragma once
+
+#include <atomic>
+#include <condition_variable>
+#include <mutex>
+
+namespace ZV {
+
+/// How EndThread reaches a thread that waits for an overlapped request: the record of one thread,
+/// raised by another. Only the waits that register here are cut short.
+///
+/// Locks: `mutex` before the mutex of the wait. A wait stays registered while it is being woken, so
+/// what it waits on cannot go away under the waker.
+class ThreadEnd {
+  public:
+    /// Raises the flag for good and wakes the registered wait. Thread-safe.
+    void Request();
+
+    bool IsRequested() const { return isRequested.load(std::memory_order_relaxed); }
+
+    /// Registers the owner's wait on `condition` under `waitMutex`, which must not be held. The
+    /// wait's predicate must look at IsRequested.
+    void BeginWait(std::mutex* waitMutex, std::condition_variable* condition);
+    void EndWait();
+
+  private:
+    std::mutex mutex;
+    std::atomic<bool> isRequested{false};
+    std::mutex* waitMutex = nullptr;               // guarded by mutex
+    std::condition_variable* condition = nullptr;  // guarded by mutex
+};
+
+/// The record of the calling thread, or null for a thread that StartThread did not start.
+ThreadEnd* GetOwnThreadEnd();
+
+}  // namespace ZV
