@@ -55,6 +55,7 @@ ControlOutcome ControlDeviceOverlapped(PlatformDevice* device, const ControlRequ
 
 /// Waits for the end of the request of `overlapped`, at most `timeoutMs` milliseconds of the wait clock;
 /// `WaitForEver` has no limit. Returns at once when no request is under way, with the outcome of the last.
+/// A thread that is to end gets `Ended` from every such wait, also when its request is done.
 CompletionOutcome WaitForCompletion(PlatformDevice* device, PlatformOverlapped* overlapped,
                                     std::uint64_t timeoutMs);
 
@@ -70,7 +71,8 @@ bool IsOverlappedPending(const PlatformOverlapped* overlapped);
 /// Null when the system has none to give.
 PlatformOverlapped* MakeOverlapped();
 
-/// Requires: no request under way. Null is ignored.
+/// Requires: no request under way (a record that has one is left alone, not taken from under the driver).
+/// Null is ignored.
 void DestroyOverlapped(PlatformOverlapped* overlapped);
 
 }  // namespace ZV

@@ -13,7 +13,11 @@ namespace ZV {
 /// then not looked for.
 const KernelDriver* SelectSimulation(bool* isSelected);
 
-/// Ends the simulated bus, if there is one.
+/// What the last SelectSimulation answered, without a look at the variable: devices are opened where they
+/// were listed. Before the first it answers as if the variable were unset.
+const KernelDriver* GetSelectedSimulation(bool* isSelected);
+
+/// Ends the simulated bus, if there is one. What was selected before no longer is.
 void EndSimulation();
 
 }  // namespace ZV
