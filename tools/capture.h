@@ -1,0 +1,40 @@
+#pragma once
+
+#include <chrono>
+#include <string>
+#include <vector>
+
+#include "driver.h"
+#include "image_file.h"
+
+namespace ZentaraProgram {
+
+/// A frame record with a pixel buffer of its own.
+struct FrameBuffer {
+    std::vector<std::uint8_t> pixels;
+    Zentara_Frame frame{};
+
+    /// Room for `bytes`; the record is made anew.
+    void Prepare(std::size_t bytes);
+};
+
+/// What all images of one capture share, read from an open camera.
+struct CaptureFacts {
+    std::uint32_t imageBytes = 0;
+    Image prototype;
+    CameraSettings settings;
+};
+ZentaraResult ReadCaptureFacts(const Camera& camera, CaptureFacts* facts);
+
+/// True for a format with one sample a pixel, which the writers take.
+bool IsWritable(const Zentara_Frame& frame);
+
+/// The image of a delivered frame whose exposure began at `begin`. Takes the pixels out of
+/// `buffer`.
+Image MakeImage(const CaptureFacts& facts, const FrameBuffer& buffer,
+                std::chrono::system_clock::time_point begin);
+
+/// ISO 8601 in UTC with milliseconds and without a zone.
+std::string FormatUtc(std::chrono::system_clock::time_point time);
+
+}  // namespace ZentaraProgram

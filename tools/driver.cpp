@@ -1,0 +1,170 @@
+#include "driver.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+
+#include "output.h"
+
+#include <fmt/format.h>
+
+namespace ZentaraProgram {
+namespace {
+
+struct ResultText {
+    ZentaraResult result;
+    const char* text;
+};
+
+constexpr std::array ResultTexts{
+    ResultText{zerrNotSupported, "this camera does not support it"},
+    ResultText{zerrBadParameter, "a parameter is not valid"},
+    ResultText{zerrBadSettings, "the settings block is not valid"},
+    ResultText{zerrNotLoaded, "the library is not loaded"},
+    ResultText{zerrBadHandle, "the camera is not open"},
+    ResultText{zerrBadCameraId, "there is no camera of this number"},
+    ResultText{zerrCameraFault, "the camera failed"},
+    ResultText{zerrDriverFault, "the driver failed"},
+    ResultText{zerrBufferTooSmall, "the image does not fit its buffer"},
+    ResultText{zerrBusy, "the camera is at work"},
+    ResultText{zerrQueueFull, "the queue is full"},
+    ResultText{zerrFrameIncomplete, "the frame is incomplete"},
+    ResultText{zerrNotStreaming, "the camera is not streaming"},
+    ResultText{zerrOutOfSync, "the frame is out of sync"},
+    ResultText{zerrMissingData, "data of the frame are missing and were filled with black"},
+    ResultText{zerrUnplugged, "the camera was unplugged or turned off"},
+    ResultText{zerrCameraBusy, "the camera or its bus is busy"},
+};
+
+// Places of a settings block, in bytes: 32-bit words from 4, signed words from 192, 64-bit words
+// from 204.
+template <typename Value>
+Value ReadWord(const Zentara_Settings& settings, std::size_t offset) {
+    Value value{};
+    std::memcpy(&value, reinterpret_cast<const unsigned char*>(&settings) + offset, sizeof value);
+    return value;
+}
+
+std::uint32_t ReadWord32(const Zentara_Settings& settings, std::uint32_t key) {
+    return ReadWord<std::uint32_t>(settings, 4 + std::size_t{4} * key);
+}
+
+using TextFunction = ZentaraResult (*)(ZentaraHandle, char*, std::uint32_t);
+
+std::string ReadText(ZentaraHandle handle, TextFunction function) {
+    std::array<char, 512> text{};
+    if (function(handle, text.data(), text.size()) != zerrNone) return {};
+    return text.data();
+}
+
+}  // namespace
+
+std::string DescribeResult(ZentaraResult result) {
+    for (const ResultText& row : ResultTexts) {
+        if (row.result == result) return fmt::format("{} (code {})", row.text, result);
+    }
+    return fmt::format("the library failed (code {})", result);
+}
+
+ExitCode GetExitCode(ZentaraResult result) {
+    if (result == zerrCameraBusy) return ExitCameraBusy;
+    return result == zerrBadCameraId ? ExitNoCamera : ExitFailed;
+}
+
+Driver::Driver() : loadResult(Zentara_LoadDriver()) {}
+
+Driver::~Driver() {
+    Zentara_ReleaseDriver();
+}
+
+ZentaraResult Driver::List(std::vector<Zentara_CamListItem>* cameras) {
+    cameras->assign(64, Zentara_CamListItem{});
+    auto count = static_cast<std::uint32_t>(cameras->size());
+    const ZentaraResult result = Zentara_ListCameras(cameras->data(), &count);
+    cameras->resize(std::min<std::size_t>(count, cameras->size()));
+    return result;
+}
+
+Camera::~Camera() {
+    Close();
+}
+
+ZentaraResult Camera::Open(std::uint32_t cameraId) {
+    return Zentara_OpenCamera(cameraId, &handle);
+}
+
+void Camera::Close() {
+    if (handle != 0) (void)Zentara_CloseCamera(handle);  // Nothing is left to do about a failure.
+    handle = 0;
+}
+
+std::optional<std::uint32_t> Camera::GetInfo(std::uint32_t key) const {
+    std::uint32_t value = 0;
+    if (Zentara_GetInfo(handle, key, &value) != zerrNone) return std::nullopt;
+    return value;
+}
+
+std::string Camera::GetModelName() const {
+    return ReadText(handle, &Zentara_GetCameraModelString);
+}
+
+std::string Camera::GetSerialNumber() const {
+    return ReadText(handle, &Zentara_GetSerialString);
+}
+
+ZentaraResult ReadSettings(const Camera& camera, CameraSettings* settings) {
+    Zentara_Settings block{};
+    const ZentaraResult result = Zentara_ReadSettingsFromCam(camera.GetHandle(), &block);
+    if (result != zerrNone) return result;
+    settings->exposureNs = ReadWord<std::uint64_t>(block, 204);
+    settings->gain = ReadWord32(block, zprmGain);
+    settings->offset = ReadWord32(block, zprmOffset);
+    settings->binning = ReadWord32(block, zprmBinning);
+    settings->binningX = ReadWord32(block, zprmHorizontalBinning);
+    settings->binningY = ReadWord32(block, zprmVerticalBinning);
+    settings->roiX = ReadWord32(block, zprmRoiX);
+    settings->roiY = ReadWord32(block, zprmRoiY);
+    settings->roiWidth = ReadWord32(block, zprmRoiWidth);
+    settings->roiHeight = ReadWord32(block, zprmRoiHeight);
+    settings->coolingTargetCelsius = ReadWord<std::int32_t>(block, 200);
+    return zerrNone;
+}
+
+ExitCode OpenListedCamera(Driver& driver, std::uint32_t cameraId, Camera* camera,
+                          std::uint32_t* uniqueId) {
+    if (driver.GetLoadResult() != zerrNone) {
+        PrintError("the library cannot be loaded: " + DescribeResult(driver.GetLoadResult()));
+        return ExitFailed;
+    }
+    std::vector<Zentara_CamListItem> cameras;
+    const ZentaraResult listed = driver.List(&cameras);
+    if (cameraId >= cameras.size()) {
+        if (listed != zerrNone) {
+            PrintError("the cameras cannot be listed: " + DescribeResult(listed));
+            return GetExitCode(listed);
+        }
+        PrintError(
+            fmt::format("there is no camera {}; the list holds {}", cameraId, cameras.size()));
+        return ExitNoCamera;
+    }
+    *uniqueId = cameras[cameraId].uniqueId;
+    const ZentaraResult opened = camera->Open(cameraId);
+    if (opened == zerrNone) return ExitDone;
+    PrintError(fmt::format("camera {} cannot be opened: {}", cameraId, DescribeResult(opened)));
+    return ExitCameraBusy;
+}
+
+ExitCode JudgeFailure(Driver& driver, Camera& camera, std::uint32_t uniqueId,
+                      ZentaraResult result) {
+    camera.Close();
+    std::vector<Zentara_CamListItem> cameras;
+    (void)driver.List(&cameras);  // What can still be listed answers the question.
+    const bool isThere =
+        std::any_of(cameras.begin(), cameras.end(),
+                    [&](const Zentara_CamListItem& item) { return item.uniqueId == uniqueId; });
+    if (isThere) return GetExitCode(result);
+    PrintError("the camera is gone from the bus");
+    return ExitCameraGone;
+}
+
+}  // namespace ZentaraProgram

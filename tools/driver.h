@@ -1,0 +1,74 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "exit_codes.h"
+#include "zentara/zentara.h"
+
+namespace ZentaraProgram {
+
+/// Plain words for a result code of the library.
+std::string DescribeResult(ZentaraResult result);
+
+/// The exit code that a failed call stands for.
+ExitCode GetExitCode(ZentaraResult result);
+
+/// The loaded library, released at the end of its scope.
+class Driver {
+  public:
+    Driver();
+    ~Driver();
+    Driver(const Driver&) = delete;
+    Driver& operator=(const Driver&) = delete;
+
+    [[nodiscard]] ZentaraResult GetLoadResult() const { return loadResult; }
+
+    /// The cameras that nobody holds; those found before a failure are in `cameras` too.
+    ZentaraResult List(std::vector<Zentara_CamListItem>* cameras);
+
+  private:
+    ZentaraResult loadResult;
+};
+
+/// An open camera, closed at the end of its scope.
+class Camera {
+  public:
+    Camera() = default;
+    ~Camera();
+    Camera(const Camera&) = delete;
+    Camera& operator=(const Camera&) = delete;
+
+    ZentaraResult Open(std::uint32_t cameraId);
+    void Close();
+
+    [[nodiscard]] ZentaraHandle GetHandle() const { return handle; }
+    [[nodiscard]] std::optional<std::uint32_t> GetInfo(std::uint32_t key) const;
+    [[nodiscard]] std::string GetModelName() const;
+    [[nodiscard]] std::string GetSerialNumber() const;
+
+  private:
+    ZentaraHandle handle = 0;
+};
+
+/// Settings in force, read from the words of a block that Zentara_ReadSettingsFromCam has filled.
+struct CameraSettings {
+    std::uint64_t exposureNs = 0;
+    std::uint32_t gain = 0, offset = 0;
+    std::uint32_t binning = 1, binningX = 1, binningY = 1;
+    std::uint32_t roiX = 0, roiY = 0, roiWidth = 0, roiHeight = 0;
+    std::int32_t coolingTargetCelsius = 0;
+};
+ZentaraResult ReadSettings(const Camera& camera, CameraSettings* settings);
+
+/// Finds the camera `cameraId` in a new list and opens it; says on standard error why it cannot.
+/// `uniqueId` receives the low half of its unique id.
+ExitCode OpenListedCamera(Driver& driver, std::uint32_t cameraId, Camera* camera,
+                          std::uint32_t* uniqueId);
+
+/// The exit code after a failed capture: the camera is closed and looked for in a new list.
+ExitCode JudgeFailure(Driver& driver, Camera& camera, std::uint32_t uniqueId, ZentaraResult result);
+
+}  // namespace ZentaraProgram

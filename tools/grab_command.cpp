@@ -1,0 +1,139 @@
+#include <fmt/format.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <filesystem>
+#include <mutex>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <thread>
+
+#include "capture.h"
+#include "commands.h"
+#include "interrupt.h"
+#include "output.h"
+
+namespace ZentaraProgram {
+namespace {
+
+using Clock = std::chrono::steady_clock;
+constexpr std::chrono::milliseconds Poll{50};
+
+/// Ends a grab that gets no image, from a thread of its own: after the time-out or an interrupt it
+/// aborts again and again until the grab has come back, since an abort that comes before the wait
+/// is lost.
+class GrabWatch {
+  public:
+    GrabWatch(ZentaraHandle handle, double timeoutSeconds)
+        : camera(handle), limit(timeoutSeconds), thread([this] { Watch(); }) {}
+    ~GrabWatch() { Finish(); }
+    GrabWatch(const GrabWatch&) = delete;
+    GrabWatch& operator=(const GrabWatch&) = delete;
+
+    void Finish() {
+        {
+            const std::lock_guard lock(mutex);
+            isFinished = true;
+        }
+        changed.notify_all();
+        if (thread.joinable()) thread.join();
+    }
+    [[nodiscard]] bool HasAborted() const { return hasAborted; }
+
+  private:
+    void Watch() {
+        const Clock::time_point end =
+            Clock::now() + std::chrono::duration_cast<Clock::duration>(limit);
+        std::unique_lock lock(mutex);
+        while (!changed.wait_for(lock, Poll, [this] { return isFinished; })) {
+            if (Clock::now() < end && !IsInterrupted()) continue;
+            hasAborted = true;
+            lock.unlock();
+            (void)Zentara_Abort(camera);  // The grab's own result tells how it ended.
+            lock.lock();
+        }
+    }
+
+    ZentaraHandle camera;
+    std::chrono::duration<double> limit;
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool isFinished = false;
+    bool hasAborted = false;
+    std::thread thread;
+};
+
+void Report(const CommonOptions& common, const GrabOptions& options, const Image& image) {
+    if (common.asJson) {
+        const nlohmann::json report{{"file", options.output},
+                                    {"width", image.width},
+                                    {"height", image.height},
+                                    {"bits", image.bits},
+                                    {"exposureSeconds", image.exposureSeconds},
+                                    {"dateObs", image.dateObs},
+                                    {"frameNumber", image.frameNumber},
+                                    {"frameError", image.frameError},
+                                    {"model", image.model}};
+        Print(report.dump(2) + "\n");
+        return;
+    }
+    Print(fmt::format("{}: {} x {}, {} bits, {:g} s, {}\n", options.output, image.width,
+                      image.height, image.bits, image.exposureSeconds, image.model));
+}
+
+ExitCode SaveImage(const CommonOptions& common, const GrabOptions& options, const Image& image) {
+    const std::string reason = WriteImage(options.output, image);
+    if (!reason.empty()) {
+        PrintError(fmt::format("{} cannot be written: {}", options.output, reason));
+        return ExitFailed;
+    }
+    Report(common, options, image);
+    if (image.frameError == zerrNone) return ExitDone;
+    PrintError("the frame is damaged: " + DescribeResult(image.frameError));
+    return ExitDamaged;
+}
+
+ExitCode CheckOutput(const GrabOptions& options) {
+    if (GetImageKind(options.output) == ImageKind::Unknown) {
+        PrintError(
+            fmt::format("{}: the ending must be .fits, .tiff, .png or .raw", options.output));
+        return ExitWrongUse;
+    }
+    return ExitDone;
+}
+
+}  // namespace
+
+ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options) {
+    if (const ExitCode checked = CheckOutput(options); checked != ExitDone) return checked;
+    Driver driver;
+    Camera camera;
+    std::uint32_t uniqueId = 0;
+    const ExitCode opened = OpenListedCamera(driver, common.camera, &camera, &uniqueId);
+    if (opened != ExitDone) return opened;
+
+    CaptureFacts facts;
+    FrameBuffer buffer;
+    ZentaraResult result = ReadCaptureFacts(camera, &facts);
+    buffer.Prepare(facts.imageBytes);
+    const auto begin = std::chrono::system_clock::now();
+    bool hasAborted = false;
+    if (result == zerrNone) {
+        GrabWatch watch(camera.GetHandle(), options.timeoutSeconds);
+        result = Zentara_GrabFrame(camera.GetHandle(), &buffer.frame);
+        watch.Finish();
+        hasAborted = watch.HasAborted();
+    }
+    if (result == zerrNone) {
+        if (IsWritable(buffer.frame))
+            return SaveImage(common, options, MakeImage(facts, buffer, begin));
+        PrintError(fmt::format("images of format {} cannot be written", buffer.frame.format));
+        return ExitFailed;
+    }
+    if (IsInterrupted()) return ExitInterrupted;
+    PrintError(hasAborted ? fmt::format("no image came within {:g} s", options.timeoutSeconds)
+                          : "no image: " + DescribeResult(result));
+    return JudgeFailure(driver, camera, uniqueId, result);
+}
+
+}  // namespace ZentaraProgram

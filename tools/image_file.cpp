@@ -1,0 +1,78 @@
+#include "image_file.h"
+
+#include <algorithm>
+#include <array>
+#include <cctype>
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <filesystem>
+#include <string_view>
+#include <system_error>
+
+#include "image_writers.h"
+
+namespace ZentaraProgram {
+namespace {
+
+struct KindRow {
+    std::string_view ending;
+    ImageKind kind;
+    std::string (*write)(const std::string&, const Image&);
+};
+
+constexpr std::array Kinds{
+    KindRow{".fits", ImageKind::Fits, &WriteFits}, KindRow{".fit", ImageKind::Fits, &WriteFits},
+    KindRow{".fts", ImageKind::Fits, &WriteFits},  KindRow{".tiff", ImageKind::Tiff, &WriteTiff},
+    KindRow{".tif", ImageKind::Tiff, &WriteTiff},  KindRow{".png", ImageKind::Png, &WritePng},
+    KindRow{".raw", ImageKind::Raw, &WriteRaw},
+};
+
+const KindRow* FindKind(const std::string& path) {
+    std::string ending = std::filesystem::path(path).extension().string();
+    std::transform(ending.begin(), ending.end(), ending.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    const auto* row = std::find_if(Kinds.begin(), Kinds.end(),
+                                   [&](const KindRow& kind) { return kind.ending == ending; });
+    return row == Kinds.end() ? nullptr : row;
+}
+
+}  // namespace
+
+ImageKind GetImageKind(const std::string& path) {
+    const KindRow* row = FindKind(path);
+    return row == nullptr ? ImageKind::Unknown : row->kind;
+}
+
+std::string WriteImage(const std::string& path, const Image& image) {
+    const KindRow* row = FindKind(path);
+    if (row == nullptr) return "the ending of the name is none of .fits, .tiff, .png, .raw";
+    // The finished file takes its name in one step, so that nobody ever sees half of it.
+    const std::string unfinished = path + ".part";
+    std::error_code ignored;
+    std::filesystem::remove(unfinished, ignored);
+    std::string reason = row->write(unfinished, image);
+    if (reason.empty()) {
+        std::error_code renamed;
+        std::filesystem::rename(unfinished, path, renamed);
+        if (renamed) reason = renamed.message();
+    }
+    if (!reason.empty()) std::filesystem::remove(unfinished, ignored);
+    return reason;
+}
+
+std::string DescribeFileFailure() {
+    return errno != 0 ? std::generic_category().message(errno) : "the file cannot be written";
+}
+
+std::string WriteRaw(const std::string& path, const Image& image) {
+    errno = 0;
+    std::FILE* file = std::fopen(path.c_str(), "wb");
+    if (file == nullptr) return DescribeFileFailure();
+    const bool isWritten =
+        std::fwrite(image.pixels.data(), 1, image.pixels.size(), file) == image.pixels.size();
+    const bool isClosed = std::fclose(file) == 0;
+    return isWritten && isClosed ? std::string{} : DescribeFileFailure();
+}
+
+}  // namespace ZentaraProgram

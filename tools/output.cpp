@@ -1,0 +1,26 @@
+#include "output.h"
+
+namespace ZentaraProgram {
+namespace {
+
+std::FILE* output = nullptr;
+
+}  // namespace
+
+void SetOutput(std::FILE* stream) {
+    output = stream;
+}
+
+void Print(const std::string& text) {
+    (void)std::fputs(text.c_str(), output);  // A failure stays in the stream; FlushOutput tells.
+}
+
+void PrintError(const std::string& text) {
+    (void)std::fputs(("zentara: " + text + "\n").c_str(), stderr);  // There is no one else to tell.
+}
+
+bool FlushOutput() {
+    return std::fflush(output) == 0 && std::ferror(output) == 0;
+}
+
+}  // namespace ZentaraProgram

@@ -1,0 +1,314 @@
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <condition_variable>
+#include <deque>
+#include <filesystem>
+#include <memory>
+#include <mutex>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <vector>
+
+#include "capture.h"
+#include "commands.h"
+#include "interrupt.h"
+#include "output.h"
+#include "platform.h"
+
+namespace ZentaraProgram {
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using SystemTime = std::chrono::system_clock::time_point;
+constexpr std::chrono::milliseconds Poll{50};
+constexpr std::chrono::milliseconds ProgressStep{100};
+constexpr int BarWidth = 30;
+
+std::int64_t GetEpochNs() {
+    const auto sinceEpoch = std::chrono::system_clock::now().time_since_epoch();
+    return std::chrono::duration_cast<std::chrono::nanoseconds>(sinceEpoch).count();
+}
+
+/// Buffers that travel between the library and the program. The callbacks run on the library's
+/// threads and only move a pointer; files are written on the program's own.
+struct Slot {
+    FrameBuffer buffer;
+    std::atomic<std::int64_t> exposureEndNs{0};  ///< Since the epoch; set on the exposure thread.
+    class FrameRing* ring = nullptr;
+};
+
+class FrameRing {
+  public:
+    FrameRing(std::uint32_t count, std::size_t bytes) {
+        for (std::uint32_t i = 0; i < count; ++i) {
+            slots.push_back(std::make_unique<Slot>());
+            slots.back()->buffer.Prepare(bytes);
+            slots.back()->ring = this;
+        }
+    }
+
+    [[nodiscard]] const std::vector<std::unique_ptr<Slot>>& GetSlots() const { return slots; }
+
+    ZentaraResult Queue(ZentaraHandle camera, Slot* slot) {
+        return Zentara_QueueFrame(camera, &slot->buffer.frame, &OnEvent,
+                                  zcbFrameDone | zcbExposeDone,
+                                  reinterpret_cast<std::uintptr_t>(slot), 0);
+    }
+
+    /// The next delivered slot, or null when none comes within the time of one poll.
+    Slot* Take() {
+        std::unique_lock lock(mutex);
+        if (!arrived.wait_for(lock, Poll, [this] { return !done.empty(); })) return nullptr;
+        Slot* slot = done.front();
+        done.pop_front();
+        return slot;
+    }
+
+  private:
+    static void OnEvent(std::uint64_t userPrivate, std::uint32_t, std::uint32_t,
+                        std::uint32_t flags) {
+        auto* slot = reinterpret_cast<Slot*>(static_cast<std::uintptr_t>(userPrivate));
+        if (flags == zcbExposeDone) {
+            slot->exposureEndNs = GetEpochNs();
+            return;
+        }
+        const std::lock_guard lock(slot->ring->mutex);
+        slot->ring->done.push_back(slot);
+        slot->ring->arrived.notify_one();
+    }
+
+    std::vector<std::unique_ptr<Slot>> slots;
+    std::mutex mutex;
+    std::condition_variable arrived;
+    std::deque<Slot*> done;
+};
+
+struct StreamSums {
+    std::uint64_t frames = 0, bytes = 0, damaged = 0, gaps = 0, drops = 0, files = 0;
+    std::uint32_t lastNumber = 0;
+    double seconds = 0;
+
+    void Count(const Zentara_Frame& frame) {
+        if (frames > 0) {
+            const auto missing = static_cast<std::uint16_t>(frame.frameNumber - lastNumber - 1);
+            if (missing != 0) ++gaps;
+            drops += missing;
+        }
+        lastNumber = frame.frameNumber;
+        ++frames;
+        bytes += frame.size;
+        if (frame.errorCode != zerrNone) ++damaged;
+    }
+    [[nodiscard]] double GetRate() const {
+        return seconds > 0 ? static_cast<double>(frames) / seconds : 0;
+    }
+    [[nodiscard]] double GetMegabytesPerSecond() const {
+        return seconds > 0 ? static_cast<double>(bytes) / seconds / 1e6 : 0;
+    }
+};
+
+/// A line on standard error that is written over and over.
+class ProgressLine {
+  public:
+    explicit ProgressLine(const StreamOptions& streamOptions)
+        : options(streamOptions), isOn(!streamOptions.isQuiet && IsTerminal(stderr)) {}
+
+    void Show(const StreamSums& sums, bool isLast) {
+        const Clock::time_point now = Clock::now();
+        if (!isOn || (!isLast && now < next)) return;
+        next = now + ProgressStep;
+        const std::string line =
+            fmt::format("\r{} {} frames  {:.1f} /s  {:.1f} MB/s  gaps {}  drops {}  damaged {}  ",
+                        GetBar(sums), sums.frames, sums.GetRate(), sums.GetMegabytesPerSecond(),
+                        sums.gaps, sums.drops, sums.damaged);
+        (void)std::fputs((line + (isLast ? "\n" : "")).c_str(),
+                         stderr);  // A picture of progress only.
+    }
+
+  private:
+    [[nodiscard]] std::string GetBar(const StreamSums& sums) const {
+        double share = 0;
+        if (options.count > 0)
+            share = static_cast<double>(sums.frames) / static_cast<double>(options.count);
+        if (options.durationSeconds > 0)
+            share = std::max(share, sums.seconds / options.durationSeconds);
+        const int full = static_cast<int>(std::min(1.0, share) * BarWidth);
+        return fmt::format("[{:=<{}}{: <{}}]", "", full, "", BarWidth - full);
+    }
+
+    const StreamOptions& options;
+    bool isOn;
+    Clock::time_point next{};
+};
+
+std::string GetNumberedName(const std::string& output, std::uint64_t number) {
+    const std::filesystem::path path(output);
+    const std::filesystem::path name =
+        fmt::format("{}-{:06}{}", path.stem().string(), number, path.extension().string());
+    return (path.parent_path() / name).string();
+}
+
+class Stream {
+  public:
+    Stream(const Camera& openCamera, const CaptureFacts& captureFacts,
+           const StreamOptions& streamOptions)
+        : camera(openCamera.GetHandle()),
+          facts(captureFacts),
+          options(streamOptions),
+          ring(std::max(1U, streamOptions.buffers), captureFacts.imageBytes),
+          progress(streamOptions) {}
+
+    ~Stream() { Stop(); }
+    Stream(const Stream&) = delete;
+    Stream& operator=(const Stream&) = delete;
+
+    /// Runs to its end; `result` receives the code of a call that failed.
+    ExitCode Run(ZentaraResult* result) {
+        for (const auto& slot : ring.GetSlots()) {
+            if (*result == zerrNone) *result = ring.Queue(camera, slot.get());
+        }
+        if (*result == zerrNone) *result = Zentara_SetStreaming(camera, 1);
+        const Clock::time_point begin = Clock::now();
+        ExitCode code = *result == zerrNone ? ExitDone : ExitFailed;
+        Clock::time_point lastFrame = begin;
+        while (code == ExitDone && !IsFinished()) {
+            Slot* slot = ring.Take();
+            sums.seconds = std::chrono::duration<double>(Clock::now() - begin).count();
+            if (IsInterrupted()) {
+                code = ExitInterrupted;
+            } else if (slot != nullptr) {
+                lastFrame = Clock::now();
+                code = Serve(slot, result);
+            } else if (std::chrono::duration<double>(Clock::now() - lastFrame).count() >
+                       options.timeoutSeconds) {
+                PrintError(fmt::format("no frame came within {:g} s", options.timeoutSeconds));
+                code = ExitFailed;
+            }
+            progress.Show(sums, false);
+        }
+        Stop();
+        progress.Show(sums, true);
+        return code;
+    }
+
+    [[nodiscard]] const StreamSums& GetSums() const { return sums; }
+
+  private:
+    [[nodiscard]] bool IsFinished() const {
+        return (options.count > 0 && sums.frames >= options.count) ||
+               (options.durationSeconds > 0 && sums.seconds >= options.durationSeconds);
+    }
+
+    ExitCode Serve(Slot* slot, ZentaraResult* result) {
+        sums.Count(slot->buffer.frame);
+        if (!options.output.empty()) {
+            const ExitCode written = Write(*slot);
+            if (written != ExitDone) return written;
+        }
+        *result = ring.Queue(camera, slot);
+        return *result == zerrNone ? ExitDone : ExitFailed;
+    }
+
+    ExitCode Write(const Slot& slot) {
+        if (!IsWritable(slot.buffer.frame)) {
+            PrintError(
+                fmt::format("images of format {} cannot be written", slot.buffer.frame.format));
+            return ExitFailed;
+        }
+        const std::chrono::nanoseconds begin(slot.exposureEndNs.load() -
+                                             static_cast<std::int64_t>(facts.settings.exposureNs));
+        const std::string name = GetNumberedName(options.output, sums.frames);
+        const std::string reason = WriteImage(
+            name, MakeImage(facts, slot.buffer,
+                            SystemTime(std::chrono::duration_cast<SystemTime::duration>(begin))));
+        if (reason.empty()) {
+            ++sums.files;
+            return ExitDone;
+        }
+        PrintError(fmt::format("{} cannot be written: {}", name, reason));
+        return ExitFailed;
+    }
+
+    /// The buffers are the program's again once the abort has come back.
+    void Stop() {
+        if (isStopped) return;
+        isStopped = true;
+        (void)Zentara_SetStreaming(
+            camera, 0);  // A camera that is gone cannot be stopped; the rest goes on.
+        (void)Zentara_Abort(camera);
+    }
+
+    ZentaraHandle camera;
+    const CaptureFacts& facts;
+    const StreamOptions& options;
+    FrameRing ring;
+    ProgressLine progress;
+    StreamSums sums;
+    bool isStopped = false;
+};
+
+void Report(const CommonOptions& common, const StreamSums& sums) {
+    if (common.asJson) {
+        const nlohmann::json report{{"frames", sums.frames},
+                                    {"seconds", sums.seconds},
+                                    {"framesPerSecond", sums.GetRate()},
+                                    {"megabytesPerSecond", sums.GetMegabytesPerSecond()},
+                                    {"gaps", sums.gaps},
+                                    {"drops", sums.drops},
+                                    {"damaged", sums.damaged},
+                                    {"files", sums.files}};
+        Print(report.dump(2) + "\n");
+        return;
+    }
+    Print(fmt::format(
+        "{} frames in {:.2f} s: {:.1f} frames/s, {:.1f} MB/s; {} gaps, {} drops, {} damaged\n",
+        sums.frames, sums.seconds, sums.GetRate(), sums.GetMegabytesPerSecond(), sums.gaps,
+        sums.drops, sums.damaged));
+    if (sums.files > 0) Print(fmt::format("{} files written\n", sums.files));
+}
+
+ExitCode CheckOptions(const StreamOptions& options) {
+    if (!options.output.empty() && GetImageKind(options.output) == ImageKind::Unknown) {
+        PrintError(
+            fmt::format("{}: the ending must be .fits, .tiff, .png or .raw", options.output));
+        return ExitWrongUse;
+    }
+    if (options.count == 0 && options.durationSeconds <= 0) {
+        PrintError("a stream needs --count or --duration");
+        return ExitWrongUse;
+    }
+    return ExitDone;
+}
+
+}  // namespace
+
+ExitCode RunStream(const CommonOptions& common, const StreamOptions& options) {
+    if (const ExitCode checked = CheckOptions(options); checked != ExitDone) return checked;
+    Driver driver;
+    Camera camera;
+    std::uint32_t uniqueId = 0;
+    const ExitCode opened = OpenListedCamera(driver, common.camera, &camera, &uniqueId);
+    if (opened != ExitDone) return opened;
+
+    CaptureFacts facts;
+    ZentaraResult result = ReadCaptureFacts(camera, &facts);
+    if (result != zerrNone) {
+        PrintError("the camera cannot be read: " + DescribeResult(result));
+        return JudgeFailure(driver, camera, uniqueId, result);
+    }
+    Stream stream(camera, facts, options);
+    const ExitCode code = stream.Run(&result);
+    Report(common, stream.GetSums());
+    if (code == ExitFailed) {
+        if (result != zerrNone) PrintError("the stream ended: " + DescribeResult(result));
+        return JudgeFailure(driver, camera, uniqueId,
+                            result == zerrNone ? ZentaraResult{zerrDriverFault} : result);
+    }
+    if (code != ExitDone) return code;
+    return stream.GetSums().damaged > 0 || stream.GetSums().drops > 0 ? ExitDamaged : ExitDone;
+}
+
+}  // namespace ZentaraProgram
