@@ -1,0 +1,77 @@
+#include "imaging/ex_image.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+
+namespace ZV {
+
+ZExImage::ZExImage(std::uint8_t* newImageData, std::uint32_t newImageSize, std::uint32_t newWidth,
+                   std::uint32_t newHeight, std::uint16_t newBitDepth, std::uint64_t newExposure,
+                   double newGain, ZImageFormatEnum newImageFormat,
+                   ZCameraImageFormatEnum newCameraImageFormat, ZColourPatternEnum newColourPattern,
+                   std::uint16_t newRGBFilterStartColour, bool newIsBigEndian,
+                   std::uint16_t newCameraModel, std::uint16_t newCameraNumber,
+                   std::uint16_t newSymmetricalBinningMode, bool newIsRTV,
+                   std::uint16_t newRollingFrameNumber, std::uint16_t newErrorCode, void* newCamera,
+                   bool newOwnsBuffer)
+    : imageData(newImageData),
+      imageSize(newImageSize),
+      width(newWidth),
+      height(newHeight),
+      bitDepth(newBitDepth),
+      exposure(newExposure),
+      gain(newGain),
+      imageFormat(newImageFormat),
+      cameraImageFormat(newCameraImageFormat),
+      colourPattern(newColourPattern),
+      rgbFilterStartColour(newRGBFilterStartColour),
+      isBigEndian(newIsBigEndian),
+      cameraModel(newCameraModel),
+      cameraNumber(newCameraNumber),
+      symmetricalBinningMode(newSymmetricalBinningMode),
+      isRTV(newIsRTV),
+      rollingFrameNumber(newRollingFrameNumber),
+      errorCode(newErrorCode),
+      camera(newCamera),
+      bufferBytes(newImageData != nullptr ? newImageSize : 0) {
+    if (newOwnsBuffer && newImageData != nullptr) ownedBuffer.reset(newImageData, std::free);
+}
+
+ZExImage::~ZExImage() = default;
+
+void ZExImage::ReplaceImageBufferWith(const std::uint8_t* data, std::uint32_t size) {
+    // Kept: an equal size copies nothing, so a client that replaces pixels one for one keeps the
+    // old ones.
+    if (size == imageSize) return;
+    if (data == nullptr && size != 0) return;
+    (void)TakeNewBuffer(data, size, size);  // Without memory the image stays as it was.
+}
+
+void ZExImage::ResizeBuffer(std::uint32_t size) {
+    if (size == imageSize) return;
+    const std::uint32_t keptBytes = std::min({imageSize, bufferBytes, size});
+    (void)TakeNewBuffer(imageData, keptBytes, size);  // Without memory the image stays as it was.
+}
+
+std::uint32_t ZExImage::ImageFormatByteSize(std::uint32_t format) {
+    return GetThreeColourPixelBytes(format);
+}
+
+// The old block is let go only after the copy: `data` may lie in it. Whoever shares it keeps it.
+bool ZExImage::TakeNewBuffer(const std::uint8_t* data, std::uint32_t dataBytes,
+                             std::uint32_t size) {
+    std::uint8_t* block = nullptr;
+    if (size != 0) {
+        block = static_cast<std::uint8_t*>(std::calloc(size, 1));
+        if (block == nullptr) return false;
+        if (dataBytes != 0) std::memcpy(block, data, dataBytes);
+    }
+    ownedBuffer.reset(block, std::free);
+    imageData = block;
+    imageSize = size;
+    bufferBytes = size;
+    return true;
+}
+
+}  // namespace ZV
