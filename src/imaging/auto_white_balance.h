@@ -1,0 +1,64 @@
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstdint>
+
+#include "imaging/image_filter.h"
+#include "zentara/zentara.h"
+
+namespace ZV {
+
+/// Scales the colours of an image by tables. `Process` declines until it is built.
+class ZENTARA_API ZAutoWhiteBalance : public ZImageFilter {
+  public:
+    static constexpr std::size_t Levels8 = 256;
+    static constexpr std::size_t Levels16 = 65536;
+
+    /// What each level of a colour becomes. Entry i is i times the scale in single precision, cut
+    /// at the top level and truncated; a product that is no number gives the top level.
+    struct ScaleTable {
+        std::atomic<float> scale;
+        std::array<std::int32_t, Levels8> levels8;
+        std::array<std::int32_t, Levels16> levels16;
+    };
+
+    explicit ZAutoWhiteBalance(bool calculateValuesOnAllFrames);
+    ~ZAutoWhiteBalance() override;
+
+    FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
+    /// Does nothing. `FilterDone`.
+    FilterResult Init(std::uint32_t width, std::uint32_t height) override;
+    /// Does nothing. `FilterDone`.
+    FilterResult SetOutputFormat(std::uint32_t format) override;
+
+    /// Last measured means, 128 before the first measurement.
+    std::uint32_t GetRedMean() const { return redMean; }
+    std::uint32_t GetGreenMean() const { return greenMean; }
+    std::uint32_t GetBlueMean() const { return blueMean; }
+
+    float GetRedScale() const;
+    float GetGreenScale() const;
+    float GetBlueScale() const;
+    /// Each builds both tables of its colour anew.
+    void SetRedScale(float scale);
+    void SetGreenScale(float scale);
+    void SetBlueScale(float scale);
+    /// Kept without an effect.
+    void SetCalculateValuesOnAllFrames(bool on);
+
+    const ScaleTable& GetRedTable() const { return red; }
+    const ScaleTable& GetGreenTable() const { return green; }
+    const ScaleTable& GetBlueTable() const { return blue; }
+
+  private:
+    std::uint32_t redMean = 128;
+    std::uint32_t greenMean = 128;
+    std::uint32_t blueMean = 128;
+    std::atomic<bool> calculateValuesOnAllFrames;
+    ScaleTable red;
+    ScaleTable green;
+    ScaleTable blue;
+};
+
+}  // namespace ZV
