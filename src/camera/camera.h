@@ -4,11 +4,13 @@
 #include <vector>
 
 #include "camera/camera_result.h"
+#include "camera/relaxed.h"
 #include "imaging/object.h"
 #include "zentara/zentara.h"
 
 namespace ZV {
 
+struct HALCamera;
 class ZBayerInterpolation;
 class ZExImage;
 class ZFolaryRatioCorrection;
@@ -29,6 +31,9 @@ using ExposeDoneCallback = void* (*)(void* refCon);
 class ZENTARA_API ZCamera : public ZObject {
   public:
     ZCamera();
+    /// A copy owns nothing: no pipelines, no filters. Only the reference is copied.
+    ZCamera(const ZCamera& other);
+    ZCamera& operator=(const ZCamera& other);
     virtual ~ZCamera();
 
     /// Opens the bus layer and sets the flag; CameraAlreadyInitialized when it is set.
@@ -41,13 +46,18 @@ class ZENTARA_API ZCamera : public ZObject {
     /// Appends an object for each camera of the bus that nobody holds, read and set up, closed.
     /// Stops at the first failure; what was appended stays.
     static CameraResult GetCameraList(std::vector<ZCamera*>& cameras);
-    /// Empties the vector, deletes nothing.
+    /// Empties the vector, deletes nothing. The cameras are retired: DeleteRetiredCameras has them.
     static CameraResult EraseCameraList(std::vector<ZCamera*>& cameras);
     /// Closes and deletes cameras from the front, up to the first open one.
     static CameraResult EraseClosedCamerasFromList(std::vector<ZCamera*>& cameras);
     /// Closes and deletes all, failures ignored.
     static CameraResult FreeCameraList(std::vector<ZCamera*>& cameras);
     static void FreeImage(ZExImage* image);
+    /// Closes (failures ignored) and deletes what EraseCameraList and listings that failed have
+    /// left. The client's handles to those cameras end here.
+    static void DeleteRetiredCameras();
+    /// True while `camera` is the address of a camera object; any value may be asked.
+    static bool IsLivingCamera(const ZCamera* camera);
 
     static bool GetShouldOutputReads();
     static bool GetShouldOutputWrites();
@@ -333,13 +343,39 @@ class ZENTARA_API ZCamera : public ZObject {
     virtual std::uint16_t GetTagCode() = 0;
 
   protected:
-    void* refCon = nullptr;
-    ZImagePipeline* imagePipeline;
-    ZImagePipeline* bayerPipeline;
-    ZBayerInterpolation* bayerFilter;
-    ZFolaryRatioCorrection* ratioCorrection;
-    bool isOpen = false;
-    bool exclusiveAccess = false;
+    /// Takes this camera into the list of those that are open in this process, or out of it: the
+    /// first whose GetUniqueID equals this one's. Thread-safe.
+    CameraResult AddToConnectedCameras();
+    void RemoveFromConnectedCameras();
+
+    Relaxed<void*> refCon{nullptr};
+    ZImagePipeline* imagePipeline = nullptr;
+    ZImagePipeline* bayerPipeline = nullptr;
+    ZBayerInterpolation* bayerFilter = nullptr;
+    ZFolaryRatioCorrection* ratioCorrection = nullptr;
+    Relaxed<bool> isOpen{false};
+    Relaxed<bool> exclusiveAccess{false};
+
+    /// Null until a camera has been opened; guarded, like the number, by a leaf mutex.
+    static std::vector<ZCamera*>* m_connectedCameras;
+    static Relaxed<std::uint16_t> m_numOfConnectedCameras;
+    static Relaxed<bool> m_isToolboxInitialized;
+    static Relaxed<bool> m_shouldOutputReads;
+    static Relaxed<bool> m_shouldOutputWrites;
+
+  private:
+    static CameraResult ListCamera(HALCamera& record, ZCamera** listed);
+    static CameraResult ReadListedCamera(ZCamera& camera, bool* isOtherModel);
+    static CameraResult SetUpListedCamera(ZCamera& camera);
+    /// Ends what the close of a camera has left, then deletes it.
+    static void DeleteCamera(ZCamera* camera);
+    static void RetireCamera(ZCamera* camera);
+    void JoinLivingCameras();
+    void LeaveLivingCameras();
+
+    ZCamera* nextLiving = nullptr;  // guarded by a leaf mutex, like the other two
+    ZCamera* previousLiving = nullptr;
+    bool isRetired = false;
 };
 
 }  // namespace ZV

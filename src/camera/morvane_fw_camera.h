@@ -2,17 +2,17 @@
 
 #include <array>
 #include <cstdint>
-#include <memory>
+#include <mutex>
 #include <vector>
 
 #include "camera/camera.h"
 #include "camera/gain_model.h"
+#include "camera/register_block.h"
 #include "camera/register_map.h"
+#include "camera/streaming_state.h"
 #include "hal/hal.h"
 
 namespace ZV {
-
-struct tStFrameInfo;
 
 /// The concrete camera: register model, imaging settings, gain, bandwidth and streaming over the
 /// HAL. Models override what they do differently.
@@ -26,7 +26,10 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     static constexpr std::uint32_t m_asyncWriteAddressLow = 0xFA000000;
     static constexpr std::uint32_t m_asyncWriteAddressLength = 4;
 
-    explicit MorvaneFWCamera(HALCamera halCamera);
+    explicit MorvaneFWCamera(HALCamera newRecord);
+    /// A copy owns nothing: no device, no registers, no threads. It serves for nothing else.
+    MorvaneFWCamera(const MorvaneFWCamera& other);
+    MorvaneFWCamera& operator=(const MorvaneFWCamera& other);
     ~MorvaneFWCamera() override;
 
     // Lifetime.
@@ -326,10 +329,12 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     // Register model.
     static std::uint32_t CalculateRegisterLength(const regVersionEntry* table,
                                                  std::uint32_t version);
-    CameraResult ReadRegisterSet(std::uint32_t address, const regVersionEntry* table,
-                                 std::uint32_t* version, std::uint32_t** registerCopy);
-    CameraResult SetupControlRegisters(std::uint32_t address, const regVersionEntry* table,
-                                       std::uint32_t* version, std::uint32_t** registerCopy);
+    /// Reads a block's version at its address and then as many quadlets as its table has for this
+    /// version; none for a version that the table does not know.
+    CameraResult ReadRegisterSet(RegisterBlock& block);
+    /// Makes the control copy anew from zeros and drives the camera to its default state.
+    CameraResult SetupControlRegisters(RegisterBlock& block);
+    /// Tests the configuration version that ReadCameraInfo met, not one read again later.
     bool CheckConfigRegVersion(std::uint32_t major, std::uint32_t minor);
     static bool CheckVersionAtLeast(std::uint32_t aMajor, std::uint32_t aMinor,
                                     std::uint32_t bMajor, std::uint32_t bMinor);
@@ -344,32 +349,46 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void PrivateImageStreamingRunLoop();
     void PrivateRunExposeDoneCB();
 
-  protected:
-    struct Registers;
-    struct Streaming;
+    /// Ends what a close has left: wakes and joins the threads, lets the device go without a
+    /// request. To be called before the object is deleted; waits for a client's callback to return.
+    void EndWhatCloseLeft();
 
+  protected:
     // Access to the host copies. A quadlet beyond a block's length reads 0. Fields: register_map.h.
     std::uint32_t ReadConfiguration(std::uint32_t quadlet) const;
+    /// 0 below the version from which the field exists (by CheckConfigRegVersion).
     std::uint32_t ReadConfigurationField(const RegisterField& field) const;
     std::uint32_t ReadControl(std::uint32_t quadlet) const;
     std::uint32_t ReadControlField(const RegisterField& field) const;
     /// Changes the shadow alone; a quadlet beyond the block leaves it as it is.
     void StoreControl(std::uint32_t quadlet, std::uint32_t value);
+    /// Writes one quadlet of the control block to the camera and leaves the shadow alone. Failures
+    /// print HAL_ErrorMessage and are translated.
+    CameraResult SendControl(std::uint32_t quadlet, std::uint32_t value);
     /// Changes the shadow and writes that quadlet to the camera; a quadlet beyond the block is
-    /// written with `value` while the shadow stays. Failures print HAL_ErrorMessage and are
-    /// translated.
+    /// written with `value` while the shadow stays. Failures as SendControl; the shadow is not
+    /// rolled back.
     CameraResult WriteControl(std::uint32_t quadlet, std::uint32_t value);
     CameraResult WriteControlField(const RegisterField& field, std::uint32_t value);
-    /// Writes one quadlet of the command block.
+    /// Writes one quadlet of the command block; prints nothing.
     HALStatus WriteCommand(std::uint32_t quadlet, std::uint32_t value);
-    /// Version words, the major number in the upper half.
-    std::uint32_t GetControlVersion() const;
-    std::uint32_t GetConfigurationVersion() const;
+    /// Version words as last read, the major number in the upper half.
+    std::uint32_t GetControlVersion() const { return registers.control.version; }
+    std::uint32_t GetConfigurationVersion() const { return registers.configuration.version; }
 
-    HALCamera halCamera;
-    bool shouldDeleteHALCamera = true;
-    std::unique_ptr<Registers> registers;
-    std::unique_ptr<Streaming> streaming;
+    /// The device record is copied whole for each HAL call; what a call changed (connect,
+    /// disconnect, reallocation) is stored back whole. Thread-safe.
+    HALCamera GetHALCamera() const;
+    void SetHALCamera(const HALCamera& newRecord);
+
+    /// Takes or gives a lock; a failure prints HAL_ErrorMessage and is translated.
+    static CameraResult TakeLock(HALSemaphore* lock);
+    static CameraResult GiveLock(HALSemaphore* lock);
+    /// Marks every frame of the queue, so that the run loop discards it. Under frameLock.
+    void IgnoreFrameInfoVector();
+
+    CameraRegisters registers;
+    StreamingState streaming;
     GainModel gainModel;
     std::int32_t defaultGaindB = 0;
     std::array<char, 256> serialText{};
@@ -379,6 +398,10 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     bool IsInterlaced() override;
     std::uint16_t GetMaxPacketSize() override;
     std::uint16_t GetTagCode() override;
+
+    mutable std::mutex recordMutex;
+    HALCamera halCamera;  ///< Guarded by recordMutex, but for `index`, which stays.
+    bool shouldDeleteHALCamera = true;
 };
 
 }  // namespace ZV
