@@ -22,18 +22,18 @@ struct OutgoingFrame {
     std::uint8_t sampleBits = 7;  ///< 7 or less for samples of a byte, above for two; a nibble.
 };
 
-/// Cuts frames into isochronous payloads of at most the reserved bytes, in the layout of a streaming
-/// version (hal/stream_format.h). One object lives as long as a stream: version 0 counts its blocks
-/// across frames.
+/// Cuts frames into isochronous payloads of at most the reserved bytes, in the layout of a
+/// streaming version (hal/stream_format.h). One object lives as long as a stream: version 0 counts
+/// its blocks across frames.
 ///
 /// Each field begins with a first packet of its own, its offsets start at 0 again. A version 0
 /// payload holds one whole source packet, so that a lost payload is one hole of whole source
 /// packets.
 class PacketStream {
   public:
-    /// `streamingVersion` 0, 1 or 2; any other is sent in the layout of 1 and 2. `payloadBytes` of the
-    /// channel's reservation; below PayloadBytesMin nothing can be sent and each frame is finished
-    /// at once.
+    /// `streamingVersion` 0, 1 or 2; any other is sent in the layout of 1 and 2. `reservedBytes`
+    /// of payload are what the channel's reservation holds; below PayloadBytesMin nothing can be
+    /// sent and each frame is finished at once.
     PacketStream(std::uint32_t streamingVersion, std::uint32_t reservedBytes);
 
     /// Room for a frame header, its marks and four bytes of image.
@@ -44,8 +44,8 @@ class PacketStream {
 
     [[nodiscard]] bool IsFinished() const { return !isActive; }
 
-    /// Writes the next payload of the frame to `payload` (room for the reserved bytes) and returns its
-    /// length; 0 when the frame is finished.
+    /// Writes the next payload of the frame to `payload` (room for the reserved bytes) and returns
+    /// its length; 0 when the frame is finished.
     std::uint32_t Next(std::uint8_t* payload);
 
     /// Writes the payload of an idle cycle: the ignore bit set (versions 1 and 2), headers alone
