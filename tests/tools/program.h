@@ -1,0 +1,63 @@
+#pragma once
+
+#include <chrono>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+/// The zentara program as a child process.
+namespace ZentaraTest {
+
+struct ProgramResult {
+    int exitCode = -1;
+    std::string output;  ///< Standard output.
+    std::string errors;  ///< Standard error.
+};
+
+/// A folder of its own for one test, removed with what is in it.
+class TemporaryFolder {
+  public:
+    TemporaryFolder();
+    ~TemporaryFolder();
+    TemporaryFolder(const TemporaryFolder&) = delete;
+    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+
+    [[nodiscard]] std::string GetPath(const std::string& name) const {
+        return (folder / name).string();
+    }
+    /// Names of the files in it, sorted.
+    [[nodiscard]] std::vector<std::string> ListFiles() const;
+
+  private:
+    std::filesystem::path folder;
+};
+
+/// A run that goes on beside the test.
+class RunningProgram {
+  public:
+    explicit RunningProgram(const std::vector<std::string>& arguments,
+                            const std::vector<std::string>& variables = {});
+    ~RunningProgram();
+    RunningProgram(const RunningProgram&) = delete;
+    RunningProgram& operator=(const RunningProgram&) = delete;
+
+    void Send(int signal) const;
+    /// Waits for the end, at most `limit`; a run that takes longer is killed and has the exit code
+    /// -1.
+    ProgramResult Wait(std::chrono::seconds limit = std::chrono::seconds(60));
+
+  private:
+    TemporaryFolder folder;
+    int process = -1;
+};
+
+ProgramResult RunProgram(const std::vector<std::string>& arguments,
+                         const std::vector<std::string>& variables = {});
+
+/// Runs a tool of the system by its name and arguments.
+ProgramResult RunTool(const std::vector<std::string>& commandLine);
+
+std::string ReadFile(const std::string& path);
+void WriteFile(const std::string& path, const std::string& text);
+
+}  // namespace ZentaraTest

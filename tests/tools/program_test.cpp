@@ -1,0 +1,324 @@
+#include "tools/program.h"
+
+#include <fitsio.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <png.h>
+#include <signal.h>
+#include <tiffio.h>
+
+#include <array>
+#include <nlohmann/json.hpp>
+
+#include "support/wait_until.h"
+
+namespace ZentaraTest {
+namespace {
+
+using nlohmann::json;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+
+std::string ReadFitsText(fitsfile* file, const char* key) {
+    std::array<char, FLEN_VALUE> value{};
+    int status = 0;
+    fits_read_key_str(file, key, value.data(), nullptr, &status);
+    EXPECT_EQ(0, status) << key;
+    return value.data();
+}
+
+double ReadFitsNumber(fitsfile* file, const char* key) {
+    double value = -1;
+    int status = 0;
+    fits_read_key_dbl(file, key, &value, nullptr, &status);
+    EXPECT_EQ(0, status) << key;
+    return value;
+}
+
+/// A FITS file opened for reading; null when it cannot be opened.
+class FitsFile {
+  public:
+    explicit FitsFile(const std::string& path) {
+        int status = 0;
+        fits_open_diskfile(&file, path.c_str(), READONLY, &status);
+        EXPECT_EQ(0, status) << path;
+    }
+    ~FitsFile() {
+        int status = 0;
+        if (file != nullptr) fits_close_file(file, &status);
+    }
+    FitsFile(const FitsFile&) = delete;
+    FitsFile& operator=(const FitsFile&) = delete;
+
+    [[nodiscard]] fitsfile* Get() const { return file; }
+
+    [[nodiscard]] std::vector<std::uint16_t> ReadPixels() const {
+        std::array<LONGLONG, 2> size{};
+        int status = 0;
+        fits_get_img_sizell(file, 2, size.data(), &status);
+        std::vector<std::uint16_t> pixels(static_cast<std::size_t>(size[0] * size[1]));
+        fits_read_img(file, TUSHORT, 1, size[0] * size[1], nullptr, pixels.data(), nullptr,
+                      &status);
+        EXPECT_EQ(0, status);
+        return pixels;
+    }
+
+  private:
+    fitsfile* file = nullptr;
+};
+
+TEST(Program, HelpIsPrintedOnStandardOutputAndSucceeds) {
+    for (const std::vector<std::string>& arguments : {std::vector<std::string>{"--help"},
+                                                      {"list", "--help"},
+                                                      {"info", "--help"},
+                                                      {"grab", "--help"},
+                                                      {"stream", "--help"}}) {
+        const ProgramResult result = RunProgram(arguments);
+
+        EXPECT_EQ(0, result.exitCode);
+        EXPECT_THAT(result.output, HasSubstr("--simulation"));
+        EXPECT_THAT(result.errors, IsEmpty());
+    }
+}
+
+TEST(Program, WrongUseEndsWithCode2AndSaysHowToGetHelp) {
+    for (const std::vector<std::string>& arguments :
+         {std::vector<std::string>{},
+          {"fly"},
+          {"grab"},
+          {"grab", "x", "-o", "a.fits"},
+          {"stream", "--simulation", "mono"},
+          {"grab", "--simulation", "mono", "-o", "image.jpg"}}) {
+        const ProgramResult result = RunProgram(arguments);
+
+        EXPECT_EQ(2, result.exitCode);
+        EXPECT_THAT(result.errors, HasSubstr("zentara:"));
+        EXPECT_THAT(result.output, IsEmpty());
+    }
+}
+
+TEST(Program, ListShowsTheTenCamerasOfTheScenario) {
+    const ProgramResult result = RunProgram({"list", "--simulation", "ten", "--json"});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    const json cameras = json::parse(result.output)["cameras"];
+    ASSERT_EQ(10U, cameras.size());
+    for (std::size_t i = 0; i < cameras.size(); ++i) {
+        EXPECT_EQ(i, cameras[i]["id"].get<std::size_t>());
+        EXPECT_THAT(cameras[i]["model"].get<std::string>(), Not(IsEmpty()));
+        EXPECT_TRUE(cameras[i]["free"].get<bool>());
+    }
+}
+
+TEST(Program, ListOfAnEmptyBusSaysSoAndSucceeds) {
+    const ProgramResult result = RunProgram({"list", "--simulation", "empty"});
+
+    EXPECT_EQ(0, result.exitCode);
+    EXPECT_EQ("No cameras.\n", result.output);
+}
+
+TEST(Program, TheSimulationOptionMayStandBeforeTheCommand) {
+    const ProgramResult before = RunProgram({"--simulation", "mono", "list"});
+    const ProgramResult after = RunProgram({"list", "--simulation", "mono"});
+
+    EXPECT_EQ(0, before.exitCode);
+    EXPECT_EQ(after.output, before.output);
+}
+
+TEST(Program, InfoTellsModelAndSensor) {
+    const ProgramResult result =
+        RunProgram({"info", "0", "--simulation", "model:SolvaneG2", "--json"});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    const json info = json::parse(result.output);
+    EXPECT_EQ("Solvane G2", info["model"]);
+    EXPECT_EQ(29, info["cameraType"]);
+    EXPECT_GT(info["ccdWidth"].get<int>(), 0);
+    EXPECT_TRUE(info["intensifierModel"].is_null());
+}
+
+TEST(Program, ARefusedScenarioEndsWithCode2AndNamesThePlace) {
+    const TemporaryFolder folder;
+    WriteFile(folder.GetPath("bad.json"), R"({"buses": [{"cameras": [{"colour": 1}]}]})");
+
+    const ProgramResult result = RunProgram({"list", "--simulation", folder.GetPath("bad.json")});
+
+    EXPECT_EQ(2, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("colour"));
+    EXPECT_THAT(result.output, IsEmpty());
+}
+
+TEST(Program, ACameraThatIsNotInTheListEndsWithCode3) {
+    EXPECT_EQ(3, RunProgram({"info", "1", "--simulation", "mono"}).exitCode);
+    EXPECT_EQ(3, RunProgram({"grab", "0", "--simulation", "empty", "-o", "a.fits"}).exitCode);
+}
+
+TEST(Program, GrabWritesAFitsFileThatAstronomersProgramsRead) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("star [1].fits");
+
+    const ProgramResult result = RunProgram({"grab", "0", "--simulation", "mono", "-o", path});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    const FitsFile file(path);
+    ASSERT_NE(nullptr, file.Get());
+    EXPECT_THAT(
+        ReadFitsText(file.Get(), "DATE-OBS"),
+        testing::MatchesRegex("[0-9]{4}-[0-9]{2}-[0-9]{2}T[0-9]{2}:[0-9]{2}:[0-9]{2}[.][0-9]{3}"));
+    EXPECT_DOUBLE_EQ(0.016384, ReadFitsNumber(file.Get(), "EXPTIME"));
+    EXPECT_DOUBLE_EQ(0.016384, ReadFitsNumber(file.Get(), "EXPOSURE"));
+    EXPECT_EQ(1, ReadFitsNumber(file.Get(), "XBINNING"));
+    EXPECT_EQ(1, ReadFitsNumber(file.Get(), "YBINNING"));
+    EXPECT_EQ(0, ReadFitsNumber(file.Get(), "XORGSUBF"));
+    EXPECT_EQ(0, ReadFitsNumber(file.Get(), "YORGSUBF"));
+    EXPECT_GT(ReadFitsNumber(file.Get(), "XPIXSZ"), 0);
+    EXPECT_GT(ReadFitsNumber(file.Get(), "YPIXSZ"), 0);
+    EXPECT_GE(ReadFitsNumber(file.Get(), "GAIN"), 0);
+    EXPECT_GE(ReadFitsNumber(file.Get(), "OFFSET"), 0);
+    EXPECT_THAT(ReadFitsText(file.Get(), "INSTRUME"), Not(IsEmpty()));
+    EXPECT_THAT(ReadFitsText(file.Get(), "SERIALNO"), Not(IsEmpty()));
+    EXPECT_EQ("Zentara 2.0.8", ReadFitsText(file.Get(), "SWCREATE"));
+    EXPECT_EQ(0, ReadFitsNumber(file.Get(), "FRAMEERR"));
+    EXPECT_EQ(0, ReadFitsText(file.Get(), "ROWORDER").compare("TOP-DOWN"));
+}
+
+TEST(Program, FitsverifySaysNothingAgainstItsFiles) {
+    const TemporaryFolder folder;
+    for (const char* scenario : {"mono", "metrona", "colour"}) {
+        const std::string path = folder.GetPath(std::string(scenario) + ".fits");
+        ASSERT_EQ(0, RunProgram({"grab", "0", "--simulation", scenario, "-o", path}).exitCode);
+
+        const ProgramResult verified = RunTool({"fitsverify", "-q", path});
+
+        EXPECT_EQ(0, verified.exitCode);
+        EXPECT_THAT(verified.output, HasSubstr("verification OK"));
+    }
+}
+
+TEST(Program, AColourCameraSaysItsMosaicInTheFitsHeader) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("colour.fits");
+    ASSERT_EQ(0, RunProgram({"grab", "0", "--simulation", "colour", "-o", path}).exitCode);
+
+    const FitsFile file(path);
+
+    ASSERT_NE(nullptr, file.Get());
+    EXPECT_THAT(ReadFitsText(file.Get(), "BAYERPAT"), testing::MatchesRegex("RGGB|GRBG|GBRG|BGGR"));
+}
+
+TEST(Program, AllKindsOfFileHoldTheSamePixels) {
+    const TemporaryFolder folder;
+    // One seed and no time in it: every run exposes the same first frame.
+    for (const char* name : {"a.fits", "a.tiff", "a.png", "a.raw"}) {
+        ASSERT_EQ(0,
+                  RunProgram({"grab", "0", "--simulation", "metrona", "-o", folder.GetPath(name)})
+                      .exitCode);
+    }
+    const std::vector<std::uint16_t> pixels = FitsFile(folder.GetPath("a.fits")).ReadPixels();
+    const std::string expected(reinterpret_cast<const char*>(pixels.data()), pixels.size() * 2);
+
+    EXPECT_EQ(expected, ReadFile(folder.GetPath("a.raw")));
+
+    TIFF* tiff = TIFFOpen(folder.GetPath("a.tiff").c_str(), "r");
+    ASSERT_NE(nullptr, tiff);
+    std::string tiffPixels;
+    for (std::uint32_t strip = 0; strip < TIFFNumberOfStrips(tiff); ++strip) {
+        std::string bytes(static_cast<std::size_t>(TIFFStripSize(tiff)), '\0');
+        const tmsize_t read = TIFFReadEncodedStrip(tiff, strip, bytes.data(), -1);
+        ASSERT_GE(read, 0);
+        tiffPixels.append(bytes, 0, static_cast<std::size_t>(read));
+    }
+    TIFFClose(tiff);
+    EXPECT_EQ(expected, tiffPixels);
+
+    png_image png{};
+    png.version = PNG_IMAGE_VERSION;
+    ASSERT_NE(0, png_image_begin_read_from_file(&png, folder.GetPath("a.png").c_str()));
+    EXPECT_EQ(PNG_FORMAT_LINEAR_Y, png.format);
+    EXPECT_EQ(pixels.size(), static_cast<std::size_t>(png.width) * png.height);
+    png_image_free(&png);
+}
+
+TEST(Program, AFileThatCannotBeWrittenIsNamedWithTheReasonAndLeavesNothing) {
+    const TemporaryFolder folder;
+    for (const char* ending : {"fits", "tiff", "png", "raw"}) {
+        const std::string path = folder.GetPath("missing/image.") + ending;
+
+        const ProgramResult result = RunProgram({"grab", "0", "--simulation", "mono", "-o", path});
+
+        EXPECT_EQ(1, result.exitCode);
+        EXPECT_THAT(result.errors, HasSubstr(path));
+        EXPECT_THAT(result.errors, HasSubstr("No such file or directory"));
+    }
+    EXPECT_THAT(folder.ListFiles(), IsEmpty());
+}
+
+TEST(Program, AFullDiskLeavesNoHalfFile) {
+    const TemporaryFolder folder;
+    for (const char* ending : {"fits", "tiff", "png", "raw"}) {
+        const std::string path = folder.GetPath("image.") + ending;
+        // A limit of 64 KiB for a file stands for a full disk.
+        const ProgramResult result =
+            RunTool({"sh", "-c",
+                     "trap '' XFSZ; ulimit -f 64; exec \"$0\" grab 0 --simulation mono -o \"$1\"",
+                     ZENTARA_BINARY_DIR "/bin/zentara", path});
+
+        EXPECT_EQ(1, result.exitCode) << ending;
+        EXPECT_THAT(result.errors, HasSubstr(path));
+    }
+    EXPECT_THAT(folder.ListFiles(), IsEmpty());
+}
+
+TEST(Program, AnOlderFileStaysWhenANewOneCannotBeWritten) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("image.raw");
+    WriteFile(path, "older");
+
+    RunTool({"sh", "-c",
+             "trap '' XFSZ; ulimit -f 64; exec \"$0\" grab 0 --simulation mono -o \"$1\"",
+             ZENTARA_BINARY_DIR "/bin/zentara", path});
+
+    EXPECT_EQ("older", ReadFile(path));
+}
+
+TEST(Program, StreamCountsItsFramesAndWritesNumberedFiles) {
+    const TemporaryFolder folder;
+
+    const ProgramResult result = RunProgram({"stream", "0", "--simulation", "mono", "--count", "5",
+                                             "--json", "-o", folder.GetPath("night.raw")});
+
+    ASSERT_TRUE(result.exitCode == 0 || result.exitCode == 6) << result.errors;
+    const json report = json::parse(result.output);
+    EXPECT_EQ(5, report["frames"]);
+    EXPECT_EQ(5, report["files"]);
+    EXPECT_EQ(0, report["damaged"]);
+    EXPECT_THAT(folder.ListFiles(),
+                testing::ElementsAre("night-000001.raw", "night-000002.raw", "night-000003.raw",
+                                     "night-000004.raw", "night-000005.raw"));
+}
+
+TEST(Program, StreamEndsAfterItsDuration) {
+    const ProgramResult result =
+        RunProgram({"stream", "0", "--simulation", "mono", "--duration", "0.5", "--json"});
+
+    ASSERT_TRUE(result.exitCode == 0 || result.exitCode == 6) << result.errors;
+    EXPECT_GE(json::parse(result.output)["seconds"].get<double>(), 0.5);
+}
+
+TEST(Program, AnInterruptEndsAStreamCleanlyWithCode130) {
+    const TemporaryFolder folder;
+    RunningProgram program({"stream", "0", "--simulation", "mono", "--duration", "600", "-o",
+                            folder.GetPath("night.raw")});
+    ASSERT_TRUE(::WaitUntil([&] { return !folder.ListFiles().empty(); }, std::chrono::seconds(60)));
+
+    program.Send(SIGINT);
+    const ProgramResult result = program.Wait();
+
+    EXPECT_EQ(130, result.exitCode);
+    EXPECT_THAT(result.output, HasSubstr("files written"));
+    for (const std::string& name : folder.ListFiles()) EXPECT_THAT(name, Not(HasSubstr(".part")));
+}
+
+}  // namespace
+}  // namespace ZentaraTest
