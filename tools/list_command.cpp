@@ -70,6 +70,7 @@ ExitCode RunList(const CommonOptions& common) {
     std::vector<Zentara_CamListItem> items;
     const ZentaraResult result = driver.List(&items);
     std::vector<ListedCamera> cameras;
+    cameras.reserve(items.size());
     for (const Zentara_CamListItem& item : items) cameras.push_back(Describe(item));
     if (common.asJson) {
         nlohmann::json list = nlohmann::json::array();
