@@ -1,0 +1,210 @@
+#include "support/simulation_world.h"
+
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <nlohmann/json.hpp>
+
+#include "hal/control_records.h"
+#include "hal/platform/kernel_driver.h"
+
+extern "C" const ZV::KernelDriver* ZentaraSimulation_GetKernelDriver(std::uint32_t version);
+
+namespace ZV::Test {
+namespace {
+
+using Json = nlohmann::json;
+
+constexpr char Variable[] = "ZENTARA_SIMULATION";
+constexpr char ScenarioFile[] = "scenario.json";
+constexpr char TraceFile[] = "trace.jsonl";
+
+std::filesystem::path MakeFolder() {
+    std::string path = (std::filesystem::temp_directory_path() / "zentara-XXXXXX").string();
+    return mkdtemp(path.data()) != nullptr ? path : ".";
+}
+
+void SetDefault(Json* object, const char* key, const Json& value) {
+    if (!object->contains(key)) (*object)[key] = value;
+}
+
+void QuietSensors(Json* cameras) {
+    if (!cameras->is_array()) return;
+    for (Json& camera : *cameras) {
+        if (!camera.is_object()) continue;
+        SetDefault(&camera, "sensor", Json::object());
+        if (camera["sensor"].is_object()) SetDefault(&camera["sensor"], "noise", false);
+    }
+}
+
+std::size_t CountBuiltInCameras(const std::string& base) {
+    if (base == "empty") return 0;
+    if (base == "ten") return 10;
+    return base == "held" ? 2 : 1;
+}
+
+Json MakeDocument(std::string_view scenario) {
+    Json document = Json::object();
+    if (scenario.starts_with("{")) {
+        document = Json::parse(scenario);
+    } else {
+        document["base"] = scenario;
+    }
+    SetDefault(&document, "trace", TraceFile);
+    SetDefault(&document, "timeScale", 0);
+    SetDefault(&document, "cameras", Json::array());
+    if (document.contains("base") && document["base"].is_string()) {
+        const std::size_t count = CountBuiltInCameras(document["base"]);
+        while (document["cameras"].size() < count) document["cameras"].push_back(Json::object());
+    }
+    QuietSensors(&document["cameras"]);
+    return document;
+}
+
+std::vector<std::uint8_t> ConvertHex(const std::string& text) {
+    std::vector<std::uint8_t> bytes;
+    for (std::size_t i = 0; i + 1 < text.size(); i += 2) {
+        bytes.push_back(static_cast<std::uint8_t>(std::stoul(text.substr(i, 2), nullptr, 16)));
+    }
+    return bytes;
+}
+
+TraceRecord ParseRecord(const Json& line) {
+    TraceRecord record;
+    record.time = line.value("time", 0.0);
+    record.type = line.value("type", "");
+    record.camera = line.value("camera", 0u);
+    record.code = line.value("code", 0u);
+    record.name = line.value("name", "");
+    record.input = ConvertHex(line.value("input", ""));
+    record.output = ConvertHex(line.value("output", ""));
+    record.inputBytes = line.value("inputBytes", std::uint64_t{0});
+    record.outputBytes = line.value("outputBytes", std::uint64_t{0});
+    record.wasPended = line.value("pended", false);
+    record.error = line.value("error", 0u);
+    record.frame = line.value("frame", std::uint64_t{0});
+    record.rollingFrameNumber = line.value("rollingFrameNumber", 0u);
+    record.psn = line.value("psn", 0u);
+    record.plane = line.value("plane", 0u);
+    record.width = line.value("width", 0u);
+    record.height = line.value("height", 0u);
+    record.bytes = line.value("bytes", std::uint64_t{0});
+    record.checksum = std::stoull(line.value("checksum", "0"), nullptr, 16);
+    return record;
+}
+
+RegisterWrite ParseWrite(const TraceRecord& record) {
+    RegisterWrite write{0, {}, record.error};
+    if (record.input.size() < AsyncWriteExtraBytes) return write;
+    std::memcpy(&write.address, record.input.data() + offsetof(AsyncReadRecord, offsetLow), 4);
+    const std::size_t end = record.input.size() - (AsyncWriteExtraBytes - AsyncWriteDataOffset);
+    for (std::size_t i = AsyncWriteDataOffset; i + 4 <= end; i += 4) {
+        const std::uint8_t* quadlet = record.input.data() + i;
+        write.values.push_back(std::uint32_t{quadlet[0]} << 24 | std::uint32_t{quadlet[1]} << 16 |
+                               std::uint32_t{quadlet[2]} << 8 | quadlet[3]);
+    }
+    return write;
+}
+
+const KernelDriver& GetKernelDriver() {
+    return *ZentaraSimulation_GetKernelDriver(KernelDriverVersion);
+}
+
+}  // namespace
+
+std::uint64_t CalculateChecksum(const void* bytes, std::size_t count) {
+    std::uint64_t sum = 0xCBF29CE484222325;
+    const auto* source = static_cast<const std::uint8_t*>(bytes);
+    for (std::size_t i = 0; i < count; ++i) sum = (sum ^ source[i]) * 0x100000001B3;
+    return sum;
+}
+
+SimulationWorld::SimulationWorld(std::string_view scenario) : folder(MakeFolder()) {
+    std::ofstream(folder / ScenarioFile) << MakeDocument(scenario).dump(2);
+    setenv(Variable, GetScenarioPath().c_str(), 1);
+}
+
+SimulationWorld::~SimulationWorld() {
+    End();
+    unsetenv(Variable);
+    std::error_code ignored;
+    std::filesystem::remove_all(folder, ignored);
+}
+
+std::string SimulationWorld::GetScenarioPath() const {
+    return (folder / ScenarioFile).string();
+}
+
+bool SimulationWorld::Start() {
+    return GetKernelDriver().begin(GetScenarioPath().c_str(), nullptr, 0) == 0;
+}
+
+void SimulationWorld::End() {
+    GetKernelDriver().end();
+}
+
+std::vector<TraceRecord> SimulationWorld::ReadTrace() const {
+    std::vector<TraceRecord> records;
+    std::ifstream file(folder / TraceFile);
+    for (std::string line; std::getline(file, line);) {
+        const Json parsed = Json::parse(line, nullptr, false);
+        // The last line may be half written.
+        if (parsed.is_object()) records.push_back(ParseRecord(parsed));
+    }
+    return records;
+}
+
+std::vector<TraceRecord> SimulationWorld::ReadTrace(std::string_view type,
+                                                    std::uint32_t camera) const {
+    std::vector<TraceRecord> records = ReadTrace();
+    std::erase_if(records, [&](const TraceRecord& record) {
+        return record.type != type || record.camera != camera;
+    });
+    return records;
+}
+
+std::vector<TraceRecord> SimulationWorld::ReadRequests(std::uint32_t camera) const {
+    return ReadTrace("request", camera);
+}
+
+std::vector<TraceRecord> SimulationWorld::ReadFrames(std::uint32_t camera) const {
+    return ReadTrace("frame", camera);
+}
+
+std::vector<RegisterWrite> SimulationWorld::ReadRegisterWrites(std::uint32_t camera) const {
+    std::vector<RegisterWrite> writes;
+    for (const TraceRecord& record : ReadRequests(camera)) {
+        if (record.code == FW_IOCTL_ASYNC_WRITE) writes.push_back(ParseWrite(record));
+    }
+    return writes;
+}
+
+bool SimulationWorld::AddFault(std::string_view fault, std::uint32_t camera) {
+    return ZentaraSimulation_AddFault(camera, std::string(fault).c_str(), nullptr, 0) == 0;
+}
+
+bool SimulationWorld::Unplug(std::uint32_t camera) {
+    return ZentaraSimulation_Unplug(camera) == 0;
+}
+
+bool SimulationWorld::Plug(std::uint32_t camera) {
+    return ZentaraSimulation_Plug(camera) == 0;
+}
+
+ZentaraSimulationState SimulationWorld::GetState(std::uint32_t camera) const {
+    ZentaraSimulationState state{};
+    (void)ZentaraSimulation_GetState(camera, &state);  // Zeros say the same.
+    return state;
+}
+
+std::uint32_t SimulationWorld::Peek(std::uint32_t address, std::uint32_t camera) const {
+    std::uint32_t value = 0;
+    (void)ZentaraSimulation_PeekRegister(camera, address, &value);  // 0 where there is nothing.
+    return value;
+}
+
+bool SimulationWorld::Poke(std::uint32_t address, std::uint32_t value, std::uint32_t camera) {
+    return ZentaraSimulation_PokeRegister(camera, address, value) == 0;
+}
+
+}  // namespace ZV::Test
