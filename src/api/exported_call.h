@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstdint>
+
 #include "diagnostics/log.h"
 #include "zentara/zentara.h"
 
@@ -17,11 +19,11 @@ ZentaraResult Guarded(Body&& body) noexcept {
     }
 }
 
-/// Guarded, between the log's start and end records of `function`.
+/// Guarded, between the log's start and end records of `function`, which is handed on to `body`.
 template <typename Body>
 ZentaraResult Traced(const char* function, Body&& body) noexcept {
     ZLogEnter(function);
-    const ZentaraResult result = Guarded(body);
+    const ZentaraResult result = Guarded([&] { return body(function); });
     ZLogLeave(function, static_cast<std::uint16_t>(result));
     return result;
 }

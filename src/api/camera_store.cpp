@@ -1,0 +1,97 @@
+#include "api/camera_store.h"
+
+#include <algorithm>
+
+#include "api/entry_queue.h"
+#include "api/handles.h"
+
+namespace ZV {
+
+namespace {
+
+// A camera that another process holds reads as open, but nothing of it is ours.
+bool IsInUse(ZCamera* camera) {
+    return camera->IsCameraOpen() && camera->DoWeHaveExclusiveAccess();
+}
+
+bool Holds(const std::vector<ZCamera*>& cameras, const ZCamera* camera) {
+    return std::find(cameras.begin(), cameras.end(), camera) != cameras.end();
+}
+
+// The results say whether a close worked; a camera that is given up is gone either way.
+void FreeCameras(std::vector<ZCamera*>& cameras) {
+    for (ZCamera* camera : cameras) UnregisterCamera(camera);
+    (void)ZCamera::FreeCameraList(cameras);
+}
+
+}  // namespace
+
+CameraStore& CameraStore::Get() {
+    static CameraStore& store = *new CameraStore;
+    return store;
+}
+
+CameraResult CameraStore::MakeList() {
+    FreeClosedRetiredCameras();
+    UnregisterClosedCameras();
+    // Kept: only the listing's own result counts, and this stops at the first open camera.
+    (void)ZCamera::EraseClosedCamerasFromList(cameraList);
+    RetireList();
+    (void)ZCamera::EraseCameraList(cameraList);
+    FreeContextsWithoutCamera();
+    const CameraResult result = ZCamera::GetCameraList(cameraList);
+    for (ZCamera* camera : cameraList) RegisterCamera(camera);
+    return result;
+}
+
+void CameraStore::AttachContext(ZCamera& camera, std::unique_ptr<CameraContext> context) {
+    camera.SetRefCon(context.get());
+    contexts.push_back({&camera, std::move(context)});
+}
+
+void CameraStore::DetachContext(ZCamera& camera) {
+    CameraContext* const context = GetCameraContext(camera);
+    camera.SetRefCon(nullptr);
+    if (context != nullptr) ClearQueue(*context);
+    // A close that failed leaves the camera open and its threads running on the context.
+    if (!camera.IsCameraOpen()) FreeContextsOf(camera);
+}
+
+void CameraStore::FreeAll() {
+    FreeCameras(cameraList);
+    FreeCameras(retiredCameras);
+    contexts.clear();
+}
+
+void CameraStore::UnregisterClosedCameras() {
+    for (ZCamera* camera : cameraList) {
+        if (!camera->IsCameraOpen()) UnregisterCamera(camera);
+    }
+}
+
+void CameraStore::FreeClosedRetiredCameras() {
+    const auto firstClosed =
+        std::stable_partition(retiredCameras.begin(), retiredCameras.end(), IsInUse);
+    std::vector<ZCamera*> closed(firstClosed, retiredCameras.end());
+    retiredCameras.erase(firstClosed, retiredCameras.end());
+    FreeCameras(closed);
+}
+
+void CameraStore::RetireList() {
+    retiredCameras.insert(retiredCameras.end(), cameraList.begin(), cameraList.end());
+}
+
+void CameraStore::FreeContextsOf(ZCamera& camera) {
+    for (const OwnedContext& owned : contexts) {
+        if (owned.camera == &camera) DetachCameraContext(camera, *owned.context);
+    }
+    std::erase_if(contexts, [&](const OwnedContext& owned) { return owned.camera == &camera; });
+}
+
+void CameraStore::FreeContextsWithoutCamera() {
+    std::erase_if(contexts, [&](const OwnedContext& owned) {
+        return !Holds(cameraList, owned.camera) && !Holds(retiredCameras, owned.camera);
+    });
+}
+
+}  // namespace ZV

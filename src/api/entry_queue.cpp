@@ -1,0 +1,104 @@
+#include "api/entry_queue.h"
+
+#include <algorithm>
+#include <new>
+
+namespace ZV {
+
+namespace {
+
+// All helpers: under queueMutex.
+
+QueueEntry* TakeEntryAt(CameraContext& context, std::uint32_t index) {
+    QueueEntry** const first = context.queue.data();
+    QueueEntry* const taken = first[index];
+    std::move(first + index + 1, first + context.queueCount, first + index);
+    --context.queueCount;
+    first[context.queueCount] = nullptr;
+    return taken;
+}
+
+void DropHold(QueueEntry* entry) {
+    --entry->holdCount;
+    if (entry->holdCount == 0) delete entry;
+}
+
+QueueEntry* CopyEntry(const QueueEntry& entry) {
+    auto* const copy = new (std::nothrow) QueueEntry;
+    if (copy == nullptr) return nullptr;
+    copy->camera = entry.camera;
+    copy->frame = entry.frame;
+    copy->settings = entry.settings;
+    copy->callback = entry.callback;
+    copy->flags = entry.flags;
+    copy->userPrivate = entry.userPrivate;
+    copy->userData = entry.userData;
+    copy->kind = entry.kind;
+    copy->holdCount = 1;
+    return copy;
+}
+
+}  // namespace
+
+std::uint32_t GetQueueCount(const CameraContext& context) {
+    const std::lock_guard hold(context.queueMutex);
+    return context.queueCount;
+}
+
+bool AppendEntry(CameraContext& context, const QueueEntry& entry) {
+    QueueEntry* const copy = CopyEntry(entry);
+    if (copy == nullptr) return false;
+    const std::lock_guard hold(context.queueMutex);
+    if (context.queueCount >= QueueCapacity) {
+        delete copy;
+        return false;
+    }
+    context.queue[context.queueCount] = copy;
+    ++context.queueCount;
+    return true;
+}
+
+QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index) {
+    const std::lock_guard hold(context.queueMutex);
+    if (index >= context.queueCount) return nullptr;
+    QueueEntry* const entry = context.queue[index];
+    ++entry->holdCount;
+    return entry;
+}
+
+QueueEntry* TakeFirstEntry(CameraContext& context) {
+    const std::lock_guard hold(context.queueMutex);
+    if (context.queueCount == 0) return nullptr;
+    return TakeEntryAt(context, 0);
+}
+
+QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index, std::uint32_t countMin) {
+    const std::lock_guard hold(context.queueMutex);
+    if (context.queueCount < countMin || index >= context.queueCount) return nullptr;
+    if (context.queue[index]->kind != QueueKindSettings) return nullptr;
+    return TakeEntryAt(context, index);
+}
+
+bool ClaimExposeDone(CameraContext& context, QueueEntry& entry) {
+    const std::lock_guard hold(context.queueMutex);
+    if (entry.exposeDoneCalled != 0) return false;
+    entry.exposeDoneCalled = 1;
+    return true;
+}
+
+void LetGoOfEntry(CameraContext& context, QueueEntry* entry) {
+    if (entry == nullptr) return;
+    const std::lock_guard hold(context.queueMutex);
+    DropHold(entry);
+}
+
+void ClearQueue(CameraContext& context) {
+    const std::lock_guard hold(context.queueMutex);
+    for (std::uint32_t index = 0; index < context.queueCount; ++index) {
+        DropHold(context.queue[index]);
+        context.queue[index] = nullptr;
+    }
+    context.queueCount = 0;
+}
+
+}  // namespace ZV

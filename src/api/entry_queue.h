@@ -1,0 +1,43 @@
+#pragma once
+
+#include <cstdint>
+
+#include "api/camera_context.h"
+
+namespace ZV {
+
+/// The queue of a context, oldest entry at index 0. All operations are thread-safe and keep the
+/// queue whole under its leaf mutex, whatever named lock the caller holds.
+///
+/// An entry lives while somebody holds it: the queue holds what is in it, and a thread that works
+/// on an entry holds it too. The last to let go frees it.
+
+[[nodiscard]] std::uint32_t GetQueueCount(const CameraContext& context);
+
+/// Makes an entry at the end of the queue, with the values of `entry`. False when there are 100
+/// already or there is no memory.
+[[nodiscard]] bool AppendEntry(CameraContext& context, const QueueEntry& entry);
+
+/// The entry at `index`, held for the caller; null at or beyond the count.
+[[nodiscard]] QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index);
+
+/// Takes the entry at index 0 out and hands the queue's hold to the caller; null when the queue is
+/// empty.
+[[nodiscard]] QueueEntry* TakeFirstEntry(CameraContext& context);
+
+/// Takes the entry at `index` out if it is a settings change and the queue has at least `countMin`
+/// entries, and hands the queue's hold to the caller; else null, and the queue stays as it is.
+[[nodiscard]] QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index,
+                                            std::uint32_t countMin);
+
+/// Marks the exposure callback of a frame as called. False when another thread has done so: exactly
+/// one of two threads gets true.
+[[nodiscard]] bool ClaimExposeDone(CameraContext& context, QueueEntry& entry);
+
+/// Lets go of an entry. Null is ignored.
+void LetGoOfEntry(CameraContext& context, QueueEntry* entry);
+
+/// Empties the queue without calling a callback.
+void ClearQueue(CameraContext& context);
+
+}  // namespace ZV
