@@ -1,0 +1,20 @@
+#pragma once
+
+#include <chrono>
+#include <thread>
+
+namespace ZV::Test {
+
+/// Waits until `isTrue` holds, asking every millisecond. False when the deadline passed first.
+template <typename Condition>
+[[nodiscard]] bool WaitUntil(Condition isTrue,
+                             std::chrono::milliseconds deadline = std::chrono::seconds(10)) {
+    const auto end = std::chrono::steady_clock::now() + deadline;
+    while (!isTrue()) {
+        if (std::chrono::steady_clock::now() >= end) return false;
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    }
+    return true;
+}
+
+}  // namespace ZV::Test
