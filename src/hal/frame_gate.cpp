@@ -1,0 +1,32 @@
+#include "hal/frame_gate.h"
+
+namespace ZV {
+
+FrameGate::FrameGate() : frameEvent(MakeEvent(EventReset::Manual)) {}
+
+FrameGate::~FrameGate() {
+    (void)DestroyEvent(frameEvent);
+}
+
+void FrameGate::Open() {
+    ClearEvent(frameEvent);
+    isOpen.store(true);
+}
+
+void FrameGate::Close() {
+    isOpen.store(false);
+    (void)SignalEvent(frameEvent);
+}
+
+void FrameGate::Wait() {
+    ClearEvent(frameEvent);
+    // Looked at behind the clearing, so that the signal of a close is never the one that is lost.
+    if (!isOpen.load()) return;
+    (void)WaitForEvent(frameEvent, WaitForEver);
+}
+
+void FrameGate::Release() {
+    (void)SignalEvent(frameEvent);
+}
+
+}  // namespace ZV

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+
+#include "hal/platform/event.h"
+
+namespace ZV {
+
+/// Where the camera's run loop waits for frames. Thread-safe; lives as long as the device's record,
+/// so that a late call never meets an event that is gone.
+class FrameGate {
+  public:
+    FrameGate();
+    ~FrameGate();
+    FrameGate(const FrameGate&) = delete;
+    FrameGate& operator=(const FrameGate&) = delete;
+
+    /// The device has been connected: waits block from now on.
+    void Open();
+    /// The device is being closed: whoever waits goes on, and later waits return at once.
+    void Close();
+    /// Takes earlier signals back and waits without limit for the next Release. A signal between
+    /// the end of one wait and the next call is lost.
+    void Wait();
+    void Release();
+
+  private:
+    PlatformEvent* const frameEvent;
+    std::atomic<bool> isOpen{false};
+};
+
+}  // namespace ZV
