@@ -231,7 +231,7 @@ class Device {
     std::uint8_t* GetPayload(const FileHandle& listener);
     void FillSlot(const Handle& listener, std::uint32_t length);
     void Expose(std::unique_lock<std::mutex>& lock);
-    std::vector<std::uint8_t> ExposeOrRepeat(const ExposureSettings& exposure);
+    std::vector<std::uint8_t> ExposeOrRepeat(ExposureSettings exposure);
     void BeginFrame(std::vector<std::uint8_t> pixels);
     void FinishFrame();
 

@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <cstring>
+#include <new>
 #include <utility>
 
 #include "hal/control_records.h"
@@ -31,14 +32,6 @@ constexpr std::uint32_t WheelColours[] = {0, 1, 3};
 
 std::uint64_t GetImageBytes(const ExposureSettings& exposure) {
     return std::uint64_t{exposure.width} * exposure.height * (exposure.bitDepth > 8 ? 2 : 1);
-}
-
-bool IsSameExposure(const ExposureSettings& a, const ExposureSettings& b) {
-    return a.roiX == b.roiX && a.roiY == b.roiY && a.width == b.width && a.height == b.height &&
-           a.binningX == b.binningX && a.binningY == b.binningY && a.bitDepth == b.bitDepth &&
-           a.isBigEndian == b.isBigEndian && a.exposureNs == b.exposureNs && a.gainDb == b.gainDb &&
-           a.offset == b.offset && a.wheelColour == b.wheelColour &&
-           a.temperature == b.temperature && a.isRotated == b.isRotated;
 }
 
 // Mosaic of an image turned by half a turn, for images of even size.
@@ -381,17 +374,22 @@ void Device::Expose(std::unique_lock<std::mutex>& lock) {
     std::vector<std::uint8_t> pixels = ExposeOrRepeat(exposure);
     lock.lock();
     if (serial != sender.serial) return;
+    if (pixels.empty()) return StopFrame();
     ++framesExposed;
     BeginFrame(std::move(pixels));
 }
 
-std::vector<std::uint8_t> Device::ExposeOrRepeat(const ExposureSettings& exposure) {
+// Empty when there is no memory for it.
+std::vector<std::uint8_t> Device::ExposeOrRepeat(ExposureSettings exposure) try {
     if (camera.sensor.hasNoise) return sensor.Expose(exposure);
-    if (lastPixels.empty() || !IsSameExposure(exposure, lastExposure)) {
+    exposure.frameIndex = 0;
+    if (lastPixels.empty() || exposure != lastExposure) {
         lastPixels = sensor.Expose(exposure);
         lastExposure = exposure;
     }
     return lastPixels;
+} catch (const std::bad_alloc&) {
+    return {};
 }
 
 void Device::BeginFrame(std::vector<std::uint8_t> pixels) {

@@ -131,6 +131,7 @@ CameraScenario MakeCamera(const ModelRow& model) {
     camera.sensor.maxBitDepth = model.maxBitDepth;
     camera.sensor.colourKind = static_cast<ColourKind>(model.colourKind);
     camera.sensor.fullWell = GetFullWell(model.sensorId);
+    camera.sensor.binsWithinMosaic = model.id == ModelFolary;
     camera.scene.kind = camera.sensor.colourKind == ColourKind::Bayer ? "chart" : "stars";
     camera.streamingVersion = model.streamingVersion;
     camera.tag = model.tag;
