@@ -138,39 +138,20 @@ bool IsSupported(const ExposureSettings& settings) {
 
 }  // namespace
 
-struct Sensor::Memory {
-    std::mutex mutex;  ///< Guards what follows. A map that is made stays as it is.
-    std::array<std::vector<float>, RateMapCount> rates;
-    ExposureSettings lastSettings;
-    std::vector<std::uint8_t> lastSamples;
+struct Sensor::RateMaps {
+    std::mutex mutex;  ///< Guards the making; a map that is made stays as it is.
+    std::array<std::vector<float>, RateMapCount> maps;
 };
 
 Sensor::Sensor(const SensorDescription& sensorDescription, std::unique_ptr<Scene> sensorScene)
     : description(sensorDescription),
       scene(std::move(sensorScene)),
-      memory(std::make_unique<Memory>()) {}
+      rateMaps(std::make_unique<RateMaps>()) {}
 
 Sensor::~Sensor() = default;
 
 std::vector<std::uint8_t> Sensor::Expose(const ExposureSettings& settings) const {
     if (!IsSupported(settings)) return {};
-    if (description.hasNoise) return Render(settings);
-
-    // Without noise frames of the same settings are alike; only a change is worth the work.
-    ExposureSettings key = settings;
-    key.frameIndex = 0;
-    {
-        const std::lock_guard lock(memory->mutex);
-        if (!memory->lastSamples.empty() && memory->lastSettings == key) return memory->lastSamples;
-    }
-    std::vector<std::uint8_t> samples = Render(settings);
-    const std::lock_guard lock(memory->mutex);
-    memory->lastSettings = key;
-    memory->lastSamples = samples;
-    return samples;
-}
-
-std::vector<std::uint8_t> Sensor::Render(const ExposureSettings& settings) const {
     const Response response(description, settings);
     const float* rates = GetRates(settings.wheelColour);
     const std::size_t rowBytes = std::size_t{settings.width} * (settings.bitDepth > 8 ? 2 : 1);
@@ -201,8 +182,8 @@ std::uint32_t Sensor::GetMosaicAt(std::uint32_t x, std::uint32_t y) const {
 const float* Sensor::GetRates(std::uint32_t wheelColour) const {
     const bool hasMosaic = description.colourKind == ColourKind::Bayer;
     const std::size_t index = hasMosaic ? RateMapNoFilter : GetRateMapIndex(wheelColour);
-    const std::lock_guard lock(memory->mutex);
-    std::vector<float>& rates = memory->rates[index];
+    const std::lock_guard lock(rateMaps->mutex);
+    std::vector<float>& rates = rateMaps->maps[index];
     if (rates.empty()) rates = MakeRates(wheelColour);
     return rates.data();
 }

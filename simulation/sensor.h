@@ -45,8 +45,6 @@ struct ExposureSettings {
     std::uint64_t frameIndex = 0;  ///< Noise depends on it and the seed alone.
     /// A camera that sends its image turned by half a turn: the last pixel first.
     bool isRotated = false;
-
-    bool operator==(const ExposureSettings&) const = default;
 };
 
 /// Turns light into samples. Saturates at the full well of the pixels added and at the depth's
@@ -69,16 +67,15 @@ class Sensor {
     std::uint32_t GetMosaicAt(std::uint32_t x, std::uint32_t y) const;
 
   private:
-    struct Memory;
+    struct RateMaps;
 
-    std::vector<std::uint8_t> Render(const ExposureSettings& settings) const;
     /// Photoelectrons per second of each pixel of the sensor, made at the first call of a filter.
     const float* GetRates(std::uint32_t wheelColour) const;
     std::vector<float> MakeRates(std::uint32_t wheelColour) const;
 
     SensorDescription description;
     std::unique_ptr<Scene> scene;
-    std::unique_ptr<Memory> memory;
+    std::unique_ptr<RateMaps> rateMaps;
 };
 
 }  // namespace ZV::Simulation
