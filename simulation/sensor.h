@@ -45,6 +45,8 @@ struct ExposureSettings {
     std::uint64_t frameIndex = 0;  ///< Noise depends on it and the seed alone.
     /// A camera that sends its image turned by half a turn: the last pixel first.
     bool isRotated = false;
+
+    bool operator==(const ExposureSettings&) const = default;
 };
 
 /// Turns light into samples. Saturates at the full well of the pixels added and at the depth's
