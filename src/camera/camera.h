@@ -38,7 +38,7 @@ class ZENTARA_API ZCamera : public ZObject {
 
     /// Opens the bus layer and sets the flag; CameraAlreadyInitialized when it is set.
     static CameraResult Initialize();
-    /// Closes the bus layer and clears the flag, whatever it was.
+    /// Closes the bus layer and clears the flag, whatever it was. Ends what failed listings left.
     static CameraResult Shutdown();
     /// The spelling is the name that clients link to.
     static bool IsInitalized();
@@ -46,18 +46,13 @@ class ZENTARA_API ZCamera : public ZObject {
     /// Appends an object for each camera of the bus that nobody holds, read and set up, closed.
     /// Stops at the first failure; what was appended stays.
     static CameraResult GetCameraList(std::vector<ZCamera*>& cameras);
-    /// Empties the vector, deletes nothing. The cameras are retired: DeleteRetiredCameras has them.
+    /// Empties the vector, deletes nothing.
     static CameraResult EraseCameraList(std::vector<ZCamera*>& cameras);
     /// Closes and deletes cameras from the front, up to the first open one.
     static CameraResult EraseClosedCamerasFromList(std::vector<ZCamera*>& cameras);
     /// Closes and deletes all, failures ignored.
     static CameraResult FreeCameraList(std::vector<ZCamera*>& cameras);
     static void FreeImage(ZExImage* image);
-    /// Closes (failures ignored) and deletes what EraseCameraList and listings that failed have
-    /// left. The client's handles to those cameras end here.
-    static void DeleteRetiredCameras();
-    /// True while `camera` is the address of a camera object; any value may be asked.
-    static bool IsLivingCamera(const ZCamera* camera);
 
     static bool GetShouldOutputReads();
     static bool GetShouldOutputWrites();
@@ -343,10 +338,12 @@ class ZENTARA_API ZCamera : public ZObject {
     virtual std::uint16_t GetTagCode() = 0;
 
   protected:
-    /// Takes this camera into the list of those that are open in this process, or out of it: the
-    /// first whose GetUniqueID equals this one's. Thread-safe.
-    CameraResult AddToConnectedCameras();
+    /// Takes this camera into the list of those that are open in this process. Thread-safe.
+    void AddToConnectedCameras();
+    /// Takes the first camera whose GetUniqueID equals this one's out of that list. Thread-safe.
     void RemoveFromConnectedCameras();
+    /// Takes this very object out of the list and its number, if it is in there. Thread-safe.
+    void ForgetConnectedCamera();
 
     Relaxed<void*> refCon{nullptr};
     ZImagePipeline* imagePipeline = nullptr;
@@ -367,15 +364,12 @@ class ZENTARA_API ZCamera : public ZObject {
     static CameraResult ListCamera(HALCamera& record, ZCamera** listed);
     static CameraResult ReadListedCamera(ZCamera& camera, bool* isOtherModel);
     static CameraResult SetUpListedCamera(ZCamera& camera);
-    /// Ends what the close of a camera has left, then deletes it.
-    static void DeleteCamera(ZCamera* camera);
-    static void RetireCamera(ZCamera* camera);
-    void JoinLivingCameras();
-    void LeaveLivingCameras();
+    /// A camera that a failed listing leaves behind: kept until DeleteLostCameras.
+    static void KeepLostCamera(ZCamera* camera);
+    static void DeleteLostCameras();
 
-    ZCamera* nextLiving = nullptr;  // guarded by a leaf mutex, like the other two
-    ZCamera* previousLiving = nullptr;
-    bool isRetired = false;
+    ZCamera* nextLost = nullptr;  // guarded by a leaf mutex, like the list's head
+    static ZCamera* m_firstLostCamera;
 };
 
 }  // namespace ZV

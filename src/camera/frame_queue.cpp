@@ -48,6 +48,11 @@ tStFrameInfo* FrameQueue::TakeOldest() {
     return place < count ? TakeOut(place) : nullptr;
 }
 
+tStFrameInfo* FrameQueue::TakeAny() {
+    const std::lock_guard hold(leafMutex);
+    return count > 0 ? TakeOut(0) : nullptr;
+}
+
 tStFrameInfo* FrameQueue::TakeOut(std::size_t place) {
     tStFrameInfo* frame = frames[place];
     const auto begin = frames.begin() + static_cast<std::ptrdiff_t>(place);

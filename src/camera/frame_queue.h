@@ -29,6 +29,8 @@ class FrameQueue {
     /// The youngest or oldest frame that nobody holds, taken out; null when there is none.
     tStFrameInfo* TakeNewest();
     tStFrameInfo* TakeOldest();
+    /// The oldest frame, even one that is held: for the end of a camera, when no stream is left.
+    tStFrameInfo* TakeAny();
     /// The frame that the stream layer holds, or null. It stays in the queue.
     tStFrameInfo* FindHeld() const;
     std::size_t GetCount() const;

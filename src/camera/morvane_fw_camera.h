@@ -394,13 +394,59 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     std::array<char, 256> serialText{};
 
   private:
+    struct SetupStep;
+    static const SetupStep SetupSteps[];
+
     CameraResult SetupCamera() override;
     bool IsInterlaced() override;
     std::uint16_t GetMaxPacketSize() override;
     std::uint16_t GetTagCode() override;
 
+    void MakeSynchronisation();
+    void DestroySynchronisation();
+    void FreeFrames();
+
+    HALStatus ReadQuadlet(std::uint32_t address, Relaxed<std::uint32_t>& value);
+    HALStatus ReadBlock(RegisterBlock& block);
+    HALStatus ReadVersion(RegisterBlock& block, std::uint32_t directoryQuadlet);
+    CameraResult ApplyTweakDefaults();
+    CameraResult RunSetupSteps();
+    CameraResult ReadConfigurationBlock(void* data, std::uint32_t quadlets);
+    CameraResult WriteConfigurationBlock(void* data, std::uint32_t quadlets,
+                                         std::uint32_t checksum);
+
+    HALStatus StartRunLoop();
+    void StartExposeDoneThread();
+    void EndThreads();
+    void WaitForRunLoopEnd();
+    void WaitForExposeDoneEnd();
+    CameraResult StopForClose();
+    CameraResult DisconnectForClose();
+    CameraResult StartUnderStreamLock(const StreamCallbacks& callbacks, bool externalBuffers);
+    void ClearFrameInfoVector();
+
+    void DropSurplusFrame();
+    tStFrameInfo* MakeNextFrame();
+    bool ProvideBuffer(tStFrameInfo& frame);
+    void DescribeFrame(tStFrameInfo& frame);
+    std::uint64_t CalculateFrameBytes();
+
+    HALStatus WaitForFrame();
+    void ServeFrames();
+    tStFrameInfo* TakeOldestFrame();
+    void ServeFrame(tStFrameInfo* frame);
+    void DiscardFrame(tStFrameInfo* frame);
+    ZExImage* MakeImage(tStFrameInfo& frame);
+    std::uint32_t ChooseImageFormat();
+    void DeliverImage(ZExImage* image);
+    void RunShielded(void (MorvaneFWCamera::*step)());
+    void ServeExposeDone();
+
+    static void* TakeOneImage(ZImageReceivedCallbackStruct* record);
+    std::uint64_t CalculateOneImageWait();
+
     mutable std::mutex recordMutex;
-    HALCamera halCamera;  ///< Guarded by recordMutex, but for `index`, which stays.
+    HALCamera halCamera{};  // guarded by recordMutex
     bool shouldDeleteHALCamera = true;
 };
 

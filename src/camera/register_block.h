@@ -63,6 +63,12 @@ class RegisterBlock {
     std::uint32_t GetLength() const;
     std::uint32_t GetQuadletAddress(std::uint32_t quadlet) const { return address + 4 * quadlet; }
 
+    /// Takes `major` and `minor` from `version`.
+    void KeepVersionNumbers() {
+        major = version >> 16;
+        minor = version & 0xFFFF;
+    }
+
     const regVersionEntry* const table;
     Relaxed<std::uint32_t> address;
     Relaxed<std::uint32_t> version;  ///< As last read.

@@ -58,13 +58,15 @@ struct StreamingState {
     HALCondition* spareCondition = nullptr;       ///< Waited on by nobody.
     HALCondition* oneImageCondition = nullptr;    ///< GetOneImage waits here.
     HALCondition* exposeDoneCondition = nullptr;  ///< The expose thread waits here.
-    HALCondition* runLoopCondition = nullptr;     ///< CloseCamera waits here for the run loop.
-    std::atomic<ZExImage*> oneImage{nullptr};     ///< Owned until GetOneImage hands it out.
+    HALCondition* pauseCondition = nullptr;    ///< Never signalled: the pauses of a polling wait.
+    std::atomic<ZExImage*> oneImage{nullptr};  ///< Owned until GetOneImage hands it out.
     Relaxed<bool> oneImageReady{false};
     Relaxed<bool> isStreaming{false};
     Relaxed<bool> runLoopActive{false};     ///< Keeps the run loop alive.
     Relaxed<bool> exposeDoneActive{false};  ///< Keeps the expose thread alive.
-    std::atomic<bool> runLoopEnded{true};   ///< Release at the loop's end, acquire where it counts.
+    /// The last word that a thread writes before it ends: release there, acquire where it counts.
+    std::atomic<bool> runLoopEnded{true};
+    std::atomic<bool> exposeDoneEnded{true};
     FrameQueue frameQueue;
     ExternalBufferQueue externalBuffers;
     Relaxed<bool> bigEndian{false};  ///< Goes to each image; nothing ever sets it.
