@@ -64,6 +64,7 @@ struct CameraContext {
 
     mutable std::mutex queueMutex;
     mutable std::mutex settingsMutex;
+    std::mutex postMutex;  ///< One run of `postPipeline` at a time: a grab and a delivery may meet.
 };
 
 /// Makes the context of a camera that has just been opened and puts the wheel into the camera's own

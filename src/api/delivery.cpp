@@ -1,0 +1,270 @@
+#include "api/delivery.h"
+
+#include "api/camera_context.h"
+#include "api/entry_queue.h"
+#include "api/exported_call.h"
+#include "api/frame_export.h"
+#include "api/send_settings.h"
+#include "api/settings_block.h"
+#include "diagnostics/log.h"
+#include "imaging/ex_image.h"
+
+// Threads. ExposeDone runs on the camera's exposure thread, ImageReceived on its run loop; client
+// threads queue, abort and close meanwhile. The order between the two for one frame is open.
+//
+// Locks. ExposeDone holds `queueLock`, unless settings are being sent, and gives it back around
+// every callback and every send. ImageReceived holds `deliveryLock` throughout and never takes
+// `queueLock`. The entry at work is held, so that an abort or an image may take it out of the queue
+// meanwhile.
+
+namespace ZV {
+
+namespace {
+
+constexpr const char* ExposeDoneName = "ExposeDone";
+constexpr const char* ImageReceivedName = "ImageReceived";
+
+/// Holds an entry of the queue for the length of a block.
+class EntryHold {
+  public:
+    EntryHold(CameraContext& holder, QueueEntry* held) : context(holder), entry(held) {}
+    ~EntryHold() { LetGoOfEntry(context, entry); }
+    EntryHold(const EntryHold&) = delete;
+    EntryHold& operator=(const EntryHold&) = delete;
+
+    explicit operator bool() const { return entry != nullptr; }
+    QueueEntry& operator*() const { return *entry; }
+    QueueEntry* operator->() const { return entry; }
+
+  private:
+    CameraContext& context;
+    QueueEntry* entry;
+};
+
+/// `queueLock` of ExposeDone: taken unless settings are being sent, whose thread holds it already.
+class QueueHold {
+  public:
+    explicit QueueHold(CameraContext& context)
+        : queueLock(*context.queueLock), isHeld(context.sendInProgress == 0) {
+        Retake();
+    }
+    ~QueueHold() { GiveBack(); }
+    QueueHold(const QueueHold&) = delete;
+    QueueHold& operator=(const QueueHold&) = delete;
+
+    /// Runs `action` with the lock given back. It is taken again only if it was held: otherwise
+    /// taking it would wait for the very send that this call must not wait for.
+    template <typename Action>
+    void RunReleased(Action&& action) {
+        GiveBack();
+        const Retaking retaking{*this};
+        action();
+    }
+
+  private:
+    struct Retaking {
+        QueueHold& hold;
+        ~Retaking() { hold.Retake(); }
+    };
+
+    void GiveBack() {
+        if (isHeld) queueLock.Signal();
+    }
+    void Retake() {
+        if (isHeld) queueLock.Wait();
+    }
+
+    ZSemaphore& queueLock;
+    const bool isHeld;
+};
+
+void CallClient(const QueueEntry& entry, std::uint32_t errorCode, std::uint32_t flags) {
+    entry.callback(entry.userPrivate, entry.userData, errorCode, flags);
+}
+
+bool WantsCall(const QueueEntry& entry, std::uint32_t event) {
+    return (entry.flags & event) != 0 && entry.callback != nullptr;
+}
+
+// ---- An exposure has ended ----
+
+/// The entry that an exposure belongs to: the first one, or the one behind it if the first has had
+/// its exposure callback already, with one settings change in between passed over.
+std::uint32_t ChooseExposedEntry(CameraContext& context) {
+    const EntryHold first(context, HoldEntry(context, 0));
+    if (!first || first->exposeDoneCalled != 1) return 0;
+    if (GetQueueCount(context) <= 1 || context.abortRequested != 0) return 0;
+    const EntryHold second(context, HoldEntry(context, 1));
+    if (!second || second->kind == QueueKindFrame) return 1;
+    if (GetQueueCount(context) <= 2 || context.abortRequested != 0) return 1;
+    return 2;
+}
+
+void CallExposeDone(CameraContext& context, QueueHold& queueHold, QueueEntry& entry) {
+    if (context.abortRequested != 0) {
+        ZLogMessage(ExposeDoneName,
+                    "Not calling expose done callback because Zentara_Abort was called");
+        return;
+    }
+    if (entry.exposeDoneCalled == 1) {
+        ZLogMessage(ExposeDoneName,
+                    "Not calling expose done callback  for frame %d because it's already been "
+                    "called for this frame",
+                    entry.userData);
+        return;
+    }
+    if (entry.callback == nullptr) {
+        ZLogMessage(ExposeDoneName, "Not calling expose done callback because it is null");
+        return;
+    }
+    bool isOurs = false;
+    queueHold.RunReleased([&] {
+        isOurs = ClaimExposeDone(context, entry);
+        if (isOurs) CallClient(entry, zerrNone, zcbExposeDone);
+    });
+    if (!isOurs) return;
+    ZLogMessage(ExposeDoneName, "Called expose done callback for frame number %d", entry.userData);
+}
+
+/// Applies the settings change behind a frame whose pixels are still on the way, so that it is in
+/// force for the next exposure.
+void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold) {
+    if (context.abortRequested != 0 || context.sendInProgress != 0) return;
+    const EntryHold change(context, TakeSettingsEntry(context, /*index=*/1, /*countMin=*/2));
+    if (!change) return;
+    ZentaraResult result = zerrNone;
+    queueHold.RunReleased([&] { result = SendSettings(change->camera, change->settings); });
+    if (!WantsCall(*change, zcbFrameDone)) return;
+    queueHold.RunReleased([&] { CallClient(*change, result, change->flags); });
+}
+
+void ServeExposure(CameraContext& context) {
+    QueueHold queueHold(context);
+    if (GetQueueCount(context) == 0 || context.abortRequested != 0) {
+        ZLogMessage(ExposeDoneName,
+                    "Not calling expose done callback because the queue is empty or abort was "
+                    "called");
+        return;
+    }
+    const std::uint32_t index = ChooseExposedEntry(context);
+    const EntryHold chosen(context, HoldEntry(context, index));
+    if (!chosen || chosen->kind != QueueKindFrame) return;
+    if ((chosen->flags & zcbExposeDone) != 0) CallExposeDone(context, queueHold, *chosen);
+    if (index == 0) ApplySettingsEarly(context, queueHold);
+}
+
+// ---- An image has arrived ----
+
+/// The exposure callback always comes before the frame callback: it is made up for here.
+void MakeUpForExposeDone(CameraContext& context, QueueEntry& entry) {
+    if (entry.kind != QueueKindFrame || (entry.flags & zcbExposeDone) == 0) return;
+    if (entry.exposeDoneCalled != 0) return;
+    ZLogMessage(ImageReceivedName,
+                "Received a frame but the expose done callback wasn't called.  Calling it now "
+                "before returning the frame.");
+    if (context.abortRequested != 0) return;
+    if (entry.callback == nullptr) {
+        ZLogMessage(ImageReceivedName, "Not calling expose done callback because it is null");
+    }
+    if (!ClaimExposeDone(context, entry) || entry.callback == nullptr) return;
+    CallClient(entry, zerrNone, zcbExposeDone);
+}
+
+void CallFrameDone(CameraContext& context, const QueueEntry& entry) {
+    if ((entry.flags & zcbFrameDone) == 0) {
+        ZLogMessage(ImageReceivedName,
+                    "Not calling framedone callback the user doesn't want framedone callbacks");
+        return;
+    }
+    if (context.abortRequested != 0) {
+        ZLogMessage(ImageReceivedName,
+                    "Not calling framedone callback because Zentara_Abort was called");
+        return;
+    }
+    if (entry.callback == nullptr) {
+        ZLogMessage(ImageReceivedName,
+                    "Not calling framedone callback because the callback in null");
+        return;
+    }
+    ZLogFrame(ImageReceivedName, *entry.frame);
+    CallClient(entry, entry.frame->errorCode, zcbFrameDone);
+}
+
+void DeliverFrame(CameraContext& context, const QueueEntry& entry, ZExImage* image,
+                  std::uint16_t status) {
+    if (status == FrameStatusTimedOut) {
+        entry.frame->errorCode = zerrUnplugged;
+    } else if (image != nullptr) {
+        PostProcess(context, *image);
+    }
+    // Kept: this overwrites errorCode, so zerrUnplugged stays only where no image came with it.
+    if (image != nullptr) {
+        ExportImageToFrame(entry.camera, GetLastSettings(context), *image, *entry.frame,
+                           /*copiesPixels=*/true);
+    }
+    CallFrameDone(context, entry);
+}
+
+void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
+    const SemaphoreHold delivery(*context.deliveryLock);
+    {
+        const EntryHold head(context, HoldEntry(context, 0));
+        if (!head) return;
+        MakeUpForExposeDone(context, *head);
+    }
+    const EntryHold entry(context, TakeFirstEntry(context));
+    if (!entry) return;
+    // Kept: a change that is the last entry stays. At the next image it is taken out as the entry
+    // itself, dropped without being sent, and that image is dropped with it.
+    const EntryHold change(context, TakeSettingsEntry(context, /*index=*/0, /*countMin=*/2));
+    if (entry->kind == QueueKindFrame) DeliverFrame(context, *entry, image, status);
+    if (!change) return;
+    const ZentaraResult result = SendSettings(change->camera, change->settings);
+    if (WantsCall(*change, zcbFrameDone)) CallClient(*change, result, change->flags);
+}
+
+}  // namespace
+
+void* ExposeDone(void* refCon) {
+    ZLogEnter(ExposeDoneName);
+    CameraContext* const context = GetCameraContext(*static_cast<ZCamera*>(refCon));
+    if (context == nullptr) {
+        ZLogLeave(ExposeDoneName, zerrBadParameter);
+        return nullptr;
+    }
+    (void)Guarded([&] {
+        ServeExposure(*context);
+        return ZentaraResult{zerrNone};
+    });
+    ZLogLeave(ExposeDoneName, zerrNone);
+    return nullptr;
+}
+
+void* ImageReceived(ZImageReceivedCallbackStruct* record) {
+    ZLogEnter(ImageReceivedName);
+    CameraContext* const context = GetCameraContext(*static_cast<ZCamera*>(record->refCon));
+    if (context == nullptr) {
+        ZCamera::FreeImage(record->image);
+        ZLogLeave(ImageReceivedName, zerrBadParameter);
+        return nullptr;
+    }
+    (void)Guarded([&] {
+        ServeImage(*context, record->image, record->status);
+        return ZentaraResult{zerrNone};
+    });
+    ZCamera::FreeImage(record->image);
+    ZLogLeave(ImageReceivedName, zerrNone);
+    return nullptr;
+}
+
+void PostProcess(CameraContext& context, ZExImage& image) {
+    if (context.postProcessing != 1) return;
+    const std::uint32_t format = GetSettingsWord(GetLastSettings(context), zprmImageFormat);
+    if (format == zfmtRaw8 || format == zfmtRaw16) return;
+    const std::lock_guard hold(context.postMutex);
+    bool isComplete = true;
+    (void)context.postPipeline->ProcessImage(&image,
+                                             &isComplete);  // the image says what became of it
+}
+
+}  // namespace ZV
