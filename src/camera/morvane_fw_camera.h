@@ -391,7 +391,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     StreamingState streaming;
     GainModel gainModel;
     std::int32_t defaultGaindB = 0;
-    std::array<char, 256> serialText{};
+    std::mutex serialMutex;  ///< Leaf.
+    std::array<char, 256> serialText{};  ///< Written under serialMutex.
 
   private:
     struct SetupStep;
