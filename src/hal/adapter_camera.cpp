@@ -241,9 +241,9 @@ HALStatus AdapterCameraStopStreaming(HALCamera camera, std::uint32_t) {
     return HALOk;
 }
 
-HALStatus AdapterCameraWaitingForFrame(HALCamera camera) {
+HALStatus AdapterCameraWaitingForFrame(HALCamera camera, const FrameArrivals* arrivals) {
     AdapterContext* const context = GetAdapterContext(camera);
-    if (context != nullptr) context->frameEvent.Wait();
+    if (context != nullptr) context->frameEvent.Wait(arrivals);
     return HALOk;
 }
 

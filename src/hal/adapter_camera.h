@@ -54,7 +54,8 @@ HALStatus AdapterCameraRelease(HALCamera camera);
 [[nodiscard]] HALStatus AdapterCameraStartStreaming(HALCamera camera, std::uint32_t streamRegister,
                                                     std::uint16_t streamingVersion);
 [[nodiscard]] HALStatus AdapterCameraStopStreaming(HALCamera camera, std::uint32_t streamRegister);
-[[nodiscard]] HALStatus AdapterCameraWaitingForFrame(HALCamera camera);
+[[nodiscard]] HALStatus AdapterCameraWaitingForFrame(HALCamera camera,
+                                                     const FrameArrivals* arrivals);
 [[nodiscard]] HALStatus AdapterCameraStopWaitingForFrame(HALCamera camera);
 
 /// What a bus call that is missing answers.

@@ -18,10 +18,11 @@ void FrameGate::Close() {
     (void)SignalEvent(frameEvent);
 }
 
-void FrameGate::Wait() {
+void FrameGate::Wait(const FrameArrivals* arrivals) {
     ClearEvent(frameEvent);
-    // Looked at behind the clearing, so that the signal of a close is never the one that is lost.
+    // Looked at behind the clearing, so that the signal that counts is never the one that is lost.
     if (!isOpen.load()) return;
+    if (arrivals != nullptr && arrivals->count->load() != arrivals->seen) return;
     (void)WaitForEvent(frameEvent, WaitForEver);
 }
 

@@ -3,6 +3,7 @@
 #include <atomic>
 #include <cstdint>
 
+#include "hal/hal.h"
 #include "hal/platform/event.h"
 
 namespace ZV {
@@ -22,7 +23,9 @@ class FrameGate {
     void Close();
     /// Takes earlier signals back and waits without limit for the next Release. A signal between
     /// the end of one wait and the next call is lost.
-    void Wait();
+    void Wait() { Wait(nullptr); }
+    /// The same, but returns at once when there have been arrivals since. Null is none.
+    void Wait(const FrameArrivals* arrivals);
     void Release();
 
   private:

@@ -66,7 +66,7 @@ void CameraAsyncWriteCallback(const std::uint8_t* bytes, std::uint32_t count);
 [[nodiscard]] HALStatus FWCameraStartStreaming(HALCamera camera, std::uint32_t streamRegister,
                                                std::uint16_t streamingVersion);
 [[nodiscard]] HALStatus FWCameraStopStreaming(HALCamera camera, std::uint32_t streamRegister);
-[[nodiscard]] HALStatus FWCameraWaitingForFrame(HALCamera camera);
+[[nodiscard]] HALStatus FWCameraWaitingForFrame(HALCamera camera, const FrameArrivals* arrivals);
 [[nodiscard]] HALStatus FWCameraStopWaitingForFrame(HALCamera camera);
 
 }  // namespace ZV

@@ -180,9 +180,9 @@ HALStatus FWCameraStopStreaming(HALCamera camera, std::uint32_t streamRegister) 
     return WriteStreamRegister(camera, streamRegister, 0);
 }
 
-HALStatus FWCameraWaitingForFrame(HALCamera camera) {
+HALStatus FWCameraWaitingForFrame(HALCamera camera, const FrameArrivals* arrivals) {
     FWDeviceContext* const context = GetFWContext(camera);
-    if (context != nullptr) context->frameEvent.Wait();
+    if (context != nullptr) context->frameEvent.Wait(arrivals);
     return HALOk;
 }
 

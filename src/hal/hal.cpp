@@ -25,7 +25,7 @@ struct BackEnd {
     HALStatus (*writeData)(HALCamera, std::uint32_t, const std::uint32_t*, std::uint32_t);
     HALStatus (*startStreaming)(HALCamera, std::uint32_t, std::uint16_t);
     HALStatus (*stopStreaming)(HALCamera, std::uint32_t);
-    HALStatus (*waitingForFrame)(HALCamera);
+    HALStatus (*waitingForFrame)(HALCamera, const FrameArrivals*);
     HALStatus (*stopWaitingForFrame)(HALCamera);
 };
 
@@ -203,7 +203,7 @@ HALStatus HAL_CameraStopStreaming(HALCamera* camera, std::uint32_t streamRegiste
 }
 
 HALStatus HAL_CameraWaitingForFrame(HALCamera* camera) {
-    return Dispatch(&BackEnd::waitingForFrame, camera);
+    return Dispatch(&BackEnd::waitingForFrame, camera, nullptr);
 }
 
 HALStatus HAL_CameraStopWaitingForFrame(HALCamera* camera) {
@@ -211,4 +211,9 @@ HALStatus HAL_CameraStopWaitingForFrame(HALCamera* camera) {
 }
 
 }  // extern "C"
+
+HALStatus WaitForFrameArrival(HALCamera* camera, const FrameArrivals& arrivals) {
+    return Dispatch(&BackEnd::waitingForFrame, camera, &arrivals);
+}
+
 }  // namespace ZV

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 
@@ -141,6 +142,16 @@ ZENTARA_API HALStatus FWCameraReallocateBandwidth(HALCamera* camera, std::uint16
 /// Ends a HAL thread's wait record check: true when HAL_ThreadCreate could start its thread. A thread that
 /// could not be made counts as ended.
 bool IsHALThreadStarted(const HALThread* thread);
+
+/// What a waiter for frames has seen: it goes on at once when `count` no longer holds `seen`.
+struct FrameArrivals {
+    const std::atomic<std::uint32_t>* count;
+    std::uint32_t seen;
+};
+
+/// HAL_CameraWaitingForFrame without its lost signals: whoever raises `arrivals.count` before the
+/// signal is heard, also between two waits.
+HALStatus WaitForFrameArrival(HALCamera* camera, const FrameArrivals& arrivals);
 
 /// `halOutputWrites` and `halOutputReads`: traces are printed only while the switch holds exactly 1.
 std::uint8_t GetHalOutputReads();
