@@ -2,9 +2,9 @@
 
 #include <cstdint>
 
-/// Control of the simulated driver, for tests and the program. The library itself reaches the simulation
-/// through the kernel driver's table alone (hal/platform/kernel_driver.h), which the module exports as
-/// `ZentaraSimulation_GetKernelDriver`.
+/// Control of the simulated driver, for tests and the program. The library itself reaches the
+/// simulation through the kernel driver's table alone (hal/platform/kernel_driver.h), which the
+/// module exports as `ZentaraSimulation_GetKernelDriver`.
 #if defined(_WIN32)
 #if defined(ZENTARA_BUILDING_SIMULATION)
 #define ZENTARA_SIMULATION_API __declspec(dllexport)
@@ -17,18 +17,20 @@
 
 extern "C" {
 
-/// Reads a scenario (a built-in name, `model:NAME`, or the path of a JSON file) without starting it.
-/// 0, or 1 with the reason and the place in the file in `message`, terminated.
-ZENTARA_SIMULATION_API std::uint32_t ZentaraSimulation_CheckScenario(const char* scenario, char* message,
+/// Reads a scenario (a built-in name, `model:NAME`, or the path of a JSON file) without starting
+/// it. 0, or 1 with the reason and the place in the file in `message`, terminated.
+ZENTARA_SIMULATION_API std::uint32_t ZentaraSimulation_CheckScenario(const char* scenario,
+                                                                     char* message,
                                                                      std::uint32_t messageBytes);
 
-/// Adds a fault to the running bus: a JSON object as in the list `faults` of a scenario's camera. 0, or 1
-/// with a message.
-ZENTARA_SIMULATION_API std::uint32_t ZentaraSimulation_AddFault(std::uint32_t camera, const char* json,
-                                                                char* message, std::uint32_t messageBytes);
+/// Adds a fault to the running bus: a JSON object as in the list `faults` of a scenario's camera.
+/// 0, or 1 with a message.
+ZENTARA_SIMULATION_API std::uint32_t ZentaraSimulation_AddFault(std::uint32_t camera,
+                                                                const char* json, char* message,
+                                                                std::uint32_t messageBytes);
 
-/// Takes a camera off the bus (pended requests end with an error, its handles answer errors) and puts it
-/// back. `camera` is its position in the scenario. 0, or 1 for a camera that is not there.
+/// Takes a camera off the bus (pended requests end with an error, its handles answer errors) and
+/// puts it back. `camera` is its position in the scenario. 0, or 1 for a camera that is not there.
 ZENTARA_SIMULATION_API std::uint32_t ZentaraSimulation_Unplug(std::uint32_t camera);
 ZENTARA_SIMULATION_API std::uint32_t ZentaraSimulation_Plug(std::uint32_t camera);
 
