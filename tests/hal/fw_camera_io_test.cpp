@@ -1,0 +1,352 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstring>
+#include <regex>
+#include <thread>
+#include <vector>
+
+#include "hal/control_records.h"
+#include "hal/debug_output_file.h"
+#include "hal/hal_world.h"
+#include "support/wait_until.h"
+
+namespace ZV::Test {
+namespace {
+
+struct FWCameraIO : testing::Test {
+    FWCameraIO() : camera(mono.Connect()) {}
+
+    HALWorld mono{"mono"};
+    HALCamera* camera;
+};
+
+TEST_F(FWCameraIO, AReadBringsHostOrderQuadletsOfTheAddress) {
+    ASSERT_TRUE(mono.world.Poke(ScratchAddress, 0x01020304));
+    std::uint32_t data[2] = {};
+
+    ASSERT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, data, 2));
+
+    EXPECT_EQ(0x01020304u, data[0]);
+    const std::vector<TraceRecord> requests = mono.TakeRequests();
+    ASSERT_EQ(1u, requests.size());
+    EXPECT_EQ(FW_IOCTL_ASYNC_READ, requests[0].code);
+    EXPECT_EQ(48u, requests[0].inputBytes);
+    EXPECT_EQ(8u, requests[0].outputBytes);
+    EXPECT_TRUE(requests[0].wasPended);
+}
+
+TEST_F(FWCameraIO, AWriteSendsHostOrderQuadletsAndLeavesTheCallersDataAlone) {
+    const std::uint32_t data[] = {0x01020304, 0x05060708};
+
+    ASSERT_EQ(HALOk, HAL_CameraWriteData(camera, ScratchAddress, data, 2));
+
+    EXPECT_EQ(0x01020304u, mono.world.Peek(ScratchAddress));
+    EXPECT_EQ(0x05060708u, mono.world.Peek(ScratchAddress + 4));
+    EXPECT_EQ(0x01020304u, data[0]);
+    const std::vector<TraceRecord> requests = mono.TakeRequests();
+    ASSERT_EQ(1u, requests.size());
+    EXPECT_EQ(48u, requests[0].inputBytes);
+    EXPECT_EQ(0u, requests[0].outputBytes);
+}
+
+TEST_F(FWCameraIO, AWriteOfNullDataSendsNothingAndGivesItsMutexBack) {
+    const std::uint32_t value = 5;
+
+    EXPECT_EQ(HALNullData, HAL_CameraWriteData(camera, ScratchAddress, nullptr, 1));
+
+    EXPECT_TRUE(mono.TakeCodes().empty());
+    HALStatus status = HALUnknownFault;
+    std::thread other([&] { status = HAL_CameraWriteData(camera, ScratchAddress, &value, 1); });
+    other.join();
+    EXPECT_EQ(HALOk, status);
+}
+
+TEST_F(FWCameraIO, AReadIntoNullSendsNothing) {
+    EXPECT_EQ(HALNullData, HAL_CameraReadData(camera, ScratchAddress, nullptr, 1));
+
+    EXPECT_TRUE(mono.TakeCodes().empty());
+}
+
+TEST_F(FWCameraIO, AReadOfNoQuadletsIsSentWithAnOutputLengthOfZero) {
+    std::uint32_t data = 0xDDDDDDDD;
+
+    EXPECT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 0));
+
+    EXPECT_EQ(0xDDDDDDDDu, data);
+    const std::vector<TraceRecord> requests = mono.TakeRequests();
+    ASSERT_EQ(1u, requests.size());
+    EXPECT_EQ(0u, requests[0].outputBytes);
+}
+
+TEST_F(FWCameraIO, LengthsBeyond32BitsAreRefusedUnsent) {
+    std::uint32_t data = 0;
+
+    EXPECT_EQ(HALReadFailed, HAL_CameraReadData(camera, ScratchAddress, &data, 0x40000000));
+    EXPECT_EQ(HALWriteFailed, HAL_CameraWriteData(camera, ScratchAddress, &data, 0x3FFFFFF7));
+
+    EXPECT_TRUE(mono.TakeCodes().empty());
+}
+
+TEST_F(FWCameraIO, AnUnconnectedRecordIsNotOpen) {
+    ASSERT_EQ(HALOk, HAL_CameraDisconnect(camera));
+    std::uint32_t data = 0;
+
+    EXPECT_EQ(HALDeviceNotOpen, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(HALDeviceNotOpen, HAL_CameraWriteData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(HALDeviceNotOpen, HAL_CameraWriteData(camera, ScratchAddress, nullptr, 1));
+}
+
+TEST_F(FWCameraIO, ARefusedReadIs18) {
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"failRequest","code":"FW_IOCTL_ASYNC_READ"})"));
+    std::uint32_t data = 0;
+
+    EXPECT_EQ(HALReadFailed, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+}
+
+TEST_F(FWCameraIO, APendedReadThatFailsIs18AndIsNotReversed) {
+    ASSERT_TRUE(mono.world.AddFault(
+        R"({"kind":"failRequest","code":"FW_IOCTL_ASYNC_READ","error":1167,"pended":true})"));
+    std::uint32_t data = 0x01020304;
+
+    EXPECT_EQ(HALReadFailed, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(0x01020304u, data);
+}
+
+TEST_F(FWCameraIO, ARefusedWriteIs19) {
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"failRequest","code":"FW_IOCTL_ASYNC_WRITE"})"));
+    const std::uint32_t data = 0;
+
+    EXPECT_EQ(HALWriteFailed, HAL_CameraWriteData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(HALOk, HAL_CameraWriteData(camera, ScratchAddress, &data, 1));
+}
+
+TEST_F(FWCameraIO, APendedWriteThatFailsPassesTheSystemsErrorNumberOn) {
+    ASSERT_TRUE(mono.world.AddFault(
+        R"({"kind":"failRequest","code":"FW_IOCTL_ASYNC_WRITE","error":1167,"pended":true})"));
+    const std::uint32_t data = 0;
+
+    EXPECT_EQ(1167u, HAL_CameraWriteData(camera, ScratchAddress, &data, 1));
+}
+
+TEST_F(FWCameraIO, NothingIsTriedTwice) {
+    ASSERT_TRUE(mono.world.AddFault(
+        R"({"kind":"failRequest","code":"FW_IOCTL_ASYNC_READ","pended":true})"));
+    std::uint32_t data = 0;
+
+    (void)HAL_CameraReadData(camera, ScratchAddress, &data, 1);
+
+    EXPECT_EQ(1u, mono.TakeCodes().size());
+}
+
+TEST_F(FWCameraIO, AReadThatIsAnsweredAtOnceStaysInBusOrder) {
+    ASSERT_TRUE(mono.world.Poke(ScratchAddress, 0x01020304));
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"answerAtOnce","code":"FW_IOCTL_ASYNC_READ"})"));
+    std::uint32_t data = 0;
+
+    ASSERT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(0x04030201u, data);
+
+    ASSERT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(0x01020304u, data);
+}
+
+TEST_F(FWCameraIO, AWriteThatIsAnsweredAtOnceIsDone) {
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"answerAtOnce","code":"FW_IOCTL_ASYNC_WRITE"})"));
+    const std::uint32_t data = 0x01020304;
+
+    EXPECT_EQ(HALOk, HAL_CameraWriteData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ(data, mono.world.Peek(ScratchAddress));
+}
+
+TEST_F(FWCameraIO, AShortAnswerIsASuccess) {
+    ASSERT_TRUE(
+        mono.world.AddFault(R"({"kind":"shortAnswer","code":"FW_IOCTL_ASYNC_READ","bytes":0})"));
+    std::uint32_t data = 0;
+
+    EXPECT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+}
+
+TEST_F(FWCameraIO, AReadThatNeverCompletesEndsWhenTheCameraGoesAway) {
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"neverComplete","code":"FW_IOCTL_ASYNC_READ"})"));
+    std::atomic<HALStatus> status{HALUnknownFault};
+    std::thread reader([&] {
+        std::uint32_t data = 0;
+        status = HAL_CameraReadData(camera, ScratchAddress, &data, 1);
+    });
+    ASSERT_TRUE(WaitUntil([&] { return mono.world.GetState().pendedRequests == 1; }));
+
+    ASSERT_TRUE(mono.world.Unplug());
+    reader.join();
+
+    EXPECT_EQ(HALReadFailed, status.load());
+}
+
+TEST_F(FWCameraIO, AReadPassesByAWriteThatIsPended) {
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"neverComplete","code":"FW_IOCTL_ASYNC_WRITE"})"));
+    std::atomic<HALStatus> status{HALOk};
+    std::thread writer([&] {
+        const std::uint32_t value = 1;
+        status = HAL_CameraWriteData(camera, ScratchAddress, &value, 1);
+    });
+    ASSERT_TRUE(WaitUntil([&] { return mono.world.GetState().pendedRequests == 1; }));
+
+    std::uint32_t data = 0;
+    EXPECT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+
+    ASSERT_TRUE(mono.world.Unplug());
+    writer.join();
+    EXPECT_EQ(1167u, status.load());
+}
+
+TEST_F(FWCameraIO, WritesWaitForEachOther) {
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"neverComplete","code":"FW_IOCTL_ASYNC_WRITE"})"));
+    std::atomic<int> ended{0};
+    const auto write = [&] {
+        const std::uint32_t value = 1;
+        (void)HAL_CameraWriteData(camera, ScratchAddress, &value, 1);
+        ++ended;
+    };
+    std::thread first(write);
+    ASSERT_TRUE(WaitUntil([&] { return mono.world.GetState().pendedRequests == 1; }));
+    const std::uint32_t served = mono.world.GetState().requestsServed;
+    std::thread second(write);
+    EXPECT_FALSE(WaitUntil([&] { return mono.world.GetState().requestsServed != served; },
+                           std::chrono::milliseconds(50)));
+
+    ASSERT_TRUE(mono.world.Unplug());
+    first.join();
+    second.join();
+
+    EXPECT_EQ(2, ended.load());
+}
+
+TEST_F(FWCameraIO, ReadsAndWritesOfManyThreadsKeepTheirDataApart) {
+    constexpr std::uint32_t ThreadCount = 4;
+    std::vector<std::thread> threads;
+    std::atomic<std::uint32_t> wrong{0};
+    for (std::uint32_t i = 0; i < ThreadCount; ++i) {
+        threads.emplace_back([&, i] {
+            for (std::uint32_t k = 0; k < 50; ++k) {
+                const std::uint32_t written = i << 16 | k;
+                std::uint32_t read = 0;
+                const std::uint32_t address = ScratchAddress + 4 * i;
+                if (HAL_CameraWriteData(camera, address, &written, 1) != HALOk) ++wrong;
+                if (HAL_CameraReadData(camera, address, &read, 1) != HALOk) ++wrong;
+                if (read != written) ++wrong;
+            }
+        });
+    }
+    for (std::thread& thread : threads) thread.join();
+
+    EXPECT_EQ(0u, wrong.load());
+}
+
+struct RegisterTrace : FWCameraIO {
+    RegisterTrace() : output(mono.world.GetFolder()) {
+        (void)HAL_CameraSetShouldOutputReads(0, 0);
+        (void)HAL_CameraSetShouldOutputWrites(0, 0);
+    }
+    ~RegisterTrace() override {
+        (void)HAL_CameraSetShouldOutputReads(0, 0);
+        (void)HAL_CameraSetShouldOutputWrites(0, 0);
+    }
+
+    /// The output with the time of day replaced.
+    std::string Take() {
+        return std::regex_replace(
+            output.Take(), std::regex("[0-2][0-9]:[0-5][0-9]:[0-6][0-9]\\.[0-9]{1,3}\n"), "TIME\n");
+    }
+
+    DebugOutputFile output;
+};
+
+TEST_F(RegisterTrace, AWriteShowsTheValuesBeforeTheirReversal) {
+    ASSERT_EQ(HALOk, HAL_CameraSetShouldOutputWrites(0, 1));
+    const std::uint32_t data[] = {0x01020304, 0xA};
+
+    ASSERT_EQ(HALOk, HAL_CameraWriteData(camera, ScratchAddress, data, 2));
+
+    EXPECT_EQ(
+        "\n---\nTIME\nAsync write to address 0xd0002010\nLength in bytes: 8\n"
+        "Hex data: 01020304 0000000a \n",
+        Take());
+}
+
+TEST_F(RegisterTrace, AReadShowsTheValuesAfterTheirReversal) {
+    ASSERT_EQ(HALOk, HAL_CameraSetShouldOutputReads(0, 1));
+    ASSERT_TRUE(mono.world.Poke(ScratchAddress, 0x01020304));
+    std::uint32_t data = 0;
+
+    ASSERT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+
+    EXPECT_EQ(
+        "\n---\nTIME\nAsync read from address 0xd0002010\nLength in bytes: 4\n"
+        "Hex data: 01020304 \n",
+        Take());
+}
+
+TEST_F(RegisterTrace, AReadOfNoQuadletsSaysThatNoDataAreAvailable) {
+    ASSERT_EQ(HALOk, HAL_CameraSetShouldOutputReads(0, 1));
+    std::uint32_t data = 0;
+
+    ASSERT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 0));
+
+    EXPECT_EQ(
+        "\n---\nTIME\nAsync read from address 0xd0002010\n"
+        "Packet data is not available because the length is 0 bytes.\n\n",
+        Take());
+}
+
+TEST_F(RegisterTrace, AFailedReadIsPrintedAllTheSame) {
+    ASSERT_EQ(HALOk, HAL_CameraSetShouldOutputReads(0, 1));
+    ASSERT_TRUE(mono.world.AddFault(R"({"kind":"failRequest","code":"FW_IOCTL_ASYNC_READ"})"));
+    std::uint32_t data = 7;
+
+    ASSERT_EQ(HALReadFailed, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+
+    EXPECT_NE(std::string::npos, Take().find("Hex data: 00000007 \n"));
+}
+
+TEST_F(RegisterTrace, NullDataArePrintedAsNone) {
+    ASSERT_EQ(HALOk, HAL_CameraSetShouldOutputWrites(0, 1));
+
+    ASSERT_EQ(HALNullData, HAL_CameraWriteData(camera, ScratchAddress, nullptr, 1));
+
+    EXPECT_EQ("\n---\nTIME\nAsync write to address 0xd0002010\nLength in bytes: 4\nHex data: \n",
+              Take());
+}
+
+TEST_F(RegisterTrace, ASwitchWorksOnlyWhileItHoldsExactlyOne) {
+    std::uint32_t data = 0;
+    for (const std::uint8_t value : std::initializer_list<std::uint8_t>{0, 2, 255}) {
+        (void)HAL_CameraSetShouldOutputReads(0, value);
+        (void)HAL_CameraSetShouldOutputWrites(0, value);
+        EXPECT_EQ(value, GetHalOutputReads());
+        EXPECT_EQ(value, GetHalOutputWrites());
+
+        ASSERT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+        ASSERT_EQ(HALOk, HAL_CameraWriteData(camera, ScratchAddress, &data, 1));
+    }
+
+    EXPECT_EQ("", Take());
+}
+
+TEST_F(RegisterTrace, ARecordOfNoKindHasAReadTraceButNoWriteTrace) {
+    (void)HAL_CameraSetShouldOutputReads(0, 1);
+    (void)HAL_CameraSetShouldOutputWrites(0, 1);
+    HALCamera stranger = *camera;
+    stranger.kind = 2;
+    std::uint32_t data = 9;
+
+    EXPECT_EQ(HALOk, HAL_CameraWriteData(&stranger, ScratchAddress, &data, 1));
+    EXPECT_EQ("", Take());
+
+    EXPECT_EQ(HALOk, HAL_CameraReadData(&stranger, ScratchAddress, &data, 1));
+    EXPECT_NE(std::string::npos, Take().find("Hex data: 00000009 \n"));
+    EXPECT_TRUE(mono.TakeCodes().empty());
+}
+
+}  // namespace
+}  // namespace ZV::Test
