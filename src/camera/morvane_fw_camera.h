@@ -14,6 +14,8 @@
 
 namespace ZV {
 
+struct BusConnection;
+
 /// The concrete camera: register model, imaging settings, gain, bandwidth and streaming over the
 /// HAL. Models override what they do differently.
 class ZENTARA_API MorvaneFWCamera : public ZCamera {
@@ -381,6 +383,9 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     HALCamera GetHALCamera() const;
     void SetHALCamera(const HALCamera& newRecord);
 
+    /// Speed and fastest packet of the present connection, 0 where not known.
+    BusConnection ReadBusConnection();
+
     /// Takes or gives a lock; a failure prints HAL_ErrorMessage and is translated.
     static CameraResult TakeLock(HALSemaphore* lock);
     static CameraResult GiveLock(HALSemaphore* lock);
@@ -391,7 +396,7 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     StreamingState streaming;
     GainModel gainModel;
     std::int32_t defaultGaindB = 0;
-    std::mutex serialMutex;  ///< Leaf.
+    std::mutex serialMutex;              ///< Leaf.
     std::array<char, 256> serialText{};  ///< Written under serialMutex.
 
   private:
@@ -402,6 +407,21 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     bool IsInterlaced() override;
     std::uint16_t GetMaxPacketSize() override;
     std::uint16_t GetTagCode() override;
+
+    /// Stop step, then the field.
+    CameraResult ChangeField(const RegisterField& field, std::uint32_t value);
+    CameraResult WriteExposure(std::uint32_t quadlet, std::uint32_t lowQuadlet,
+                               std::uint64_t nanoseconds, std::uint32_t microseconds);
+    CameraResult WriteTweak(std::uint32_t quadlet, std::uint32_t value);
+    CameraResult WriteBinning(std::uint32_t mode);
+    void FitROIToBinning(std::uint32_t mode, std::uint32_t formerMode);
+    /// True where the bus connection cannot carry full resolution at a fast readout.
+    bool IsTooFastForBus(float megahertz, std::uint32_t binning);
+    CameraResult LowerFrequencyForBus(float megahertz, std::uint32_t binning);
+    std::uint16_t GetFastestPacketSize();
+    CameraResult TakeOverSettings();
+    CameraResult RefreshConfiguration();
+    void RestartStreaming();
 
     void MakeSynchronisation();
     void DestroySynchronisation();
