@@ -439,32 +439,34 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     HALStatus StartRunLoop();
     void StartExposeDoneThread();
     void EndThreads();
+    void CleanUpThreads();
+    HALStatus WakeRunLoop();
     void WaitForRunLoopEnd();
     void WaitForExposeDoneEnd();
-    CameraResult StopForClose();
-    CameraResult DisconnectForClose();
+    HALStatus WaitForCloseOfRunLoop();
+    HALStatus Disconnect();
     CameraResult StartUnderStreamLock(const StreamCallbacks& callbacks, bool externalBuffers);
     void ClearFrameInfoVector();
 
-    void DropSurplusFrame();
-    tStFrameInfo* MakeNextFrame();
+    bool DropSurplusFrame();
     bool ProvideBuffer(tStFrameInfo& frame);
-    void DescribeFrame(tStFrameInfo& frame);
+    bool DescribeFrame(tStFrameInfo& frame);
+    bool PushHeldFrame(tStFrameInfo& frame);
     std::uint64_t CalculateFrameBytes();
 
-    HALStatus WaitForFrame();
-    void ServeFrames();
+    void ServeNextWake();
     tStFrameInfo* TakeOldestFrame();
     void ServeFrame(tStFrameInfo* frame);
     void DiscardFrame(tStFrameInfo* frame);
     ZExImage* MakeImage(tStFrameInfo& frame);
     std::uint32_t ChooseImageFormat();
     void DeliverImage(ZExImage* image);
-    void RunShielded(void (MorvaneFWCamera::*step)());
     void ServeExposeDone();
+    void RunShielded(void (MorvaneFWCamera::*step)());
 
-    static void* TakeOneImage(ZImageReceivedCallbackStruct* record);
+    CameraResult AwaitOneImage();
     std::uint64_t CalculateOneImageWait();
+    static void* TakeOneImage(ZImageReceivedCallbackStruct* record);
 
     mutable std::mutex recordMutex;
     HALCamera halCamera{};  // guarded by recordMutex

@@ -64,9 +64,13 @@ struct StreamingState {
     Relaxed<bool> isStreaming{false};
     Relaxed<bool> runLoopActive{false};     ///< Keeps the run loop alive.
     Relaxed<bool> exposeDoneActive{false};  ///< Keeps the expose thread alive.
-    /// The last word that a thread writes before it ends: release there, acquire where it counts.
-    std::atomic<bool> runLoopEnded{true};
-    std::atomic<bool> exposeDoneEnded{true};
+    /// Threads that may still touch the camera. Counting down is the last thing that a thread does:
+    /// release there, acquire where its end is waited for.
+    std::atomic<int> runLoopsAlive{0};
+    std::atomic<int> exposeThreadsAlive{0};
+    std::atomic<std::uint32_t> arrivals{0};  ///< Raised before each signal to the run loop.
+    std::uint32_t seenArrivals = 0;          ///< Bound to the run loop.
+    std::uint32_t lastImageFormat = 0;       ///< Bound to the run loop; 0 before the first frame.
     FrameQueue frameQueue;
     ExternalBufferQueue externalBuffers;
     Relaxed<bool> bigEndian{false};  ///< Goes to each image; nothing ever sets it.
