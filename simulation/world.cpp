@@ -5,7 +5,7 @@
 namespace ZV::Simulation {
 
 std::shared_ptr<World> World::Make(const Scenario& scenario, std::string* message) {
-    const std::shared_ptr<World> world(new World);
+    std::shared_ptr<World> world(new World);
     const auto trace = std::make_shared<Trace>();
     if (!scenario.trace.empty() && !trace->Open(scenario.trace, message)) return nullptr;
     std::vector<std::shared_ptr<Bus>> buses;
