@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <array>
-#include <bit>
 #include <cassert>
 #include <cstring>
 
@@ -50,54 +49,53 @@ void Advance(StreamAssembler& assembler, std::uint32_t bytes) {
     assembler.capacity -= bytes;
 }
 
-std::uint64_t LoadWord(const std::uint8_t* from) {
-    std::uint64_t word;
-    std::memcpy(&word, from, sizeof word);
-    return word;
+constexpr std::uint32_t BlockBytes = 16;
+using ReverseBlock = void (*)(std::uint8_t* to, const std::uint8_t* from);
+
+void ReverseBlockOfBytes(std::uint8_t* to, const std::uint8_t* from) {
+    std::uint64_t halves[2];
+    std::memcpy(halves, from, BlockBytes);
+    const std::uint64_t reversed[2] = {__builtin_bswap64(halves[1]), __builtin_bswap64(halves[0])};
+    std::memcpy(to, reversed, BlockBytes);
 }
 
-void StoreWord(std::uint8_t* to, std::uint64_t word) {
-    std::memcpy(to, &word, sizeof word);
-}
-
-std::uint64_t ReverseBytes(std::uint64_t word) {
-    return __builtin_bswap64(word);
-}
-
-std::uint64_t ReversePairs(std::uint64_t word) {
-    constexpr std::uint64_t LowPairs = 0x0000FFFF0000FFFF;
-    const std::uint64_t halves = std::rotl(word, 32);
-    return ((halves >> 16) & LowPairs) | ((halves & LowPairs) << 16);
+// Compilers make a few vector shuffles of this.
+void ReverseBlockOfWords(std::uint8_t* to, const std::uint8_t* from) {
+    constexpr std::size_t Words = BlockBytes / sizeof(std::uint16_t);
+    std::array<std::uint16_t, Words> words;
+    std::array<std::uint16_t, Words> reversed;
+    std::memcpy(words.data(), from, BlockBytes);
+    for (std::size_t word = 0; word < Words; ++word) reversed[word] = words[Words - 1 - word];
+    std::memcpy(to, reversed.data(), BlockBytes);
 }
 
 // Copies samples of `SampleBytes` in reversed order; `bytes` is a multiple of it.
-template <std::uint32_t SampleBytes, std::uint64_t (*ReverseWord)(std::uint64_t)>
+template <std::uint32_t SampleBytes, ReverseBlock Reverse>
 void CopyReversed(std::uint8_t* to, const std::uint8_t* from, std::uint32_t bytes) {
-    std::uint8_t* end = to + bytes;
-    std::uint32_t done = 0;
-    for (; bytes - done >= 4 * sizeof(std::uint64_t); done += 4 * sizeof(std::uint64_t)) {
-        end -= 4 * sizeof(std::uint64_t);
-        StoreWord(end + 24, ReverseWord(LoadWord(from + done)));
-        StoreWord(end + 16, ReverseWord(LoadWord(from + done + 8)));
-        StoreWord(end + 8, ReverseWord(LoadWord(from + done + 16)));
-        StoreWord(end, ReverseWord(LoadWord(from + done + 24)));
+    const std::uint8_t* const end = from + bytes;
+    to += bytes;
+    for (; end - from >= std::ptrdiff_t{2 * BlockBytes}; from += 2 * BlockBytes) {
+        to -= 2 * BlockBytes;
+        Reverse(to + BlockBytes, from);
+        Reverse(to, from + BlockBytes);
     }
-    for (; done < bytes; done += SampleBytes) {
-        end -= SampleBytes;
-        std::memcpy(end, from + done, SampleBytes);
+    for (; from < end; from += SampleBytes) {
+        to -= SampleBytes;
+        std::memcpy(to, from, SampleBytes);
     }
 }
 
 // Swaps samples from both ends inwards.
-template <std::uint32_t SampleBytes, std::uint64_t (*ReverseWord)(std::uint64_t)>
+template <std::uint32_t SampleBytes, ReverseBlock Reverse>
 void ReverseInPlace(std::uint8_t* samples, std::uint32_t bytes) {
     std::uint8_t* front = samples;
     std::uint8_t* back = samples + bytes;
-    for (; back - front >= std::ptrdiff_t{2 * sizeof(std::uint64_t)}; front += 8) {
-        back -= 8;
-        const std::uint64_t frontWord = LoadWord(front);
-        StoreWord(front, ReverseWord(LoadWord(back)));
-        StoreWord(back, ReverseWord(frontWord));
+    for (; back - front >= std::ptrdiff_t{2 * BlockBytes}; front += BlockBytes) {
+        back -= BlockBytes;
+        std::uint8_t frontBlock[BlockBytes];
+        std::memcpy(frontBlock, front, BlockBytes);
+        Reverse(front, back);
+        Reverse(back, frontBlock);
     }
     for (; back - front >= std::ptrdiff_t{2 * SampleBytes}; front += SampleBytes) {
         back -= SampleBytes;
@@ -117,7 +115,7 @@ void PutTurned8(std::uint8_t* image, std::uint32_t imageBytes, std::uint32_t pos
                 const std::uint8_t* source, std::uint32_t count) {
     std::uint8_t* to = image + (imageBytes - position - count);
     if (source == nullptr) return PutPlain(to, nullptr, count);
-    CopyReversed<1, ReverseBytes>(to, source, count);
+    CopyReversed<1, ReverseBlockOfBytes>(to, source, count);
 }
 
 // Where one byte of an image of 16-bit samples goes: the bytes of a sample keep their order.
@@ -141,7 +139,7 @@ void PutTurned16(std::uint8_t* image, std::uint32_t imageBytes, std::uint32_t po
         if (source == nullptr) {
             PutPlain(to, nullptr, body);
         } else {
-            CopyReversed<2, ReversePairs>(to, source + head, body);
+            CopyReversed<2, ReverseBlockOfWords>(to, source + head, body);
         }
     }
     if (head + body < count) putByte(count - 1);
@@ -328,8 +326,8 @@ void FinishFrameBuffer(StreamAssembler& assembler, bool isTurned) {
 }
 
 void TurnSamples(std::uint8_t* samples, std::uint32_t bytes, bool is16Bit) {
-    if (is16Bit) return ReverseInPlace<2, ReversePairs>(samples, bytes & ~1U);
-    ReverseInPlace<1, ReverseBytes>(samples, bytes);
+    if (is16Bit) return ReverseInPlace<2, ReverseBlockOfWords>(samples, bytes & ~1U);
+    ReverseInPlace<1, ReverseBlockOfBytes>(samples, bytes);
 }
 
 }  // namespace ZV
