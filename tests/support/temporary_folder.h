@@ -1,0 +1,45 @@
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <string_view>
+
+namespace ZV::Test {
+
+/// A new folder for the life of the object, removed with what is in it.
+class TemporaryFolder {
+  public:
+    TemporaryFolder() {
+        std::string pattern = (std::filesystem::temp_directory_path() / "zentara-XXXXXX").string();
+        if (mkdtemp(pattern.data()) == nullptr) ADD_FAILURE() << "no folder " << pattern;
+        path = pattern;
+    }
+    ~TemporaryFolder() {
+        std::error_code ignored;
+        std::filesystem::remove_all(path, ignored);
+    }
+    TemporaryFolder(const TemporaryFolder&) = delete;
+    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+
+    std::string GetPath(std::string_view name) const { return (path / name).string(); }
+
+    std::string WriteFile(std::string_view name, std::string_view content) const {
+        std::ofstream(path / name, std::ios::binary) << content;
+        return GetPath(name);
+    }
+
+    std::string ReadFile(std::string_view name) const {
+        std::ifstream file(path / name, std::ios::binary);
+        return {std::istreambuf_iterator<char>(file), {}};
+    }
+
+  private:
+    std::filesystem::path path;
+};
+
+}  // namespace ZV::Test
