@@ -1,0 +1,200 @@
+#include "hal/platform/thread.h"
+
+#include <gtest/gtest.h>
+#include <sched.h>
+#include <sys/resource.h>
+
+#include <atomic>
+
+#include "hal/platform/clock.h"
+#include "hal/platform/event.h"
+#include "support/test_thread.h"
+
+namespace ZV {
+namespace {
+
+using Test::TestThread;
+using Test::WaitUntil;
+
+/// A thread that runs until the test opens its gate.
+class GatedThread : public testing::Test {
+  protected:
+    ~GatedThread() override {
+        SetWaitClockDivisor(1);
+        (void)SignalEvent(gate);
+        EXPECT_TRUE(WaitUntil([this] { return hasReturned.load(); }));
+        DestroyEvent(gate);
+    }
+
+    static void Run(void* self) {
+        auto* test = static_cast<GatedThread*>(self);
+        (void)WaitForEvent(test->gate, WaitForEver);
+        test->hasReturned.store(true);
+    }
+
+    PlatformEvent* gate = MakeEvent(EventReset::Manual);
+    std::atomic<bool> hasReturned{false};
+};
+
+TEST_F(GatedThread, IsWaitedForUntilItHasEnded) {
+    PlatformThread* thread = StartThread(Run, this);
+    ASSERT_NE(thread, nullptr);
+
+    (void)SignalEvent(gate);
+
+    EXPECT_EQ(WaitForThread(thread, WaitForEver), WaitOutcome::Signalled);
+    EXPECT_TRUE(hasReturned.load());
+    EXPECT_EQ(WaitForThread(thread, WaitForEver), WaitOutcome::Signalled);
+    CloseThread(thread);
+}
+
+TEST_F(GatedThread, IsWaitedForAgainAfterATimeOut) {
+    PlatformThread* thread = StartThread(Run, this);
+
+    EXPECT_EQ(WaitForThread(thread, 0), WaitOutcome::TimedOut);
+    EXPECT_EQ(WaitForThread(thread, 1), WaitOutcome::TimedOut);
+    (void)SignalEvent(gate);
+
+    EXPECT_EQ(WaitForThread(thread, WaitForEver), WaitOutcome::Signalled);
+    CloseThread(thread);
+}
+
+TEST_F(GatedThread, IsWaitedForOnTheWaitClock) {
+    SetWaitClockDivisor(1000);
+    PlatformThread* thread = StartThread(Run, this);
+    const std::uint64_t start = GetMonotonicMicroseconds();
+
+    EXPECT_EQ(WaitForThread(thread, 60'000), WaitOutcome::TimedOut);
+
+    const std::uint64_t elapsed = GetMonotonicMicroseconds() - start;
+    EXPECT_GE(elapsed, 60'000u);
+    EXPECT_LT(elapsed, 60'000'000u);
+    (void)SignalEvent(gate);
+    (void)WaitForThread(thread, WaitForEver);
+    CloseThread(thread);
+}
+
+TEST_F(GatedThread, IsWaitedForByTwoAtOnce) {
+    PlatformThread* thread = StartThread(Run, this);
+    const auto wait = [thread] {
+        EXPECT_EQ(WaitForThread(thread, WaitForEver), WaitOutcome::Signalled);
+    };
+
+    {
+        const TestThread first(wait);
+        const TestThread second(wait);
+        (void)SignalEvent(gate);
+    }
+
+    CloseThread(thread);
+}
+
+TEST_F(GatedThread, GoesOnByItselfWhenItsHandleIsClosed) {
+    PlatformThread* thread = StartThread(Run, this);
+
+    CloseThread(thread);
+    EXPECT_FALSE(hasReturned.load());
+    (void)SignalEvent(gate);
+
+    EXPECT_TRUE(WaitUntil([this] { return hasReturned.load(); }));
+}
+
+TEST_F(GatedThread, HasAnIdentifierThatTellsItFromOthers) {
+    PlatformThread* thread = StartThread(Run, this);
+    const TestThread other([] {});
+
+    EXPECT_NE(GetThreadId(thread), 0u);
+    EXPECT_NE(GetThreadId(thread), GetThreadId(other.Get()));
+
+    (void)SignalEvent(gate);
+    (void)WaitForThread(thread, WaitForEver);
+    CloseThread(thread);
+}
+
+TEST(EndedThread, IsEndedAtOnceAndKeepsItsHandle) {
+    PlatformThread* thread = StartThread([](void*) {}, nullptr);
+    (void)WaitForThread(thread, WaitForEver);
+
+    EXPECT_TRUE(EndThread(thread));
+    EXPECT_EQ(WaitForThread(thread, 0), WaitOutcome::Signalled);
+
+    CloseThread(thread);
+}
+
+TEST(OwnThread, CannotBeEndedByItself) {
+    bool isEnded = true;
+    {
+        TestThread self([&] {
+            while (self.Get() == nullptr) sched_yield();
+            isEnded = EndThread(self.Get());
+        });
+    }
+
+    EXPECT_FALSE(isEnded);
+}
+
+TEST(NullThread, FailsToBeWaitedForAndEnded) {
+    EXPECT_EQ(WaitForThread(nullptr, 0), WaitOutcome::Failed);
+    EXPECT_FALSE(EndThread(nullptr));
+    EXPECT_EQ(GetThreadId(nullptr), 0u);
+    CloseThread(nullptr);
+}
+
+struct Scheduling {
+    int policy = -1;
+    int priority = -1;
+    bool operator==(const Scheduling&) const = default;
+};
+
+Scheduling ReadOwnScheduling() {
+    sched_param parameters{};
+    sched_getparam(0, &parameters);
+    return {sched_getscheduler(0), parameters.sched_priority};
+}
+
+TEST(ThreadPriority, IsRoundRobinOneForARealDeviceOrLeftAloneWhereTheSystemRefuses) {
+    Scheduling before, after, ofProbe;
+    bool isAllowed = false;
+    {
+        const TestThread probe([&] {
+            const sched_param parameters{1};
+            isAllowed = sched_setscheduler(0, SCHED_RR | SCHED_RESET_ON_FORK, &parameters) == 0;
+        });
+    }
+    {
+        const TestThread thread([&] {
+            before = ReadOwnScheduling();
+            RaiseOwnThreadPriority(true);
+            after = ReadOwnScheduling();
+        });
+    }
+
+    const Scheduling raised{SCHED_RR | SCHED_RESET_ON_FORK, 1};
+    EXPECT_EQ(after, isAllowed ? raised : before);
+}
+
+TEST(ThreadPriority, IsLeftAloneForASimulatedDevice) {
+    Scheduling before, after;
+    {
+        const TestThread thread([&] {
+            before = ReadOwnScheduling();
+            RaiseOwnThreadPriority(false);
+            after = ReadOwnScheduling();
+        });
+    }
+
+    EXPECT_EQ(after, before);
+}
+
+TEST(ProcessPriority, IsLeftAlone) {
+    const int before = getpriority(PRIO_PROCESS, 0);
+
+    RaiseProcessPriority(true);
+    EXPECT_EQ(getpriority(PRIO_PROCESS, 0), before);
+    LowerProcessPriority(true);
+
+    EXPECT_EQ(getpriority(PRIO_PROCESS, 0), before);
+}
+
+}  // namespace
+}  // namespace ZV
