@@ -58,8 +58,8 @@ HALStatus ConnectPlain(HALCamera* camera, std::uint16_t payloadBytes) {
                              nullptr);
 }
 
-FastWaits::FastWaits() {
-    SetWaitClockDivisor(1000);
+FastWaits::FastWaits(std::uint32_t divisor) {
+    SetWaitClockDivisor(divisor);
 }
 
 FastWaits::~FastWaits() {

@@ -47,10 +47,10 @@ class HALWorld {
 /// Connects without callbacks.
 HALStatus ConnectPlain(HALCamera* camera, std::uint16_t payloadBytes);
 
-/// Lets limited waits pass at once for its life.
+/// Lets limited waits pass faster for its life.
 class FastWaits {
   public:
-    FastWaits();
+    explicit FastWaits(std::uint32_t divisor = 1000);
     ~FastWaits();
 };
 
