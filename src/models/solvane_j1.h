@@ -1,0 +1,21 @@
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "camera/morvane_fw_camera.h"
+
+namespace ZV {
+
+/// Model id 1001.
+class SolvaneJ1 : public MorvaneFWCamera {
+  public:
+    using MorvaneFWCamera::MorvaneFWCamera;
+    ~SolvaneJ1() override;
+
+    void GetSymmetricalBinningModes(std::vector<std::uint16_t>& modes) override;
+    const char* GetModelName() override;
+    std::uint32_t GetAnalogBoardType() override;
+};
+
+}  // namespace ZV
