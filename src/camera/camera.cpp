@@ -5,6 +5,7 @@
 #include <new>
 
 #include "hal/hal.h"
+#include "hal/static_mutex.h"
 #include "imaging/bayer_interpolation.h"
 #include "imaging/ex_image.h"
 #include "imaging/folary_ratio_correction.h"
@@ -18,7 +19,7 @@ constexpr std::uint16_t RatioCorrectionFormat = 0;
 constexpr std::uint16_t BayerAlgorithm = 1;
 constexpr std::uint16_t BayerFormat = 12;
 
-constinit std::mutex connectedCamerasMutex;
+constinit StaticMutex connectedCamerasMutex;
 
 }  // namespace
 

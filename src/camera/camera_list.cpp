@@ -6,6 +6,7 @@
 #include "camera/camera_factory.h"
 #include "camera/morvane_fw_camera.h"
 #include "hal/hal.h"
+#include "hal/static_mutex.h"
 #include "imaging/bayer_interpolation.h"
 #include "imaging/folary_ratio_correction.h"
 #include "imaging/image_pipeline.h"
@@ -16,7 +17,7 @@ namespace {
 
 constexpr std::uint32_t MaxListedCameras = 10;
 
-constinit std::mutex lostCamerasMutex;
+constinit StaticMutex lostCamerasMutex;
 
 /// A camera's threads must have ended before any of its destructors begins.
 void DeleteCamera(ZCamera* camera) {

@@ -17,6 +17,7 @@
 #include "hal/platform/event.h"
 #include "hal/platform/settings_store.h"
 #include "hal/platform/thread.h"
+#include "hal/static_mutex.h"
 #include "hal/stream_assembler.h"
 
 // Threads: the stream thread, one per stream, and whoever starts and stops it, one at a time.
@@ -60,7 +61,7 @@ struct AdapterContext {
     HALThread* streamThread = nullptr;
 };
 
-std::mutex sourceMutex;
+constinit StaticMutex sourceMutex;
 AdapterPacketSource packetSource{};  // guarded by sourceMutex
 
 AdapterContext* GetAdapterContext(const HALCamera& camera) {
