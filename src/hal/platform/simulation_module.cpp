@@ -1,6 +1,7 @@
 #include "hal/platform/simulation_module.h"
 
 #include <atomic>
+#include <cstdio>
 
 #include "hal/platform/debug_output.h"
 #include "hal/platform/environment.h"
@@ -32,7 +33,7 @@ constexpr KernelDriver EmptyDriver{
     [](void*, KernelRequest*) {},
 };
 
-/// Begun at least once; null before.
+/// The module's driver once it is loaded; it stays.
 constinit std::atomic<const KernelDriver*> loadedDriver{nullptr};
 /// What the last selection answered.
 constinit std::atomic<const KernelDriver*> selectedDriver{nullptr};
@@ -52,8 +53,9 @@ const KernelDriver* BeginSimulation(const char* configuration) {
     if (driver == nullptr) return nullptr;
     char message[MessageBytesMax] = "";
     if (driver->begin(configuration, message, sizeof message) == PlatformErrorNone) return driver;
-    message[sizeof message - 1] = '\0';
-    WriteDebuggerOutput(message);
+    char line[MessageBytesMax + 1];
+    std::snprintf(line, sizeof line, "%.*s\n", static_cast<int>(sizeof message - 1), message);
+    WriteDebuggerOutput(line);
     return &EmptyDriver;
 }
 
