@@ -1,0 +1,568 @@
+#include "api/delivery.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <cstring>
+#include <future>
+#include <thread>
+
+#include "api/camera_context.h"
+#include "api/entry_queue.h"
+#include "api/handles.h"
+#include "api/settings_block.h"
+#include "diagnostics/log.h"
+#include "imaging/ex_image.h"
+#include "imaging/image_filter.h"
+#include "support/flat_camera.h"
+
+// The camera is open and does not stream: the tests call what its engine calls, one event at a
+// time.
+
+namespace ZV {
+namespace {
+
+using Test::CallbackLog;
+using Test::ClientFrame;
+using Test::WaitUntil;
+
+constexpr std::uint32_t Width = 64;
+constexpr std::uint32_t Height = 48;
+constexpr std::uint32_t ImageBytes = Width * Height;
+
+class Delivery : public Test::OpenedCamera {
+  protected:
+    ZCamera& GetCamera() { return *FindCamera(handle); }
+    CameraContext& GetContext() { return *GetCameraContext(GetCamera()); }
+    std::uint32_t CountQueued() { return GetQueueCount(GetContext()); }
+
+    static ZExImage* MakeImage(std::uint16_t errorCode = 0) {
+        auto* const pixels = static_cast<std::uint8_t*>(std::malloc(ImageBytes));
+        std::memset(pixels, 0x42, ImageBytes);
+        return new ZExImage(pixels, ImageBytes, Width, Height, 8, 1000, 1.0, Mono8, CameraMono,
+                            PatternRed, 0, false, 5, 0, 1, false, 17, errorCode, nullptr, true);
+    }
+    void ReceiveImage(ZExImage* image, std::uint16_t status = 0) {
+        ZImageReceivedCallbackStruct record{image, &GetCamera(), status};
+        EXPECT_EQ(nullptr, ImageReceived(&record));
+    }
+    void ReceiveImage() { ReceiveImage(MakeImage()); }
+    void EndExposure() { EXPECT_EQ(nullptr, ExposeDone(&GetCamera())); }
+
+    /// A change behind at least one frame.
+    void QueueSettings(std::uint32_t flags = zcbFrameDone, std::uint32_t userData = 100) {
+        ASSERT_GT(CountQueued(), 0u);
+        ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, &settings, CallbackLog::Record, flags,
+                                                    calls.GetPrivate(), userData));
+    }
+    void QueueFrame(std::uint32_t flags, std::uint32_t userData = 0) {
+        ASSERT_ZERR(zerrNone, Queue(frame, calls, flags, userData));
+    }
+
+    void SetUp() override {
+        OpenedCamera::SetUp();
+        settings = ReadSettings();
+        SetLastSettings(GetContext(), formerSettings);
+    }
+
+    const Zentara_Settings formerSettings = [] {
+        Zentara_Settings unknown;
+        std::memset(&unknown, 0xCD, sizeof(unknown));
+        return unknown;
+    }();
+    Zentara_Settings settings{};
+    ClientFrame frame{ImageBytes};
+    CallbackLog calls;
+};
+
+TEST_F(Delivery, AFrameWithFlagsTwoGetsAnExposureCallbackAndNoFrameCallback) {
+    QueueFrame(zcbExposeDone, 9);
+
+    EndExposure();
+    ReceiveImage();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(1u, heard.size());
+    EXPECT_EQ(9u, heard[0].userData);
+    EXPECT_EQ(0u, heard[0].errorCode);
+    EXPECT_EQ(2u, heard[0].flags);
+    EXPECT_EQ(1u, frame->privateFilled);
+    EXPECT_EQ(0u, CountQueued());
+}
+
+TEST_F(Delivery, AFrameWithFlagsOneGetsOneFrameCallbackAndNoExposureCallback) {
+    QueueFrame(zcbFrameDone, 9);
+
+    EndExposure();
+    ReceiveImage();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(1u, heard.size());
+    EXPECT_EQ(9u, heard[0].userData);
+    EXPECT_EQ(0u, heard[0].errorCode);
+    EXPECT_EQ(1u, heard[0].flags);
+    EXPECT_EQ(0x42, frame.GetPixels()[0]);
+    EXPECT_EQ(0u, frame->timeStamp);
+    EXPECT_TRUE(frame.IsGuardIntact());
+}
+
+TEST_F(Delivery, AFrameWithoutFlagsIsFilledInSilence) {
+    QueueFrame(0);
+
+    EndExposure();
+    ReceiveImage();
+
+    EXPECT_EQ(0u, calls.CountCalls());
+    EXPECT_EQ(1u, frame->privateFilled);
+}
+
+TEST_F(Delivery, FramesWithoutACallbackAreServedAllTheSame) {
+    ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frame.Get(), nullptr, 3, 0, 0));
+
+    EndExposure();
+    ReceiveImage();
+
+    EXPECT_EQ(1u, frame->privateFilled);
+    EXPECT_EQ(0u, CountQueued());
+}
+
+TEST_F(Delivery, AnImageBeforeItsExposeDoneGetsTheExposureCallbackFirst) {
+    ClientFrame second(ImageBytes);
+    QueueFrame(3, 1);
+    ASSERT_ZERR(zerrNone, Queue(second, calls, 3, 2));
+
+    ReceiveImage();
+    EndExposure();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(3u, heard.size());
+    EXPECT_EQ(1u, heard[0].userData);
+    EXPECT_EQ(2u, heard[0].flags);
+    EXPECT_EQ(1u, heard[1].userData);
+    EXPECT_EQ(1u, heard[1].flags);
+    // The late end of the exposure finds the next frame.
+    EXPECT_EQ(2u, heard[2].userData);
+    EXPECT_EQ(2u, heard[2].flags);
+}
+
+TEST_F(Delivery, AnExposureThatEndsTwiceIsToldOnceForALoneFrame) {
+    QueueFrame(3);
+
+    EndExposure();
+    EndExposure();
+
+    EXPECT_EQ(1u, calls.CountCalls());
+}
+
+TEST_F(Delivery, ASecondExposureBelongsToTheSecondFrame) {
+    ClientFrame second(ImageBytes);
+    QueueFrame(3, 1);
+    ASSERT_ZERR(zerrNone, Queue(second, calls, 3, 2));
+
+    EndExposure();
+    EndExposure();
+    EndExposure();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(2u, heard.size());
+    EXPECT_EQ(1u, heard[0].userData);
+    EXPECT_EQ(2u, heard[1].userData);
+}
+
+TEST_F(Delivery, ASettingsChangeBetweenTwoFramesIsPassedOver) {
+    ClientFrame second(ImageBytes);
+    QueueFrame(zcbExposeDone, 1);
+    GetContext().sendInProgress = 1;  // keeps the change in the queue
+    EndExposure();
+    QueueSettings();
+    ASSERT_ZERR(zerrNone, Queue(second, calls, zcbExposeDone, 2));
+
+    EndExposure();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(2u, heard.size());
+    EXPECT_EQ(2u, heard[1].userData);
+    EXPECT_EQ(3u, CountQueued());
+}
+
+TEST_F(Delivery, AnExposureDoneCallbackOfALoneChangeBehindAFrameIsNotMadeUp) {
+    QueueFrame(zcbExposeDone, 1);
+    GetContext().sendInProgress = 1;
+    EndExposure();
+    QueueSettings();
+
+    EndExposure();
+
+    EXPECT_EQ(1u, calls.CountCalls());
+    EXPECT_EQ(2u, CountQueued());
+}
+
+TEST_F(Delivery, ASettingsChangeBehindAFrameIsAppliedWhenItsExposureEnds) {
+    QueueFrame(zcbFrameDone, 1);
+    QueueSettings(zcbFrameDone, 100);
+
+    EndExposure();
+
+    // Settings are not sent yet: the callback hears what the send returned, and the flags as given.
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(1u, heard.size());
+    EXPECT_EQ(100u, heard[0].userData);
+    EXPECT_ZERR(zerrNotSupported, heard[0].errorCode);
+    EXPECT_EQ(1u, heard[0].flags);
+    EXPECT_EQ(1u, CountQueued());
+}
+
+TEST_F(Delivery, TheCallbackOfASettingsChangeHearsTheFlagsAsGiven) {
+    QueueFrame(0);
+    QueueSettings(0xF1, 100);
+
+    EndExposure();
+
+    ASSERT_EQ(1u, calls.CountCalls());
+    EXPECT_EQ(0xF1u, calls.GetCalls()[0].flags);
+}
+
+TEST_F(Delivery, ASettingsChangeWithoutFrameDoneIsAppliedInSilence) {
+    QueueFrame(0);
+    QueueSettings(zcbExposeDone);
+
+    EndExposure();
+
+    EXPECT_EQ(0u, calls.CountCalls());
+    EXPECT_EQ(1u, CountQueued());
+}
+
+TEST_F(Delivery, OnlyTheChangeBehindTheFirstFrameIsAppliedEarly) {
+    ClientFrame second(ImageBytes);
+    QueueFrame(zcbExposeDone, 1);
+    ASSERT_ZERR(zerrNone, Queue(second, calls, zcbExposeDone, 2));
+    QueueSettings();
+    EndExposure();
+
+    EndExposure();  // the second frame's, at index 1
+
+    EXPECT_EQ(2u, calls.CountCalls());
+    EXPECT_EQ(3u, CountQueued());
+}
+
+TEST_F(Delivery, NoChangeIsAppliedEarlyWhileSettingsAreBeingSent) {
+    QueueFrame(0);
+    QueueSettings();
+    GetContext().sendInProgress = 1;
+
+    EndExposure();
+
+    EXPECT_EQ(2u, CountQueued());
+    EXPECT_EQ(0u, calls.CountCalls());
+}
+
+TEST_F(Delivery, ASettingsChangeThatIsLastInTheQueueStaysAndIsThenDroppedWithItsImage) {
+    QueueFrame(zcbFrameDone, 1);
+    QueueSettings(zcbFrameDone, 100);
+
+    ReceiveImage();
+    EXPECT_EQ(1u, CountQueued());
+    ClientFrame second(ImageBytes);
+    ASSERT_ZERR(zerrNone, Queue(second, calls, zcbFrameDone, 2));
+    ReceiveImage();
+
+    EXPECT_EQ(1u, calls.CountCalls());
+    EXPECT_EQ(0u, second->privateFilled);
+    EXPECT_EQ(1u, CountQueued());
+}
+
+TEST_F(Delivery, ASettingsChangeAtTheHeadOfTheQueueIsPassedOverByAnExposure) {
+    ClientFrame second(ImageBytes);
+    ClientFrame third(ImageBytes);
+    QueueFrame(0);
+    QueueSettings();
+    ReceiveImage();
+    ASSERT_ZERR(zerrNone, Queue(second, calls, 3, 2));
+    ASSERT_ZERR(zerrNone, Queue(third, calls, 3, 3));
+
+    EndExposure();
+
+    EXPECT_EQ(0u, calls.CountCalls());
+    EXPECT_EQ(3u, CountQueued());
+}
+
+TEST_F(Delivery, ASettingsChangeFollowedByAFrameIsAppliedBehindTheDeliveredFrame) {
+    ClientFrame second(ImageBytes);
+    QueueFrame(zcbFrameDone, 1);
+    QueueSettings(zcbFrameDone, 100);
+    ASSERT_ZERR(zerrNone, Queue(second, calls, zcbFrameDone, 2));
+
+    ReceiveImage();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(2u, heard.size());
+    EXPECT_EQ(1u, heard[0].userData);
+    EXPECT_EQ(100u, heard[1].userData);
+    EXPECT_ZERR(zerrNotSupported, heard[1].errorCode);
+    EXPECT_EQ(1u, CountQueued());
+}
+
+TEST_F(Delivery, AnImageWithoutAQueuedFrameIsDropped) {
+    ReceiveImage();
+
+    EXPECT_EQ(0u, calls.CountCalls());
+}
+
+TEST_F(Delivery, ATimeOutWithoutAnImageIsDeliveredAsUnplugged) {
+    QueueFrame(zcbFrameDone);
+
+    ReceiveImage(nullptr, FrameStatusTimedOut);
+
+    ASSERT_EQ(1u, calls.CountCalls());
+    EXPECT_ZERR(zerrUnplugged, calls.GetCalls()[0].errorCode);
+    EXPECT_ZERR(zerrUnplugged, frame->errorCode);
+    EXPECT_TRUE(frame.IsUntouched());
+    EXPECT_EQ(0u, frame->privateFilled);
+}
+
+TEST_F(Delivery, ATimeOutThatComesWithAnImageIsDeliveredAsTheImage) {
+    QueueFrame(zcbFrameDone);
+
+    ReceiveImage(MakeImage(FrameStatusMissingData), FrameStatusTimedOut);
+
+    EXPECT_ZERR(zerrMissingData, calls.GetCalls()[0].errorCode);
+    EXPECT_EQ(0x42, frame.GetPixels()[0]);
+}
+
+TEST_F(Delivery, TroubleWithAnImageIsTheCallbacksErrorCode) {
+    QueueFrame(zcbFrameDone);
+
+    ReceiveImage(MakeImage(FrameStatusMissingData), FrameStatusMissingData);
+
+    EXPECT_ZERR(zerrMissingData, calls.GetCalls()[0].errorCode);
+    EXPECT_ZERR(zerrMissingData, frame->errorCode);
+}
+
+TEST_F(Delivery, AnImageThatOutgrewTheBufferIsNotCopied) {
+    QueueFrame(zcbFrameDone);
+    frame->bufferSize = ImageBytes - 1;
+
+    ReceiveImage();
+
+    EXPECT_ZERR(zerrBufferTooSmall, calls.GetCalls()[0].errorCode);
+    EXPECT_TRUE(frame.IsUntouched());
+    EXPECT_EQ(0u, frame->size);
+}
+
+TEST_F(Delivery, EarlyFramesCarryTheImagesOwnFormat) {
+    QueueFrame(zcbFrameDone);
+
+    ReceiveImage();
+
+    EXPECT_EQ(2u, frame->format);
+}
+
+TEST_F(Delivery, AnAbortedQueueIsServedInSilence) {
+    QueueFrame(3);
+    GetContext().abortRequested = 1;
+
+    EndExposure();
+    ReceiveImage();
+
+    EXPECT_EQ(0u, calls.CountCalls());
+    EXPECT_EQ(1u, frame->privateFilled);
+    EXPECT_EQ(0u, CountQueued());
+}
+
+TEST_F(Delivery, AnAbortFromAnExposureCallbackEmptiesTheQueueUnderIt) {
+    static ZentaraHandle aborted;
+    aborted = handle;
+    const auto abort = [](std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
+        EXPECT_ZERR(zerrNone, Zentara_Abort(aborted));
+    };
+    ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frame.Get(), abort, zcbExposeDone, 0, 0));
+    QueueSettings();
+
+    EndExposure();
+
+    EXPECT_EQ(0u, CountQueued());
+    EXPECT_EQ(0u, calls.CountCalls());
+}
+
+TEST_F(Delivery, AnExposureCallbackMayQueueAndReadSettings) {
+    static ZentaraHandle queued;
+    static Zentara_Frame* again;
+    queued = handle;
+    ClientFrame second(ImageBytes);
+    again = second.Get();
+    const auto queueAgain = [](std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
+        Zentara_Settings read;
+        EXPECT_ZERR(zerrNone, Zentara_QueueFrame(queued, again, nullptr, 0, 0, 0));
+        EXPECT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(queued, &read));
+    };
+    ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frame.Get(), queueAgain, zcbExposeDone, 0, 0));
+
+    EndExposure();
+
+    EXPECT_EQ(2u, CountQueued());
+}
+
+TEST_F(Delivery, AFrameCallbackMayQueueItsFrameAgain) {
+    static ZentaraHandle queued;
+    queued = handle;
+    const auto queueAgain = [](std::uint64_t userPrivate, std::uint32_t, std::uint32_t,
+                               std::uint32_t) {
+        auto* const record = reinterpret_cast<Zentara_Frame*>(userPrivate);
+        EXPECT_ZERR(zerrNone, Zentara_QueueFrame(queued, record, nullptr, 0, 0, 0));
+    };
+    ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frame.Get(), queueAgain, zcbFrameDone,
+                                             reinterpret_cast<std::uintptr_t>(frame.Get()), 0));
+
+    ReceiveImage();
+
+    EXPECT_EQ(1u, CountQueued());
+}
+
+TEST_F(Delivery, AnExposureDuringASendDoesNotWaitForTheQueueLock) {
+    QueueFrame(zcbExposeDone);
+    GetContext().sendInProgress = 1;
+    GetContext().queueLock->Wait();  // as the sending thread holds it
+
+    std::thread engine([&] { EndExposure(); });
+    engine.join();
+
+    EXPECT_EQ(1u, calls.CountCalls());
+    GetContext().queueLock->Signal();
+}
+
+TEST_F(Delivery, AnExposureWithoutASendWaitsForTheQueueLock) {
+    QueueFrame(zcbExposeDone);
+    GetContext().queueLock->Wait();
+    std::atomic<bool> hasReturned{false};
+    std::thread engine([&] {
+        EndExposure();
+        hasReturned = true;
+    });
+    EXPECT_FALSE(WaitUntil([&] { return hasReturned.load(); }, std::chrono::milliseconds(50)));
+
+    GetContext().queueLock->Signal();
+    engine.join();
+
+    EXPECT_EQ(1u, calls.CountCalls());
+}
+
+TEST_F(Delivery, AnImageIsDeliveredWhileTheQueueLockIsHeld) {
+    QueueFrame(zcbFrameDone);
+    const SemaphoreHold queueing(*GetContext().queueLock);
+
+    ReceiveImage();
+
+    EXPECT_EQ(1u, calls.CountCalls());
+}
+
+TEST_F(Delivery, AnAbortWaitsForADeliveryInProgress) {
+    QueueFrame(zcbFrameDone);
+    GetContext().deliveryLock->Wait();
+    std::atomic<bool> hasReturned{false};
+    std::thread client([&] {
+        EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+        hasReturned = true;
+    });
+    EXPECT_FALSE(WaitUntil([&] { return hasReturned.load(); }, std::chrono::milliseconds(50)));
+    EXPECT_EQ(1u, CountQueued());
+
+    GetContext().deliveryLock->Signal();
+    client.join();
+
+    EXPECT_EQ(0u, CountQueued());
+}
+
+TEST_F(Delivery, WithoutAContextNothingIsServedAndTheImageIsLetGo) {
+    CameraContext* const context = GetCameraContext(GetCamera());
+    GetCamera().SetRefCon(nullptr);
+
+    EndExposure();
+    ReceiveImage();
+
+    GetCamera().SetRefCon(context);
+}
+
+TEST_F(Delivery, EveryEventLeavesTheNestingAsItFoundIt) {
+    QueueFrame(3);
+    const std::int32_t depth = GetLogNesting();
+
+    EndExposure();
+    ReceiveImage();
+    ReceiveImage();
+    EndExposure();
+
+    EXPECT_EQ(depth, GetLogNesting());
+}
+
+/// Counts the images that pass.
+class CountingFilter : public ZImageFilter {
+  public:
+    FilterResult Process(ZInImageBufferStruct*, ZOutImageBufferStruct*) override {
+        ++count;
+        return FilterDeclined;
+    }
+    FilterResult Init(std::uint32_t, std::uint32_t) override { return FilterDone; }
+    FilterResult SetOutputFormat(std::uint32_t) override { return FilterDone; }
+
+    std::uint32_t count = 0;
+};
+
+class PostProcessing : public Delivery {
+  protected:
+    void SetUp() override {
+        Delivery::SetUp();
+        GetContext().postPipeline->AddFilter(&filter);
+    }
+    void TearDown() override {
+        GetContext().postPipeline->RemoveFilter(&filter);
+        Delivery::TearDown();
+    }
+    void ReceiveWithFormat(std::uint32_t format) {
+        Zentara_Settings last = settings;
+        SetSettingsWord(last, zprmImageFormat, format);
+        SetLastSettings(GetContext(), last);
+        QueueFrame(zcbFrameDone);
+        ReceiveImage();
+    }
+
+    CountingFilter filter;
+};
+
+TEST_F(PostProcessing, IsOffAfterOpening) {
+    ReceiveWithFormat(zfmtMono8);
+
+    EXPECT_EQ(0u, filter.count);
+}
+
+TEST_F(PostProcessing, RunsTheChainOnEveryImageThatIsNotRaw) {
+    GetContext().postProcessing = 1;
+
+    ReceiveWithFormat(zfmtMono8);
+    ReceiveWithFormat(0xCDCDCDCD);
+
+    EXPECT_EQ(2u, filter.count);
+}
+
+TEST_F(PostProcessing, RawDataAreDeliveredAsRawWithNoFilterRun) {
+    GetContext().postProcessing = 1;
+
+    for (const std::uint32_t raw : {zfmtRaw8, zfmtRaw16}) {
+        ReceiveWithFormat(raw);
+        EXPECT_EQ(raw, frame->format);
+    }
+
+    EXPECT_EQ(0u, filter.count);
+}
+
+TEST_F(PostProcessing, ATimeOutIsNotProcessed) {
+    GetContext().postProcessing = 1;
+    QueueFrame(zcbFrameDone);
+
+    ReceiveImage(MakeImage(), FrameStatusTimedOut);
+
+    EXPECT_EQ(0u, filter.count);
+}
+
+}  // namespace
+}  // namespace ZV
