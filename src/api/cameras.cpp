@@ -82,28 +82,25 @@ ZentaraResult CloseCamera(const char* function, ZentaraHandle handle) {
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult Zentara_ListCameras(Zentara_CamListItem* items, uint32_t* length) {
-    return Traced(__func__,
-                  [&](const char* function) { return ListCameras(function, items, length); });
+    return ZV::Traced(
+        __func__, [&](const char* function) { return ZV::ListCameras(function, items, length); });
 }
 
 ZentaraResult Zentara_OpenCamera(uint32_t cameraId, ZentaraHandle* handle) {
-    return Traced(__func__,
-                  [&](const char* function) { return OpenCamera(function, cameraId, handle); });
+    return ZV::Traced(
+        __func__, [&](const char* function) { return ZV::OpenCamera(function, cameraId, handle); });
 }
 
 ZentaraResult Zentara_CloseCamera(ZentaraHandle handle) {
-    return Traced(__func__, [&](const char* function) { return CloseCamera(function, handle); });
+    return ZV::Traced(__func__,
+                      [&](const char* function) { return ZV::CloseCamera(function, handle); });
 }
 
 ZentaraResult Zentara_RegisterUnpluggedCallback(ZentaraHandle, ZentaraUnpluggedCallback, uint64_t) {
-    return Traced(__func__, [](const char*) {
-        return ZCamera::IsInitalized() ? ZentaraResult{zerrNone} : ZentaraResult{zerrNotLoaded};
+    return ZV::Traced(__func__, [](const char*) {
+        return ZV::ZCamera::IsInitalized() ? ZentaraResult{zerrNone} : ZentaraResult{zerrNotLoaded};
     });
 }
-
-}  // extern "C"
-
-}  // namespace ZV

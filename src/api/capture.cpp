@@ -104,42 +104,39 @@ ZentaraResult Decline(const char*) {
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult Zentara_GrabFrame(ZentaraHandle handle, Zentara_Frame* frame) {
-    return Traced(__func__,
-                  [&](const char* function) { return GrabFrame(function, handle, frame); });
+    return ZV::Traced(__func__,
+                      [&](const char* function) { return ZV::GrabFrame(function, handle, frame); });
 }
 
 ZentaraResult Zentara_SetStreaming(ZentaraHandle handle, uint32_t enable) {
-    return Traced(__func__,
-                  [&](const char* function) { return SetStreaming(function, handle, enable); });
+    return ZV::Traced(
+        __func__, [&](const char* function) { return ZV::SetStreaming(function, handle, enable); });
 }
 
 ZentaraResult Zentara_Trigger(ZentaraHandle handle) {
-    return Traced(__func__, [&](const char* function) { return Trigger(function, handle); });
+    return ZV::Traced(__func__,
+                      [&](const char* function) { return ZV::Trigger(function, handle); });
 }
 
 ZentaraResult Zentara_Abort(ZentaraHandle handle) {
-    return Traced(__func__, [&](const char* function) { return Abort(function, handle); });
+    return ZV::Traced(__func__, [&](const char* function) { return ZV::Abort(function, handle); });
 }
 
 ZentaraResult Zentara_GrabFrameNow(ZentaraHandle, Zentara_Frame*) {
-    return Traced(__func__, Decline);
+    return ZV::Traced(__func__, ZV::Decline);
 }
 
 ZentaraResult Zentara_GrabRawNow(ZentaraHandle, Zentara_Frame*) {
-    return Traced(__func__, Decline);
+    return ZV::Traced(__func__, ZV::Decline);
 }
 
 ZentaraResult Zentara_ProcessRaw(ZentaraHandle, Zentara_Frame*) {
-    return Traced(__func__, Decline);
+    return ZV::Traced(__func__, ZV::Decline);
 }
 
 ZentaraResult Zentara_SetFrameBuffers(ZentaraHandle, Zentara_Frame*) {
-    return Traced(__func__, Decline);
+    return ZV::Traced(__func__, ZV::Decline);
 }
-
-}  // extern "C"
-
-}  // namespace ZV

@@ -21,15 +21,11 @@ ZentaraResult PassReserved(ZentaraHandle handle, std::uint32_t selector, void* d
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult _Zentara_factory_reserved0(ZentaraHandle handle, uint32_t selector, void* data,
                                          uint32_t quadlets, uint32_t checksum) {
-    return Traced(__func__, [&](const char*) {
-        return PassReserved(handle, selector, data, quadlets, checksum);
+    return ZV::Traced(__func__, [&](const char*) {
+        return ZV::PassReserved(handle, selector, data, quadlets, checksum);
     });
 }
-
-}  // extern "C"
-
-}  // namespace ZV

@@ -97,23 +97,23 @@ ZentaraResult QueueSettings(const char* function, const QueueEntry& entry) {
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult Zentara_QueueFrame(ZentaraHandle handle, Zentara_Frame* frame,
                                  ZentaraAsyncCallback callback, uint32_t flags,
                                  uint64_t userPrivate, uint32_t userData) {
-    const QueueEntry entry{.camera = handle,
-                           .frame = frame,
-                           .callback = callback,
-                           .flags = flags,
-                           .userPrivate = userPrivate,
-                           .userData = userData,
-                           .kind = QueueKindFrame};
-    if (LogsQueuedFrames) ZLogEnter(__func__);
+    const ZV::QueueEntry entry{.camera = handle,
+                               .frame = frame,
+                               .callback = callback,
+                               .flags = flags,
+                               .userPrivate = userPrivate,
+                               .userData = userData,
+                               .kind = ZV::QueueKindFrame};
+    if (ZV::LogsQueuedFrames) ZV::ZLogEnter(__func__);
     const char* const function = __func__;
-    const ZentaraResult result = Guarded([&] { return QueueFrame(function, entry); });
-    if (LogsQueuedFrames || result != zerrNone) {
-        ZLogLeave(function, static_cast<std::uint16_t>(result));
+    const ZentaraResult result = ZV::Guarded([&] { return ZV::QueueFrame(function, entry); });
+    if (ZV::LogsQueuedFrames || result != zerrNone) {
+        ZV::ZLogLeave(function, static_cast<std::uint16_t>(result));
     }
     return result;
 }
@@ -121,16 +121,13 @@ ZentaraResult Zentara_QueueFrame(ZentaraHandle handle, Zentara_Frame* frame,
 ZentaraResult Zentara_QueueSettings(ZentaraHandle handle, Zentara_Settings* settings,
                                     ZentaraAsyncCallback callback, uint32_t flags,
                                     uint64_t userPrivate, uint32_t userData) {
-    const QueueEntry entry{.camera = handle,
-                           .settings = settings,
-                           .callback = callback,
-                           .flags = flags,
-                           .userPrivate = userPrivate,
-                           .userData = userData,
-                           .kind = QueueKindSettings};
-    return Traced(__func__, [&](const char* function) { return QueueSettings(function, entry); });
+    const ZV::QueueEntry entry{.camera = handle,
+                               .settings = settings,
+                               .callback = callback,
+                               .flags = flags,
+                               .userPrivate = userPrivate,
+                               .userData = userData,
+                               .kind = ZV::QueueKindSettings};
+    return ZV::Traced(__func__,
+                      [&](const char* function) { return ZV::QueueSettings(function, entry); });
 }
-
-}  // extern "C"
-
-}  // namespace ZV

@@ -198,28 +198,25 @@ ZentaraResult GetCameraModelString(const char* function, ZentaraHandle handle, c
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult Zentara_GetInfo(ZentaraHandle handle, uint32_t key, uint32_t* value) {
     constexpr const char* Function = "Zentara_GetInfo";
-    ZLogEnterInfo(Function, key);
-    const ZentaraResult result = Guarded([&] { return GetInfo(Function, handle, key, value); });
-    ZLogLeave(Function, static_cast<std::uint16_t>(result));
+    ZV::ZLogEnterInfo(Function, key);
+    const ZentaraResult result =
+        ZV::Guarded([&] { return ZV::GetInfo(Function, handle, key, value); });
+    ZV::ZLogLeave(Function, static_cast<std::uint16_t>(result));
     return result;
 }
 
 ZentaraResult Zentara_GetSerialString(ZentaraHandle handle, char* text, uint32_t length) {
-    return Traced(__func__, [&](const char* function) {
-        return GetSerialString(function, handle, text, length);
+    return ZV::Traced(__func__, [&](const char* function) {
+        return ZV::GetSerialString(function, handle, text, length);
     });
 }
 
 ZentaraResult Zentara_GetCameraModelString(ZentaraHandle handle, char* text, uint32_t length) {
-    return Traced(__func__, [&](const char* function) {
-        return GetCameraModelString(function, handle, text, length);
+    return ZV::Traced(__func__, [&](const char* function) {
+        return ZV::GetCameraModelString(function, handle, text, length);
     });
 }
-
-}  // extern "C"
-
-}  // namespace ZV

@@ -63,47 +63,43 @@ ZentaraResult ReleaseCameras() {
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult Zentara_LoadDriver(void) {
     constexpr const char* Function = "Zentara_LoadDriver";
-    ZLogOpen();
-    ZLogEnter(Function);
-    const CameraResult result = InitializeCameras();
+    ZV::ZLogOpen();
+    ZV::ZLogEnter(Function);
+    const ZV::CameraResult result = ZV::InitializeCameras();
     // Kept: no end record, so the log's nesting stays one too high after a second load.
-    if (result == CameraAlreadyInitialized) return zerrAlreadyLoaded;
-    const ZentaraResult code = TranslateCameraResult(result);
-    if (result == CameraOk) {
-        ZCamera::SetShouldOutputReads(GetOutputReads() != 0);
-        ZCamera::SetShouldOutputWrites(GetOutputWrites() != 0);
+    if (result == ZV::CameraAlreadyInitialized) return zerrAlreadyLoaded;
+    const ZentaraResult code = ZV::TranslateCameraResult(result);
+    if (result == ZV::CameraOk) {
+        ZV::ZCamera::SetShouldOutputReads(ZV::GetOutputReads() != 0);
+        ZV::ZCamera::SetShouldOutputWrites(ZV::GetOutputWrites() != 0);
     }
-    ZLogLeave(Function, static_cast<std::uint16_t>(code));
+    ZV::ZLogLeave(Function, static_cast<std::uint16_t>(code));
     return code;
 }
 
 void Zentara_ReleaseDriver(void) {
     constexpr const char* Function = "Zentara_ReleaseDriver";
-    ZLogEnter(Function);
-    if (!ZCamera::IsInitalized()) {
-        ZLogLeave(Function, zerrNotLoaded);
+    ZV::ZLogEnter(Function);
+    if (!ZV::ZCamera::IsInitalized()) {
+        ZV::ZLogLeave(Function, zerrNotLoaded);
         return;
     }
-    (void)Guarded(ReleaseCameras);
-    ZLogLeave(Function, zerrNone);
-    ZLogClose();
+    (void)ZV::Guarded(ZV::ReleaseCameras);
+    ZV::ZLogLeave(Function, zerrNone);
+    ZV::ZLogClose();
 }
 
 ZentaraResult Zentara_Version(uint16_t* major, uint16_t* minor) {
-    return Traced(__func__,
-                  [&](const char* function) { return StoreVersion(function, major, minor); });
+    return ZV::Traced(
+        __func__, [&](const char* function) { return ZV::StoreVersion(function, major, minor); });
 }
 
 ZentaraResult Zentara_LibVersion(uint16_t* major, uint16_t* minor, uint16_t* build) {
-    return Traced(__func__, [&](const char* function) {
-        return StoreLibVersion(function, major, minor, build);
+    return ZV::Traced(__func__, [&](const char* function) {
+        return ZV::StoreLibVersion(function, major, minor, build);
     });
 }
-
-}  // extern "C"
-
-}  // namespace ZV

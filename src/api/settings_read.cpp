@@ -187,13 +187,10 @@ ZentaraResult ReadSettings(const char* function, ZentaraHandle handle, Zentara_S
 
 }  // namespace
 
-extern "C" {
+}  // namespace ZV
 
 ZentaraResult Zentara_ReadSettingsFromCam(ZentaraHandle handle, Zentara_Settings* settings) {
-    return Traced(__func__,
-                  [&](const char* function) { return ReadSettings(function, handle, settings); });
+    return ZV::Traced(__func__, [&](const char* function) {
+        return ZV::ReadSettings(function, handle, settings);
+    });
 }
-
-}  // extern "C"
-
-}  // namespace ZV
