@@ -1,0 +1,292 @@
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <csignal>
+#include <cstdlib>
+#include <fstream>
+#include <string>
+#include <thread>
+
+#include "support/flat_camera.h"
+
+namespace ZV::Test {
+namespace {
+
+class Capture : public OpenedCamera {
+  protected:
+    explicit Capture(std::string_view scenario = SmallMono) : OpenedCamera(scenario) {}
+
+    /// Ends a grab that waits, from another thread.
+    ZentaraResult GrabAndAbort(ClientFrame& frame) {
+        std::atomic<bool> hasEnded{false};
+        ZentaraResult result = zerrNone;
+        std::thread grabber([&] {
+            result = Zentara_GrabFrame(handle, frame.Get());
+            hasEnded = true;
+        });
+        // An abort before the grab waits does not count, so it is repeated.
+        EXPECT_TRUE(WaitUntil([&] {
+            EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+            return hasEnded.load();
+        }));
+        grabber.join();
+        return result;
+    }
+};
+
+TEST_F(Capture, AGrabTakesOneImage) {
+    ClientFrame frame(GetImageBytes());
+
+    ASSERT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+
+    EXPECT_ZERR(zerrNone, frame->errorCode);
+    EXPECT_EQ(64u, frame->width);
+    EXPECT_EQ(48u, frame->height);
+    EXPECT_EQ(64u * 48u, frame->size);
+    EXPECT_EQ(8, frame->bits);
+    EXPECT_EQ(static_cast<std::uint32_t>(zfmtMono8), frame->format);
+    EXPECT_EQ(0u, frame->timeStamp);
+    EXPECT_EQ(1u, frame->privateFilled);
+    EXPECT_TRUE(frame.IsGuardIntact());
+    const auto frames = world.ReadFrames();
+    bool isOneOfThem = false;
+    for (const TraceRecord& sent : frames) {
+        if (sent.rollingFrameNumber != frame->frameNumber) continue;
+        isOneOfThem = sent.checksum == CalculateChecksum(frame.GetPixels(), frame->size);
+    }
+    EXPECT_TRUE(isOneOfThem) << "frame " << frame->frameNumber << " of " << frames.size();
+}
+
+TEST_F(Capture, AGrabLeavesStreamingAsItWas) {
+    ClientFrame frame(GetImageBytes());
+
+    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+    EXPECT_EQ(0u, world.GetState().isStreaming);
+
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+    EXPECT_EQ(1u, world.GetState().isStreaming);
+}
+
+TEST_F(Capture, AGrabWithAFrameQueuedIsBusy) {
+    CallbackLog calls;
+    ClientFrame frame(GetImageBytes());
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, zcbFrameDone));
+
+    EXPECT_ZERR(zerrBusy, Zentara_GrabFrame(handle, frame.Get()));
+}
+
+TEST_F(Capture, AGrabTestsItsArgumentsInOrder) {
+    CallbackLog calls;
+    ClientFrame queued(GetImageBytes());
+    ClientFrame small(GetImageBytes() - 1);
+    ASSERT_ZERR(zerrNone, Queue(queued, calls, 0));
+
+    EXPECT_ZERR(zerrBadHandle, Zentara_GrabFrame(0, nullptr));
+    EXPECT_ZERR(zerrBadParameter, Zentara_GrabFrame(handle, nullptr));
+    EXPECT_ZERR(zerrBadParameter, Zentara_GrabFrame(0x1000, nullptr));
+    EXPECT_ZERR(zerrBusy, Zentara_GrabFrame(handle, small.Get()));
+    ASSERT_ZERR(zerrNone, Zentara_Abort(handle));
+    EXPECT_ZERR(zerrBufferTooSmall, Zentara_GrabFrame(handle, small.Get()));
+
+    EXPECT_TRUE(small.IsUntouched());
+    EXPECT_EQ(0u, small->privateFilled);
+}
+
+TEST_F(Capture, AGrabIntoNoBufferIsTooSmall) {
+    ClientFrame frame(GetImageBytes());
+    frame->pBuffer = nullptr;
+
+    EXPECT_ZERR(zerrBufferTooSmall, Zentara_GrabFrame(handle, frame.Get()));
+}
+
+TEST_F(Capture, AGrabThatTheBusRefusesReturnsTheDriversFault) {
+    ClientFrame frame(GetImageBytes());
+    ASSERT_TRUE(
+        world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_ASYNC_WRITE", "count": 0})"));
+
+    EXPECT_ZERR(zerrDriverFault, Zentara_GrabFrame(handle, frame.Get()));
+
+    EXPECT_TRUE(frame.IsUntouched());
+}
+
+TEST_F(Capture, AGrabSaysInItsFrameThatDataWereMissing) {
+    ClientFrame frame(GetImageBytes());
+    ASSERT_TRUE(world.AddFault(R"({"kind": "losePacket", "packet": 1, "count": 0})"));
+
+    const ZentaraResult result = Zentara_GrabFrame(handle, frame.Get());
+
+    EXPECT_ZERR(zerrNone, result);
+    EXPECT_ZERR(zerrMissingData, frame->errorCode);
+}
+
+class NoImages : public Capture {
+  protected:
+    NoImages()
+        : Capture(R"({"base": "mono", "cameras": [{"sensor": {"width": 64, "height": 48},
+              "faults": [{"kind": "losePacket", "packet": 0, "count": 0}]}]})") {}
+};
+
+TEST_F(NoImages, AnAbortEndsAGrabThatWaits) {
+    ClientFrame frame(GetImageBytes());
+
+    EXPECT_ZERR(zerrDriverFault, GrabAndAbort(frame));
+
+    EXPECT_TRUE(frame.IsUntouched());
+    EXPECT_EQ(0u, world.GetState().isStreaming);
+}
+
+TEST_F(Capture, StreamingThatIsOnOrOffAlreadyIsNoFailure) {
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    EXPECT_EQ(0u, world.GetState().isStreaming);
+
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0xFFFFFFFF));
+    EXPECT_EQ(1u, world.GetState().isStreaming);
+
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    EXPECT_EQ(0u, world.GetState().isStreaming);
+}
+
+TEST_F(Capture, AStartThatFailsInTheStreamLayerLeavesStreamingOn) {
+    ASSERT_TRUE(
+        world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_STREAM_ENTER", "count": 0})"));
+
+    EXPECT_ZERR(zerrDriverFault, Zentara_SetStreaming(handle, 1));
+
+    // Kept: the second call says that it is on, and switching it off cleans up.
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    (void)Zentara_SetStreaming(handle, 0);
+    EXPECT_EQ(0u, world.GetState().attachedBuffers);
+}
+
+TEST_F(Capture, ATriggerWithoutStreamingIsRefused) {
+    EXPECT_ZERR(zerrNotStreaming, Zentara_Trigger(handle));
+}
+
+TEST_F(Capture, ATriggerInAnotherModeThanSoftwareIsNotSupported) {
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+
+    EXPECT_ZERR(zerrNotSupported, Zentara_Trigger(handle));
+}
+
+class TooFastForTheBus : public Capture {
+  protected:
+    TooFastForTheBus() : Capture(R"({"base": "model:PellanB1", "buses": [{"speed": 400}]})") {}
+};
+
+TEST_F(TooFastForTheBus, AStreamThatTheBusCannotCarryIsBusy) {
+    ClientFrame frame(GetImageBytes());
+
+    EXPECT_ZERR(zerrCameraBusy, Zentara_SetStreaming(handle, 1));
+    EXPECT_ZERR(zerrCameraBusy, Zentara_GrabFrame(handle, frame.Get()));
+}
+
+TEST_F(Capture, AfterAnAbortNoCallbackComesForWhatWasQueuedBefore) {
+    CallbackLog before;
+    CallbackLog after;
+    ClientFrame frame(GetImageBytes());
+    for (int i = 0; i < 10; ++i) ASSERT_ZERR(zerrNone, Queue(frame, before, 3));
+
+    EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+    ASSERT_ZERR(zerrNone, Queue(frame, after, zcbFrameDone));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+
+    EXPECT_TRUE(after.WaitForCalls(1));
+    EXPECT_EQ(0u, before.CountCalls());
+}
+
+TEST_F(Capture, AnAbortDuringAStreamEmptiesTheQueueAndTheNextFrameIsServed) {
+    CallbackLog before;
+    CallbackLog after;
+    ClientFrame frame(GetImageBytes());
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    for (int i = 0; i < 100; ++i) {
+        ASSERT_ZERR(zerrNone, Queue(frame, before, zcbFrameDone));
+    }
+
+    ASSERT_ZERR(zerrNone, Zentara_Abort(handle));
+    const std::size_t served = before.CountCalls();
+    ASSERT_ZERR(zerrNone, Queue(frame, after, zcbFrameDone));
+
+    EXPECT_TRUE(after.WaitForCalls(1));
+    EXPECT_EQ(served, before.CountCalls());
+}
+
+TEST_F(Capture, AnAbortWithNothingToDoSucceeds) {
+    EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+    EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+}
+
+// ---- A wait for ever, in a child process ----
+
+/// What the child says of itself, in memory that both processes share through a pipe.
+struct Report {
+    pid_t thread;
+};
+
+int reportPipe[2];
+ZentaraHandle childHandle;
+std::atomic<bool> hasAbortReturned{false};
+
+void AbortFromFrameCallback(std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
+    const Report report{gettid()};
+    if (write(reportPipe[1], &report, sizeof(report)) != sizeof(report)) _exit(2);
+    (void)Zentara_Abort(childHandle);
+    hasAbortReturned = true;
+    const Report returned{0};
+    if (write(reportPipe[1], &returned, sizeof(returned)) != sizeof(returned)) _exit(2);
+}
+
+[[noreturn]] void RunChild() {
+    SimulationWorld world(SmallMono);
+    Zentara_CamListItem item{};
+    std::uint32_t length = 1;
+    ClientFrame frame(64 * 48);
+    if (Zentara_LoadDriver() != 0 || Zentara_ListCameras(&item, &length) != 0) _exit(2);
+    if (Zentara_OpenCamera(0, &childHandle) != 0) _exit(2);
+    if (Zentara_QueueFrame(childHandle, frame.Get(), AbortFromFrameCallback, zcbFrameDone, 0, 0) !=
+        0) {
+        _exit(2);
+    }
+    if (Zentara_SetStreaming(childHandle, 1) != 0) _exit(2);
+    while (true) pause();
+}
+
+bool IsThreadAsleep(pid_t process, pid_t thread) {
+    std::ifstream stat("/proc/" + std::to_string(process) + "/task/" + std::to_string(thread) +
+                       "/stat");
+    std::string text;
+    std::getline(stat, text);
+    const std::size_t name = text.rfind(')');
+    return name != std::string::npos && text.substr(name + 2, 1) == "S";
+}
+
+TEST(CaptureAbort, FromAFrameCallbackWaitsForItselfForEver) {
+    ASSERT_EQ(0, pipe(reportPipe));
+    const pid_t child = fork();
+    ASSERT_NE(-1, child);
+    if (child == 0) RunChild();
+    close(reportPipe[1]);
+    Report report{};
+    const bool hasReported = read(reportPipe[0], &report, sizeof(report)) == sizeof(report);
+
+    std::uint32_t asleep = 0;
+    const bool waits = hasReported && WaitUntil([&] {
+                           asleep = IsThreadAsleep(child, report.thread) ? asleep + 1 : 0;
+                           return asleep >= 50;
+                       });
+    kill(child, SIGKILL);
+    waitpid(child, nullptr, 0);
+
+    EXPECT_TRUE(hasReported);
+    EXPECT_TRUE(waits);
+    EXPECT_NE(static_cast<ssize_t>(sizeof(report)), read(reportPipe[0], &report, sizeof(report)));
+    close(reportPipe[0]);
+}
+
+}  // namespace
+}  // namespace ZV::Test
