@@ -278,6 +278,19 @@ TEST_F(StreamBlocksTest, KeptBlocksBehindABadStartMayStillBeTaken) {
         << "the start is ignored, the block behind it goes to what was still left";
 }
 
+TEST_F(StreamBlocksTest, BlocksBehindABadStartAfterAGapAreLeftOut) {
+    constexpr std::size_t Payload = 2 * BlockBytes - 14;
+    AddFrame(10 * Payload);
+    Header header;
+    header.blockPayload = Payload;
+    Feed(BlocksStart(0, Quadlets, 1) + SourceStart(true, header) + Ramp(StartData));
+
+    Feed(BlocksStart(2, Quadlets, 1) + Bytes(2 * BlockBytes, 0x66));
+
+    EXPECT_EQ(assembler.blockLeft, 0) << "the gap took what was left";
+    EXPECT_EQ(assembler.remaining, 9 * Payload);
+}
+
 TEST_F(StreamBlocksTest, KeptAFrameThatWaitsForItsSecondFieldIsDamagedByAnyGap) {
     GuardedFrame& frame = AddTwoFieldFrame(static_cast<std::uint16_t>(StartData), 2);
     Header second;
