@@ -1,0 +1,185 @@
+#include <gtest/gtest.h>
+
+#include "camera/test_camera.h"
+#include "imaging/ex_image.h"
+
+namespace ZV::Test {
+
+class OneClosedCamera : public CameraWorld, public testing::Test {
+  protected:
+    OneClosedCamera() : CameraWorld(SmallCamera) {}
+    void SetUp() override { ASSERT_NE(nullptr, camera); }
+
+    std::size_t CountConnected() {
+        return TestCamera::m_connectedCameras != nullptr ? TestCamera::m_connectedCameras->size()
+                                                         : 0;
+    }
+};
+
+TEST_F(OneClosedCamera, IsConnectedWhileItIsOpen) {
+    ASSERT_EQ(CameraOk, camera->OpenCamera());
+    EXPECT_TRUE(camera->IsCameraOpen());
+    EXPECT_TRUE(camera->DoWeHaveExclusiveAccess());
+    EXPECT_EQ(1u, CountConnected());
+    EXPECT_EQ(1, TestCamera::m_numOfConnectedCameras);
+    EXPECT_EQ(1u, world.GetState().openHandles);
+
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
+
+    EXPECT_FALSE(camera->IsCameraOpen());
+    EXPECT_FALSE(camera->DoWeHaveExclusiveAccess());
+    EXPECT_EQ(0u, CountConnected());
+    EXPECT_EQ(0, TestCamera::m_numOfConnectedCameras);
+    EXPECT_EQ(0u, world.GetState().openHandles);
+    EXPECT_EQ(0u, world.GetState().reservedChannels);
+}
+
+TEST_F(OneClosedCamera, HasNothingToClose) {
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
+
+    EXPECT_EQ(0u, world.ReadRegisterWrites().size());
+}
+
+TEST_F(OneClosedCamera, OpensAndClosesManyTimesWithoutAHang) {
+    for (int round = 0; round < 200; ++round) {
+        ASSERT_EQ(CameraOk, camera->OpenCamera()) << round;
+        ASSERT_EQ(CameraOk, camera->CloseCamera()) << round;
+        EXPECT_EQ(0, camera->streaming.runLoopsAlive);
+        EXPECT_EQ(0, camera->streaming.exposeThreadsAlive);
+    }
+}
+
+TEST_F(OneClosedCamera, ReturnsTheFailureOfAReservationWithoutBeingOpen) {
+    ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_ALLOC_BANDWIDTH"})"));
+
+    EXPECT_EQ(CameraBandwidthFault, camera->OpenCamera());
+
+    EXPECT_FALSE(camera->IsCameraOpen());
+    EXPECT_EQ(0u, CountConnected());
+    camera.reset();
+    EXPECT_EQ(0u, world.GetState().openHandles) << "the end of the object ends what is left";
+}
+
+TEST_F(OneClosedCamera, StaysMarkedOpenWhenItsCloseFailsAndCanBeClosedAgain) {
+    ASSERT_EQ(CameraOk, camera->OpenCamera());
+    ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_FREE_RESOURCES"})"));
+
+    EXPECT_EQ(CameraHalFault, camera->CloseCamera());
+    EXPECT_TRUE(camera->IsCameraOpen());
+    EXPECT_TRUE(camera->DoWeHaveExclusiveAccess());
+    EXPECT_EQ(1u, CountConnected());
+
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
+    EXPECT_FALSE(camera->IsCameraOpen());
+    EXPECT_EQ(0u, CountConnected());
+    EXPECT_EQ(CameraOk, camera->OpenCamera());
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
+}
+
+TEST_F(OneClosedCamera, EndsItsThreadsAndItsDeviceWhenItIsDeletedOpen) {
+    TestClient client;
+    ASSERT_EQ(CameraOk, camera->Ready());
+    ASSERT_EQ(CameraOk, camera->StartStreamingImages(TestClient::ReceiveImage,
+                                                     TestClient::ExposeDone, false, &client));
+    ASSERT_TRUE(WaitUntil([&] { return client.GetImageCount() > 3; }));
+    const std::size_t writes = world.ReadRegisterWrites().size();
+
+    camera.reset();
+
+    EXPECT_EQ(0u, world.GetState().openHandles);
+    EXPECT_EQ(0u, CountConnected());
+    EXPECT_EQ(writes, world.ReadRegisterWrites().size()) << "no request of its own";
+}
+
+TEST_F(OneClosedCamera, EndsItsThreadsWhenItIsDeletedAfterAFailedClose) {
+    TestClient client;
+    ASSERT_EQ(CameraOk, camera->Ready());
+    ASSERT_EQ(CameraOk, camera->StartStreamingImages(TestClient::ReceiveImage,
+                                                     TestClient::ExposeDone, false, &client));
+    ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_STOP"})"));
+    ASSERT_EQ(CameraHalFault, camera->CloseCamera());
+    EXPECT_TRUE(camera->IsCameraOpen());
+
+    camera.reset();
+
+    EXPECT_EQ(0u, world.GetState().openHandles);
+}
+
+TEST_F(OneClosedCamera, WaitsAtItsCloseForAClientInItsCallback) {
+    TestClient client;
+    client.isBlocked = true;
+    ASSERT_EQ(CameraOk, camera->Ready());
+    ASSERT_EQ(CameraOk,
+              camera->StartStreamingImages(TestClient::ReceiveImage, nullptr, false, &client));
+    ASSERT_TRUE(WaitUntil([&] { return client.isInCallback.load(); }));
+    std::atomic<bool> isClosed{false};
+
+    std::thread closer([&] {
+        EXPECT_EQ(CameraOk, camera->CloseCamera());
+        isClosed = true;
+    });
+    ASSERT_TRUE(WaitUntil([&] { return !camera->streaming.runLoopActive; }));
+    ASSERT_TRUE(WaitUntil([&] { return !camera->IsCameraStreaming(); }));
+    EXPECT_FALSE(isClosed);
+    client.isBlocked = false;
+    closer.join();
+
+    EXPECT_TRUE(isClosed);
+}
+
+TEST(CameraTakenByAnother, ReadsAsOpenAndIsRefused) {
+    CameraWorld one(
+        R"({"base": "mono", "timeScale": 0, "cameras": [{"held": {"from": 2, "to": 2}}]})");
+    ASSERT_NE(nullptr, one.camera);
+
+    EXPECT_EQ(CameraRefused, one.camera->OpenCamera());
+
+    EXPECT_TRUE(one.camera->IsCameraOpen());
+    EXPECT_FALSE(one.camera->DoWeHaveExclusiveAccess());
+}
+
+TEST(CameraTakenByAnother, TakesNothingOutOfTheConnectedListAtItsClose) {
+    CameraWorld mine(SmallCamera);
+    ASSERT_EQ(CameraOk, mine.camera->OpenCamera());
+    HALCamera record{};  // no device behind it
+    record.connected = 1;
+    record.kind = 7;
+    TestCamera taken(record);
+    ASSERT_TRUE(taken.IsCameraOpen());
+
+    EXPECT_EQ(CameraOk, taken.CloseCamera());
+
+    EXPECT_FALSE(taken.IsCameraOpen());
+    EXPECT_EQ(1, TestCamera::m_numOfConnectedCameras);
+    EXPECT_EQ(CameraOk, mine.camera->CloseCamera());
+}
+
+TEST(CameraTakenByAnother, CanBeOpenedOnceItIsFreeAgain) {
+    CameraWorld one(
+        R"({"base": "mono", "timeScale": 0, "cameras": [{"held": {"from": 2, "to": 2}}]})");
+    ASSERT_EQ(CameraRefused, one.camera->OpenCamera());
+    ASSERT_EQ(CameraOk, one.camera->CloseCamera());
+    EXPECT_FALSE(one.camera->IsCameraOpen());
+
+    EXPECT_EQ(CameraOk, one.camera->OpenCamera());
+
+    EXPECT_TRUE(one.camera->DoWeHaveExclusiveAccess());
+    EXPECT_EQ(CameraOk, one.camera->CloseCamera());
+}
+
+TEST(UnpluggedCamera, CanStillBeStoppedClosedAndDeleted) {
+    CameraWorld one(SmallCamera);
+    TestClient client;
+    ASSERT_EQ(CameraOk, one.camera->Ready());
+    ASSERT_EQ(CameraOk,
+              one.camera->StartStreamingImages(TestClient::ReceiveImage, nullptr, false, &client));
+    ASSERT_TRUE(WaitUntil([&] { return client.GetImageCount() > 0; }));
+
+    ASSERT_TRUE(one.world.Unplug());
+
+    (void)one.camera->CloseCamera();  // whatever it says, it ends
+    one.camera.reset();
+    EXPECT_EQ(0u, one.world.GetState().openHandles);
+}
+
+}  // namespace ZV::Test

@@ -1,0 +1,222 @@
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+
+#include "camera/test_camera.h"
+
+namespace ZV::Test {
+
+/// A camera whose stream is said to run while no bus thread and no run loop takes part: the test
+/// asks for frames as the bus thread does.
+class CameraAskedForFrames : public CameraWorld, public testing::Test {
+  protected:
+    CameraAskedForFrames() : CameraWorld(SmallCamera) {}
+    void SetUp() override {
+        ASSERT_NE(nullptr, camera);
+        ASSERT_EQ(CameraOk, camera->Ready());
+        ASSERT_EQ(CameraOk, camera->CloseCamera());
+        camera->streaming.isStreaming = true;
+    }
+
+    tStFrameInfo* Peek() { return camera->PrivatePeekNewFrame(); }
+    /// A frame that the stream layer has filled and let go of.
+    tStFrameInfo* PeekDone() {
+        tStFrameInfo* frame = Peek();
+        if (frame != nullptr) frame->isHeld = false;
+        return frame;
+    }
+    std::size_t CountFrames() const { return camera->streaming.frameQueue.GetCount(); }
+};
+
+TEST_F(CameraAskedForFrames, DescribesAFrameByItsPresentSettings) {
+    camera->StoreControl(1, 0x2A000000);  // parameter set 42, 8 bits
+
+    const tStFrameInfo* frame = Peek();
+
+    ASSERT_NE(nullptr, frame);
+    EXPECT_NE(nullptr, frame->buffer);
+    EXPECT_EQ(64u * 48u, frame->bufferSize);
+    EXPECT_EQ(64u * 48u, frame->bytesExpected);
+    EXPECT_EQ(42, frame->psn);
+    EXPECT_EQ(0, frame->fieldIndex);
+    EXPECT_FALSE(frame->interlaced);
+    EXPECT_EQ(64, frame->rowBytes);
+    EXPECT_EQ(0u, frame->frameStatus);
+    EXPECT_EQ(1u, frame->binning);
+    EXPECT_EQ(64u, frame->width);
+    EXPECT_EQ(48u, frame->height);
+    EXPECT_EQ(8u, frame->bitDepth);
+    EXPECT_EQ(camera->GetExposure(), frame->exposure);
+    EXPECT_EQ(camera->GetNormalizedGain(), frame->gain);
+    EXPECT_EQ(0, frame->startColour);
+    EXPECT_TRUE(frame->valid);
+}
+
+TEST_F(CameraAskedForFrames, TakesTwoBytesForEachSampleAboveEightBits) {
+    ASSERT_EQ(12u, camera->GetMaxBitDepth());
+    camera->StoreControl(1, 1u << 3);
+
+    const tStFrameInfo* frame = Peek();
+
+    ASSERT_NE(nullptr, frame);
+    EXPECT_EQ(2u * 64 * 48, frame->bufferSize);
+    EXPECT_EQ(128, frame->rowBytes);
+}
+
+TEST_F(CameraAskedForFrames, RefusesFramesWhileItDoesNotStream) {
+    camera->streaming.isStreaming = false;
+
+    EXPECT_EQ(nullptr, Peek());
+}
+
+TEST_F(CameraAskedForFrames, RefusesExactlyOneFrameAfterAnAbort) {
+    ASSERT_EQ(CameraOk, camera->Abort());
+
+    EXPECT_EQ(nullptr, PeekDone());
+    EXPECT_NE(nullptr, PeekDone());
+}
+
+TEST_F(CameraAskedForFrames, HoldsAFrameForTheStreamLayerFromItsPushOn) {
+    tStFrameInfo* frame = Peek();
+
+    ASSERT_NE(nullptr, frame);
+    EXPECT_TRUE(frame->isHeld);
+    EXPECT_EQ(frame, camera->PrivateGetNewFrame());
+    EXPECT_EQ(1u, CountFrames()) << "it stays in the queue";
+}
+
+TEST_F(CameraAskedForFrames, HasNoNewFrameOnceTheStreamLayerHasLetGo) {
+    ASSERT_NE(nullptr, PeekDone());
+
+    EXPECT_EQ(nullptr, camera->PrivateGetNewFrame());
+}
+
+TEST_F(CameraAskedForFrames, DiscardsTheSecondFrameAndNotTheFirstForAThird) {
+    tStFrameInfo* first = PeekDone();
+    first->rollingFrameNumber = 1;
+    PeekDone()->rollingFrameNumber = 2;
+
+    tStFrameInfo* third = PeekDone();
+    third->rollingFrameNumber = 3;
+
+    ASSERT_EQ(2u, CountFrames());
+    EXPECT_EQ(first, camera->streaming.frameQueue.TakeOldest());
+    EXPECT_EQ(third, camera->streaming.frameQueue.TakeOldest());
+    FreeFrameWithBuffer(first);
+    FreeFrameWithBuffer(third);
+}
+
+TEST_F(CameraAskedForFrames, NeverDiscardsAFrameThatIsBeingFilled) {
+    tStFrameInfo* first = PeekDone();
+    tStFrameInfo* second = Peek();
+
+    ASSERT_NE(nullptr, Peek());
+
+    EXPECT_EQ(2u, CountFrames());
+    EXPECT_TRUE(second->isHeld);
+    (void)first;  // discarded in place of the held one
+}
+
+TEST_F(CameraAskedForFrames, RefusesAFrameWhenNoExternalBufferIsLeftAndChangesNothingElse) {
+    camera->supportsExternalBuffers = true;
+    camera->streaming.usesExternalBuffers = true;
+    void* buffer = std::malloc(64 * 48);
+    ASSERT_EQ(CameraOk, camera->AddExternalImageBuffer(buffer));
+    const tStFrameInfo* only = PeekDone();
+
+    EXPECT_EQ(nullptr, Peek());
+
+    ASSERT_NE(nullptr, only);
+    EXPECT_EQ(buffer, only->buffer);
+    EXPECT_EQ(1u, CountFrames());
+    EXPECT_TRUE(camera->streaming.isStreaming);
+    std::free(buffer);
+}
+
+TEST_F(CameraAskedForFrames, KeepsAnAbortForLaterWhenNoExternalBufferIsLeft) {
+    camera->streaming.usesExternalBuffers = true;
+    ASSERT_EQ(nullptr, Peek());
+    ASSERT_EQ(CameraOk, camera->Abort());
+
+    EXPECT_EQ(nullptr, Peek()) << "this is the frame that the abort refuses";
+
+    EXPECT_FALSE(camera->streaming.abortPending);
+}
+
+TEST_F(CameraAskedForFrames, RefusesExternalBuffersOnAModelWithoutThem) {
+    int buffer = 0;
+
+    EXPECT_EQ(CameraRefused, camera->AddExternalImageBuffer(&buffer));
+}
+
+TEST_F(CameraAskedForFrames, RefusesAFrameOfANonsensicalSizeLikeAFailedAllocation) {
+    camera->StoreControl(3, 0xFFFFFFFF);
+    testing::internal::CaptureStdout();
+
+    const tStFrameInfo* frame = Peek();
+
+    EXPECT_EQ("MorvaneFWCamera::PrivatePeekNewFrame - call to malloc with size -131071 failed\n",
+              testing::internal::GetCapturedStdout());
+    EXPECT_EQ(nullptr, frame);
+    EXPECT_EQ(0u, CountFrames());
+}
+
+TEST_F(CameraAskedForFrames, LeavesTheOlderOfTwoFramesBehindAtAStop) {
+    tStFrameInfo* older = PeekDone();
+    ASSERT_NE(nullptr, PeekDone());
+
+    ASSERT_EQ(CameraOk, camera->StopStreamingImages());
+
+    ASSERT_EQ(1u, CountFrames());
+    EXPECT_EQ(older, camera->streaming.frameQueue.TakeOldest());
+    EXPECT_TRUE(older->valid);
+    FreeFrameWithBuffer(older);
+}
+
+TEST_F(CameraAskedForFrames, LeavesNoneOfOneFrameBehindAtAStop) {
+    ASSERT_NE(nullptr, PeekDone());
+
+    ASSERT_EQ(CameraOk, camera->StopStreamingImages());
+
+    EXPECT_EQ(0u, CountFrames());
+}
+
+TEST_F(CameraAskedForFrames, FindsAFrameInvalidOnceItsSizeNoLongerFits) {
+    tStFrameInfo* frame = PeekDone();
+    EXPECT_TRUE(camera->IsFrameValid(frame));
+
+    camera->StoreControl(3, 32u << 16 | 48u);
+
+    EXPECT_FALSE(camera->IsFrameValid(frame));
+}
+
+TEST_F(CameraAskedForFrames, FindsARefusedFrameValidInATriggeredModeAlone) {
+    tStFrameInfo* frame = PeekDone();
+    frame->frameStatus = FrameRefused;
+    EXPECT_FALSE(camera->IsFrameValid(frame));
+
+    camera->StoreControl(11, 1);
+
+    EXPECT_TRUE(camera->IsFrameValid(frame));
+}
+
+TEST_F(CameraAskedForFrames, FindsMarkedAndMissingFramesInvalid) {
+    tStFrameInfo* frame = PeekDone();
+    camera->IgnoreFrameInfoVector();
+
+    EXPECT_FALSE(camera->IsFrameValid(frame));
+    EXPECT_FALSE(camera->IsFrameValid(nullptr));
+}
+
+TEST_F(CameraAskedForFrames, TellsATimeOutOnTheThreadThatBringsIt) {
+    TestClient client;
+    camera->SetStreamingCallback(TestClient::ReceiveImage, &client);
+
+    camera->PrivateImageHasTimedOut();
+
+    ASSERT_EQ(1u, client.GetImageCount());
+    EXPECT_FALSE(client.GetDeliveries()[0].hasImage);
+    EXPECT_EQ(26, client.GetDeliveries()[0].status);
+}
+
+}  // namespace ZV::Test
