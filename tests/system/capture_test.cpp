@@ -153,7 +153,7 @@ TEST_F(Capture, StreamingThatIsOnOrOffAlreadyIsNoFailure) {
 
 TEST_F(Capture, AStartThatFailsInTheStreamLayerLeavesStreamingOn) {
     ASSERT_TRUE(
-        world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_STREAM_ENTER", "count": 0})"));
+        world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_LISTEN", "count": 0})"));
 
     EXPECT_ZERR(zerrDriverFault, Zentara_SetStreaming(handle, 1));
 
