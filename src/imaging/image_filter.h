@@ -14,7 +14,7 @@ class ZCamera;
 using FilterResult = std::int16_t;
 
 inline constexpr FilterResult FilterDone = 0;           ///< The output is written.
-inline constexpr FilterResult FilterUnknownFormat = 3;  ///< A helper cannot measure the format.
+inline constexpr FilterResult FilterUnknownFormat = 3;  ///< The format cannot be measured.
 inline constexpr FilterResult FilterFailed = 5;      ///< Format not possible, or a kernel failed.
 inline constexpr FilterResult FilterNothingYet = 6;  ///< Set not complete: nothing to deliver.
 inline constexpr FilterResult PipelineNotSetUp = 27;
