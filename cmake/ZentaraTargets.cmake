@@ -4,7 +4,8 @@ target_include_directories(zentara_flags INTERFACE
   ${CMAKE_SOURCE_DIR}/include ${CMAKE_SOURCE_DIR}/src)
 # Contraction would let a variant with fused multiply-add differ from the plain arithmetic.
 target_compile_options(zentara_flags INTERFACE
-  -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wno-sign-conversion -Wnon-virtual-dtor
+  -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wno-sign-conversion
+  $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor>
   -ffp-contract=off -fno-fast-math)
 if(ZENTARA_WERROR)
   target_compile_options(zentara_flags INTERFACE -Werror)
