@@ -17,7 +17,15 @@ struct Arguments {
     StreamOptions stream;
 };
 
+/// Options that may stand before or behind the name of the command.
+void AddCommon(CLI::App* command, CommonOptions* common) {
+    command->add_option("--simulation", common->simulation,
+                        "Simulated cameras: a built-in scenario, model:NAME, or a JSON file");
+    command->add_flag("--json", common->asJson, "Results as JSON");
+}
+
 void AddCamera(CLI::App* command, CommonOptions* common) {
+    AddCommon(command, common);
     command->add_option("camera", common->camera, "Number of the camera in the list")
         ->default_val(0);
 }
@@ -75,12 +83,10 @@ ExitCode Run(int count, char** values) {
         "Exit codes: 0 done, 1 camera or capture failed, 2 wrong use, 3 no such camera, 4 camera "
         "busy,\n"
         "5 camera gone, 6 finished with lost or damaged frames, 130 interrupted.");
-    app.fallthrough();
     app.require_subcommand(1);
-    app.add_option("--simulation", arguments.common.simulation,
-                   "Simulated cameras: a built-in scenario, model:NAME, or a JSON file");
-    app.add_flag("--json", arguments.common.asJson, "Results as JSON");
-    app.add_subcommand("list", "List the cameras that nobody else holds");
+    AddCommon(&app, &arguments.common);
+    AddCommon(app.add_subcommand("list", "List the cameras that nobody else holds"),
+              &arguments.common);
     AddCamera(app.add_subcommand("info", "Tell what a camera is and can do"), &arguments.common);
     AddGrab(app, &arguments);
     AddStream(app, &arguments);

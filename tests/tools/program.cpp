@@ -38,7 +38,7 @@ int Start(const std::vector<std::string>& commandLine, const std::vector<std::st
 ProgramResult Collect(int process, const TemporaryFolder& folder, std::chrono::seconds limit) {
     int status = 0;
     const bool isEnded =
-        ::WaitUntil([&] { return waitpid(process, &status, WNOHANG) == process; }, limit);
+        ZV::Test::WaitUntil([&] { return waitpid(process, &status, WNOHANG) == process; }, limit);
     if (!isEnded) {
         kill(process, SIGKILL);
         waitpid(process, &status, 0);
