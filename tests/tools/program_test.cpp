@@ -11,6 +11,7 @@
 #include <cstdio>
 #include <cstring>
 #include <nlohmann/json.hpp>
+#include <sstream>
 
 #include "support/wait_until.h"
 
@@ -345,6 +346,119 @@ TEST(Program, AnInterruptEndsAStreamCleanlyWithCode130) {
     EXPECT_EQ(130, result.exitCode);
     EXPECT_THAT(result.output, HasSubstr("files written"));
     for (const std::string& name : folder.ListFiles()) EXPECT_THAT(name, Not(HasSubstr(".part")));
+}
+
+/// A scenario of one quick camera without noise, with a trace beside it.
+struct TracedScenario {
+    explicit TracedScenario(const std::string& camera) {
+        const std::string text = R"({"base": "mono", "timeScale": 0, "trace": ")" + GetTrace() +
+                                 R"(", "cameras": [)" + camera + "]}";
+        WriteFile(GetName(), text);
+    }
+    [[nodiscard]] std::string GetName() const { return folder.GetPath("scenario.json"); }
+    [[nodiscard]] std::string GetTrace() const { return folder.GetPath("trace.jsonl"); }
+
+    TemporaryFolder folder;
+};
+
+/// FNV-1a of 64 bits as 16 hexadecimal digits, as a trace holds it.
+std::string GetChecksum(const std::string& bytes) {
+    std::uint64_t hash = 0xCBF29CE484222325U;
+    for (const char byte : bytes) hash = (hash ^ static_cast<unsigned char>(byte)) * 0x100000001B3U;
+    std::array<char, 17> text{};
+    std::snprintf(text.data(), text.size(), "%016llx", static_cast<unsigned long long>(hash));
+    return text.data();
+}
+
+std::vector<std::string> ReadFrameChecksums(const std::string& trace) {
+    std::vector<std::string> checksums;
+    std::istringstream lines(ReadFile(trace));
+    for (std::string line; std::getline(lines, line);) {
+        const json record = json::parse(line, nullptr, false);
+        if (record.is_object() && record.value("type", "") == "frame") {
+            checksums.push_back(record["checksum"]);
+        }
+    }
+    return checksums;
+}
+
+TEST(Program, ThePixelsOfAFitsFileAreThoseOfAFrameThatTheCameraSent) {
+    const TracedScenario scenario("{}");
+    const std::string path = scenario.folder.GetPath("star.fits");
+
+    ASSERT_EQ(0,
+              RunProgram({"grab", "0", "--simulation", scenario.GetName(), "-o", path}).exitCode);
+
+    const std::vector<std::uint16_t> pixels = FitsFile(path).ReadPixels();
+    const std::string bytes(pixels.begin(), pixels.end());
+    EXPECT_THAT(ReadFrameChecksums(scenario.GetTrace()), testing::Contains(GetChecksum(bytes)));
+}
+
+TEST(Program, ACameraThatAnotherProcessTakesAfterTheListingEndsWithCode4) {
+    // The listing opens the device three times: to probe it, to read it and to set it up.
+    const TracedScenario scenario(R"({"held": {"from": 4}})");
+
+    const ProgramResult result = RunProgram({"info", "0", "--simulation", scenario.GetName()});
+
+    EXPECT_EQ(4, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("cannot be opened"));
+}
+
+TEST(Program, ACameraThatIsUnpluggedDuringAGrabEndsWithCode5) {
+    const TracedScenario scenario(R"({"faults": [{"kind": "unplug", "frame": 1, "packet": 100}]})");
+    const std::string path = scenario.folder.GetPath("a.fits");
+
+    const ProgramResult result =
+        RunProgram({"grab", "0", "--simulation", scenario.GetName(), "-o", path, "--timeout", "1"});
+
+    EXPECT_EQ(5, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("gone"));
+}
+
+TEST(Program, AGrabThatGetsNoImageEndsAfterItsTimeout) {
+    const TracedScenario scenario(
+        R"({"faults": [{"kind": "losePacket", "count": 0, "frame": 1, "packet": 0},
+                                                 {"kind": "losePacket", "probability": 1}]})");
+    const std::string path = scenario.folder.GetPath("a.fits");
+
+    const ProgramResult result = RunProgram(
+        {"grab", "0", "--simulation", scenario.GetName(), "-o", path, "--timeout", "0.5"});
+
+    EXPECT_EQ(1, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("no image came within 0.5 s"));
+    EXPECT_THAT(ReadFile(path), IsEmpty());
+}
+
+TEST(Program, ADamagedFrameIsWrittenAndEndsWithCode6) {
+    const TracedScenario scenario(
+        R"({"faults": [{"kind": "losePacket", "count": 1, "packet": 7}]})");
+    const std::string path = scenario.folder.GetPath("a.fits");
+
+    const ProgramResult result =
+        RunProgram({"grab", "0", "--simulation", scenario.GetName(), "-o", path});
+
+    EXPECT_EQ(6, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("damaged"));
+    EXPECT_EQ(26, ReadFitsNumber(FitsFile(path).Get(), "FRAMEERR"));
+}
+
+TEST(Program, AStreamWithALostPacketCountsTheDamagedFrameAndEndsWithCode6) {
+    const TracedScenario scenario(
+        R"({"faults": [{"kind": "losePacket", "frame": 2, "packet": 7}]})");
+
+    const ProgramResult result =
+        RunProgram({"stream", "0", "--simulation", scenario.GetName(), "--count", "4", "--json"});
+
+    EXPECT_EQ(6, result.exitCode);
+    EXPECT_EQ(1, json::parse(result.output)["damaged"]);
+}
+
+TEST(Program, TheTextsOfTheLibraryDoNotMixWithItsOwnOutput) {
+    const ProgramResult result = RunProgram({"list", "--simulation", "model:Unknown", "--json"});
+
+    EXPECT_EQ(0, result.exitCode);
+    EXPECT_FALSE(json::parse(result.output, nullptr, false).is_discarded());
+    EXPECT_THAT(result.errors, HasSubstr("unkown camera type being used"));
 }
 
 }  // namespace
