@@ -61,6 +61,7 @@ ZCamera* ZCamera::m_firstLostCamera = nullptr;
 
 CameraResult ZCamera::GetCameraList(std::vector<ZCamera*>& cameras) {
     DeleteLostCameras();
+    cameras.reserve(cameras.size() + MaxListedCameras);
     DeviceRecords records;
     const HALStatus status = records.Read();
     if (status != HALOk) return ReportHalStatus(status);

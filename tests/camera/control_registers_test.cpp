@@ -92,6 +92,33 @@ TEST_F(OneReadCamera, FailsARegisterReadWithTheTranslatedStatusAndNoMessage) {
     EXPECT_EQ(CameraHalFault, result);
 }
 
+TEST_F(OneReadCamera, SaysWhyItCannotReadTheVersionsBehindTheConfiguration) {
+    for (const char* address : {"0xD0005000", "0xD0003000", "0xD0002000", "0xD0004000"}) {
+        ASSERT_TRUE(world.AddFault(std::string(R"({"kind": "failRequest", "address": ")") +
+                                   address + R"("})"));
+        testing::internal::CaptureStdout();
+
+        const CameraResult result = camera->ReadCameraInfo();
+
+        EXPECT_NE("", testing::internal::GetCapturedStdout()) << address;
+        EXPECT_EQ(CameraHalFault, result) << address;
+    }
+    EXPECT_EQ(CameraOk, camera->ReadCameraInfo());
+}
+
+TEST_F(OneReadCamera, SaysNothingWhenItCannotReadTheDirectoryOrTheConfiguration) {
+    for (const char* address : {"0xD0000000", "0xD0001000"}) {
+        ASSERT_TRUE(world.AddFault(std::string(R"({"kind": "failRequest", "address": ")") +
+                                   address + R"("})"));
+        testing::internal::CaptureStdout();
+
+        const CameraResult result = camera->ReadCameraInfo();
+
+        EXPECT_EQ("", testing::internal::GetCapturedStdout()) << address;
+        EXPECT_EQ(CameraHalFault, result) << address;
+    }
+}
+
 TEST_F(OneReadCamera, ReadsReservedQuadletsWithoutAChecksum) {
     std::uint32_t data[3] = {};
 

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <ostream>
 #include <string>
@@ -243,6 +244,26 @@ TEST_P(FirstSetup, WritesExactlyTheDefaultStateInItsOrder) {
     const std::vector<RegisterWrite> writes = world.ReadRegisterWrites();
     EXPECT_EQ(Describe(ExpectedSetup(GetParam()).writes), Describe(writes));
     EXPECT_EQ(ExpectedSetup(GetParam()).writes, writes);
+    (void)ZCamera::FreeCameraList(cameras);
+}
+
+TEST(TweakedSetup, ReadsTheConfigurationAgainBehindMiscCtrlAndAtTheTakeOver) {
+    const SimulationWorld world("model:TirelM1");
+    std::vector<ZCamera*> cameras;
+
+    ASSERT_EQ(CameraOk, ZCamera::GetCameraList(cameras));
+
+    std::uint64_t shortest = ~std::uint64_t{0};
+    std::size_t wholeReads = 0;
+    for (const TraceRecord& request : world.ReadRequests()) {
+        if (request.name == "FW_IOCTL_ASYNC_READ")
+            shortest = std::min(shortest, request.outputBytes);
+    }
+    for (const TraceRecord& request : world.ReadRequests()) {
+        if (request.name != "FW_IOCTL_ASYNC_READ") continue;
+        wholeReads += request.outputBytes == shortest + 4 * (210 - 1) ? 1 : 0;
+    }
+    EXPECT_EQ(3u, wholeReads) << "once when listed, once behind MiscCtrl, once at the end";
     (void)ZCamera::FreeCameraList(cameras);
 }
 
