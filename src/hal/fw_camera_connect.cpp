@@ -120,6 +120,7 @@ HALStatus FWCameraReallocateBandwidth(HALCamera* camera, std::uint16_t payloadBy
 }
 
 HALStatus FWCameraAllocateBandwidth(HALCamera camera) {
+    if (GetFWContext(camera) == nullptr) return HALBandwidthNotAllocated;
     FWDeviceContext& context = *GetFWContext(camera);
     WriteDebuggerOutput("Allocating resources\n");
     AllocateBandwidthRecord record = MakeAllocateBandwidthRecord(context.packetStride);
@@ -136,6 +137,7 @@ HALStatus FWCameraAllocateBandwidth(HALCamera camera) {
 }
 
 HALStatus FWCameraAllocateChannel(HALCamera camera) {
+    if (GetFWContext(camera) == nullptr) return HALChannelNotAllocated;
     FWDeviceContext& context = *GetFWContext(camera);
     context.channel = AnyChannel;
     AllocateChannelRecord record = MakeAllocateChannelRecord();
@@ -147,6 +149,7 @@ HALStatus FWCameraAllocateChannel(HALCamera camera) {
 }
 
 HALStatus FWCameraAllocateResources(HALCamera camera, std::uint16_t tagCode) {
+    if (GetFWContext(camera) == nullptr) return HALResourcesNotAllocated;
     FWDeviceContext& context = *GetFWContext(camera);
     if (RequestResources(context, SpeedFlagS800, tagCode)) return HALOk;
     context.speedFlag = SpeedFlagS400;

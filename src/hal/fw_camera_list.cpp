@@ -180,8 +180,10 @@ HALStatus FWCameraGetList(HALCamera** list, std::uint32_t primaryIdAddress,
     if (cameras == nullptr) return PlatformErrorNotEnoughMemory;
     const HALStatus status = ProbeDevices(cameras, staging, primaryIdAddress, secondaryIdAddress);
     if (status != HALOk) {
+        const std::uint32_t error = GetLastPlatformError();
         GiveUpRecords(cameras, staging.count);
         std::free(cameras);
+        SetLastPlatformError(error);  // The caller prints its text.
         return status;
     }
     *list = cameras;

@@ -4,11 +4,11 @@
 
 namespace ZV {
 
-/// Holds a mutex of the seam for a scope. A mutex that is not there is not held.
+/// Holds a mutex of the seam for a scope. Null is not held, and leaves the last platform error
+/// alone.
 class MutexHold {
   public:
-    explicit MutexHold(PlatformMutex* heldMutex)
-        : mutex(TakeMutex(heldMutex) == WaitOutcome::Signalled ? heldMutex : nullptr) {}
+    explicit MutexHold(PlatformMutex* heldMutex) : mutex(Take(heldMutex) ? heldMutex : nullptr) {}
     ~MutexHold() {
         if (mutex != nullptr) (void)GiveMutex(mutex);
     }
@@ -16,6 +16,10 @@ class MutexHold {
     MutexHold& operator=(const MutexHold&) = delete;
 
   private:
+    static bool Take(PlatformMutex* wanted) {
+        return wanted != nullptr && TakeMutex(wanted) == WaitOutcome::Signalled;
+    }
+
     PlatformMutex* const mutex;
 };
 

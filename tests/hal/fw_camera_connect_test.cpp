@@ -8,7 +8,9 @@
 #include "hal/control_records.h"
 #include "hal/debug_output_file.h"
 #include "hal/fw_camera.h"
+#include "hal/fw_device_context.h"
 #include "hal/hal_world.h"
+#include "hal/platform/last_error.h"
 
 namespace ZV::Test {
 namespace {
@@ -111,6 +113,33 @@ TEST_F(FWCameraConnection, ADeviceThatIsGoneIs17) {
 
     EXPECT_EQ(HALDeviceNotOpen, ConnectPlain(camera, 100));
     EXPECT_EQ(0, camera->connected);
+}
+
+TEST_F(FWCameraConnection, AFailedConnectLeavesTheErrorOfItsLastStepForTheErrorText) {
+    ASSERT_TRUE(mono.world.Unplug());
+
+    EXPECT_EQ(HALDeviceNotOpen, ConnectPlain(camera, 100));
+
+    EXPECT_EQ(PlatformErrorFileNotFound, GetLastPlatformError());
+}
+
+TEST_F(FWCameraConnection, CallbacksAreStoredWhateverTheConnectGave) {
+    ASSERT_TRUE(mono.world.Unplug());
+    int marker = 0;
+    const HALFrameCallback getFrame = [](void*) -> tStFrameInfo* { return nullptr; };
+    const HALFrameCallback peekFrame = [](void*) -> tStFrameInfo* { return nullptr; };
+    const HALEventCallback done = [](void*) {};
+    const HALEventCallback overrun = [](void*) {};
+
+    EXPECT_EQ(HALDeviceNotOpen,
+              HAL_CameraConnect(camera, 100, getFrame, peekFrame, done, overrun, nullptr, &marker));
+
+    const StreamAssembler& assembler = GetFWContext(*camera)->assembler;
+    EXPECT_EQ(getFrame, assembler.getNewFrame);
+    EXPECT_EQ(peekFrame, assembler.peekNewFrame);
+    EXPECT_EQ(done, assembler.imageDone);
+    EXPECT_EQ(overrun, assembler.overrun);
+    EXPECT_EQ(&marker, assembler.context);
 }
 
 TEST_F(FWCameraConnection, AFailedQueryIs27AndClosesTheDevice) {
@@ -300,6 +329,9 @@ TEST(FWCameraRecord, FreeRoutinesAloneGiveTheirCodes) {
     EXPECT_EQ(HALResourcesNotFreed, FWCameraFreeResources(empty));
     EXPECT_EQ(HALChannelNotFreed, FWCameraFreeChannel(empty));
     EXPECT_EQ(HALBandwidthNotFreed, FWCameraFreeBandwidth(empty));
+    EXPECT_EQ(HALBandwidthNotAllocated, FWCameraAllocateBandwidth(empty));
+    EXPECT_EQ(HALChannelNotAllocated, FWCameraAllocateChannel(empty));
+    EXPECT_EQ(HALResourcesNotAllocated, FWCameraAllocateResources(empty, 1));
 }
 
 }  // namespace

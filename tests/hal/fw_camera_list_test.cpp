@@ -7,6 +7,7 @@
 #include "hal/control_records.h"
 #include "hal/debug_output_file.h"
 #include "hal/hal_world.h"
+#include "hal/platform/last_error.h"
 
 namespace ZV::Test {
 namespace {
@@ -148,6 +149,16 @@ TEST(FWCameraList, ARequestThatFailsEndsTheListingWith17AndLeavesNothingOpen) {
         EXPECT_EQ(1u, mono.count);
     }
     EXPECT_EQ(10u, request);
+}
+
+TEST(FWCameraList, AFailedListingLeavesTheErrorThatEndedItForTheErrorText) {
+    HALWorld mono(R"({"base":"mono","cameras":[{"faults":[
+        {"kind":"failRequest","code":"FW_IOCTL_ALLOC_CHANNEL","error":1450},
+        {"kind":"failRequest","code":"FW_IOCTL_FREE_RESOURCES","error":87}]}]})");
+
+    EXPECT_EQ(HALDeviceNotOpen, mono.List());
+
+    EXPECT_EQ(PlatformErrorNoSystemResources, GetLastPlatformError());
 }
 
 TEST(FWCameraList, AFailureAtTheSecondDeviceGivesUpTheFirstOneToo) {
