@@ -21,6 +21,10 @@ bool IsComplete(const CameraContext& context) {
 
 }  // namespace
 
+CameraContext::~CameraContext() {
+    ClearQueue(*this);
+}
+
 std::unique_ptr<CameraContext> MakeCameraContext(ZCamera& camera) {
     std::unique_ptr<CameraContext> context(new (std::nothrow) CameraContext);
     if (!context) return nullptr;

@@ -46,6 +46,11 @@ inline constexpr std::uint32_t QueueCapacity = 100;
 /// the sending of settings apart; ImageReceived and the emptying by Zentara_Abort do without it.
 /// `queueMutex` keeps the queue whole whoever changes it; no callback runs under a leaf mutex.
 struct CameraContext {
+    CameraContext() = default;
+    ~CameraContext();  ///< Frees what is still queued.
+    CameraContext(const CameraContext&) = delete;
+    CameraContext& operator=(const CameraContext&) = delete;
+
     std::unique_ptr<ZImagePipeline> postPipeline;
     std::unique_ptr<ZRGBFilterWheel> rgbWheel;
     ZFolaryRatioCorrection* ratioCorrection = nullptr;  ///< borrowed from the camera, for its life

@@ -9,9 +9,10 @@ namespace ZV {
 
 namespace {
 
-// A camera that another process holds reads as open, but nothing of it is ours.
+// Open, and the client has not closed it. A camera that another process holds reads as open, but
+// has no context, and neither has one whose close failed.
 bool IsInUse(ZCamera* camera) {
-    return camera->IsCameraOpen() && camera->DoWeHaveExclusiveAccess();
+    return camera->IsCameraOpen() && GetCameraContext(*camera) != nullptr;
 }
 
 bool Holds(const std::vector<ZCamera*>& cameras, const ZCamera* camera) {
@@ -32,7 +33,7 @@ CameraStore& CameraStore::Get() {
 }
 
 CameraResult CameraStore::MakeList() {
-    FreeClosedRetiredCameras();
+    FreeUnusedRetiredCameras();
     UnregisterClosedCameras();
     // Kept: only the listing's own result counts, and this stops at the first open camera.
     (void)ZCamera::EraseClosedCamerasFromList(cameraList);
@@ -69,12 +70,12 @@ void CameraStore::UnregisterClosedCameras() {
     }
 }
 
-void CameraStore::FreeClosedRetiredCameras() {
-    const auto firstClosed =
+void CameraStore::FreeUnusedRetiredCameras() {
+    const auto firstUnused =
         std::stable_partition(retiredCameras.begin(), retiredCameras.end(), IsInUse);
-    std::vector<ZCamera*> closed(firstClosed, retiredCameras.end());
-    retiredCameras.erase(firstClosed, retiredCameras.end());
-    FreeCameras(closed);
+    std::vector<ZCamera*> unused(firstUnused, retiredCameras.end());
+    retiredCameras.erase(firstUnused, retiredCameras.end());
+    FreeCameras(unused);
 }
 
 void CameraStore::RetireList() {

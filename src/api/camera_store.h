@@ -43,7 +43,7 @@ class CameraStore {
     };
 
     void UnregisterClosedCameras();
-    void FreeClosedRetiredCameras();
+    void FreeUnusedRetiredCameras();
     void RetireList();
     void FreeContextsOf(ZCamera& camera);
     void FreeContextsWithoutCamera();
