@@ -11,8 +11,6 @@ namespace {
 
 class EntryQueue : public testing::Test {
   protected:
-    ~EntryQueue() override { ClearQueue(context); }
-
     bool Append(std::uint32_t userData, std::uint16_t kind = QueueKindFrame) {
         return AppendEntry(context, {.userData = userData, .kind = kind});
     }

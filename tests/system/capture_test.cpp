@@ -221,39 +221,141 @@ TEST_F(Capture, AnAbortWithNothingToDoSucceeds) {
     EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
 }
 
-// ---- A wait for ever, in a child process ----
+TEST_F(Capture, AStaleExposureCallbackFindsAnEmptyQueueDuringAGrab) {
+    CallbackLog calls;
+    ClientFrame frame(GetImageBytes());
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, 3));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_TRUE(calls.WaitForCalls(2));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
 
-/// What the child says of itself, in memory that both processes share through a pipe.
-struct Report {
-    pid_t thread;
+    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+
+    EXPECT_EQ(2u, calls.CountCalls());
+}
+
+TEST_F(Capture, UnpluggingIsNotReportedAndTheCameraCanBeClosed) {
+    CallbackLog calls;
+    ClientFrame frame(GetImageBytes());
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_TRUE(world.Unplug());
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, 3));
+
+    EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+
+    for (const CallbackLog::Call& call : calls.GetCalls()) EXPECT_ZERR(zerrNone, call.errorCode);
+    EXPECT_TRUE(ListCameras().empty());
+    // The close could not end the stream; what it left ends with the listing that follows.
+    EXPECT_TRUE(ListCameras().empty());
+    EXPECT_EQ(0u, world.GetState().openHandles);
+}
+
+TEST_F(Capture, ACameraThatIsPluggedInAgainIsListedAndStreams) {
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_TRUE(world.Unplug());
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    ListCameras();
+    ASSERT_TRUE(world.Plug());
+
+    ASSERT_EQ(1u, ListCameras().size());
+
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
+    ClientFrame frame(GetImageBytes());
+    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+}
+
+/// A callback that stays inside until the test lets it go.
+struct SlowCallback {
+    std::atomic<bool> isInside{false};
+    std::atomic<bool> mayLeave{false};
+
+    std::uint64_t GetPrivate() { return reinterpret_cast<std::uintptr_t>(this); }
+    static void Stay(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t) {
+        auto& self = *reinterpret_cast<SlowCallback*>(static_cast<std::uintptr_t>(userPrivate));
+        self.isInside = true;
+        EXPECT_TRUE(WaitUntil([&] { return self.mayLeave.load(); }));
+    }
 };
+
+TEST_F(Capture, AReleaseWaitsForACallbackThatIsRunning) {
+    SlowCallback callback;
+    ClientFrame frame(GetImageBytes());
+    ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frame.Get(), SlowCallback::Stay, zcbFrameDone,
+                                             callback.GetPrivate(), 0));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_TRUE(WaitUntil([&] { return callback.isInside.load(); }));
+    std::atomic<bool> hasReturned{false};
+    std::thread releaser([&] {
+        Zentara_ReleaseDriver();
+        hasReturned = true;
+    });
+    EXPECT_FALSE(WaitUntil([&] { return hasReturned.load(); }, std::chrono::milliseconds(100)));
+
+    callback.mayLeave = true;
+    releaser.join();
+
+    EXPECT_EQ(0u, world.GetState().openHandles);
+    EXPECT_ZERR(zerrNone, Zentara_LoadDriver());
+}
+
+// ---- Waits for ever, in a child process ----
 
 int reportPipe[2];
 ZentaraHandle childHandle;
-std::atomic<bool> hasAbortReturned{false};
 
-void AbortFromFrameCallback(std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
-    const Report report{gettid()};
-    if (write(reportPipe[1], &report, sizeof(report)) != sizeof(report)) _exit(2);
-    (void)Zentara_Abort(childHandle);
-    hasAbortReturned = true;
-    const Report returned{0};
-    if (write(reportPipe[1], &returned, sizeof(returned)) != sizeof(returned)) _exit(2);
+void Report(pid_t thread) {
+    if (write(reportPipe[1], &thread, sizeof(thread)) != sizeof(thread)) _exit(2);
 }
 
-[[noreturn]] void RunChild() {
-    SimulationWorld world(SmallMono);
+/// Tells the parent who calls, and that the call returned if ever it does.
+template <typename Call>
+void ReportAround(Call&& call) {
+    Report(gettid());
+    call();
+    Report(0);
+}
+
+void AbortFromCallback(std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
+    ReportAround([] { (void)Zentara_Abort(childHandle); });
+}
+
+void CloseFromCallback(std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
+    ReportAround([] { (void)Zentara_CloseCamera(childHandle); });
+}
+
+void QueueFromCallback(std::uint64_t, std::uint32_t, std::uint32_t, std::uint32_t) {
+    ReportAround([] {
+        Zentara_Frame frame{};
+        (void)Zentara_QueueFrame(childHandle, &frame, nullptr, 0, 0, 0);
+    });
+}
+
+void Require(ZentaraResult result) {
+    if (result != zerrNone) _exit(2);
+}
+
+void OpenInChild() {
     Zentara_CamListItem item{};
     std::uint32_t length = 1;
+    Require(Zentara_LoadDriver());
+    Require(Zentara_ListCameras(&item, &length));
+    Require(Zentara_OpenCamera(0, &childHandle));
+}
+
+[[noreturn]] void RunFrameCallback(ZentaraAsyncCallback callback) {
+    OpenInChild();
     ClientFrame frame(64 * 48);
-    if (Zentara_LoadDriver() != 0 || Zentara_ListCameras(&item, &length) != 0) _exit(2);
-    if (Zentara_OpenCamera(0, &childHandle) != 0) _exit(2);
-    if (Zentara_QueueFrame(childHandle, frame.Get(), AbortFromFrameCallback, zcbFrameDone, 0, 0) !=
-        0) {
-        _exit(2);
-    }
-    if (Zentara_SetStreaming(childHandle, 1) != 0) _exit(2);
+    Require(Zentara_QueueFrame(childHandle, frame.Get(), callback, zcbFrameDone, 0, 0));
+    Require(Zentara_SetStreaming(childHandle, 1));
     while (true) pause();
+}
+
+[[noreturn]] void RunSettingsCallback(ZentaraAsyncCallback callback) {
+    OpenInChild();
+    Zentara_Settings settings{};
+    Require(Zentara_ReadSettingsFromCam(childHandle, &settings));
+    (void)Zentara_QueueSettings(childHandle, &settings, callback, zcbFrameDone, 0, 0);
+    _exit(3);
 }
 
 bool IsThreadAsleep(pid_t process, pid_t thread) {
@@ -265,27 +367,37 @@ bool IsThreadAsleep(pid_t process, pid_t thread) {
     return name != std::string::npos && text.substr(name + 2, 1) == "S";
 }
 
-TEST(CaptureAbort, FromAFrameCallbackWaitsForItselfForEver) {
-    ASSERT_EQ(0, pipe(reportPipe));
+/// True when the thread that `run` reports is seen to wait, and its call has not returned by then.
+bool DoesWaitForEver(void (*run)(ZentaraAsyncCallback), ZentaraAsyncCallback callback) {
+    const SimulationWorld world(SmallMono);
+    if (pipe(reportPipe) != 0) return false;
     const pid_t child = fork();
-    ASSERT_NE(-1, child);
-    if (child == 0) RunChild();
+    if (child == 0) run(callback);
     close(reportPipe[1]);
-    Report report{};
-    const bool hasReported = read(reportPipe[0], &report, sizeof(report)) == sizeof(report);
-
+    pid_t thread = 0;
+    const bool hasReported = read(reportPipe[0], &thread, sizeof(thread)) == sizeof(thread);
     std::uint32_t asleep = 0;
-    const bool waits = hasReported && WaitUntil([&] {
-                           asleep = IsThreadAsleep(child, report.thread) ? asleep + 1 : 0;
-                           return asleep >= 50;
-                       });
+    const bool isWaiting = hasReported && WaitUntil([&] {
+                               if (IsThreadAsleep(child, thread)) ++asleep;
+                               return asleep >= 100;
+                           });
     kill(child, SIGKILL);
     waitpid(child, nullptr, 0);
-
-    EXPECT_TRUE(hasReported);
-    EXPECT_TRUE(waits);
-    EXPECT_NE(static_cast<ssize_t>(sizeof(report)), read(reportPipe[0], &report, sizeof(report)));
+    const bool hasReturned = read(reportPipe[0], &thread, sizeof(thread)) != 0;
     close(reportPipe[0]);
+    return isWaiting && !hasReturned;
+}
+
+TEST(WaitForEver, AnAbortFromAFrameCallbackWaitsForItself) {
+    EXPECT_TRUE(DoesWaitForEver(RunFrameCallback, AbortFromCallback));
+}
+
+TEST(WaitForEver, ACloseFromAFrameCallbackWaitsForItsOwnThread) {
+    EXPECT_TRUE(DoesWaitForEver(RunFrameCallback, CloseFromCallback));
+}
+
+TEST(WaitForEver, AQueueCallFromTheCallbackOfSettingsAppliedAtOnceWaitsForItself) {
+    EXPECT_TRUE(DoesWaitForEver(RunSettingsCallback, QueueFromCallback));
 }
 
 }  // namespace

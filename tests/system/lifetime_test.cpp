@@ -304,6 +304,37 @@ TEST_F(TwoCameras, AnOpenCameraIsNotInTheNextListAndKeepsWorking) {
     EXPECT_ZERR(zerrBadHandle, Zentara_CloseCamera(handle));
 }
 
+TEST_F(TwoCameras, AClosedCameraBehindAnOpenOneIsDroppedToo) {
+    ListCameras();
+    ZentaraHandle open = 0;
+    ZentaraHandle closed = 0;
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(1, &closed));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(closed));
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &open));
+
+    ASSERT_EQ(1u, ListCameras().size());
+
+    ExpectBadHandleFromAll(closed);
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &closed));
+    EXPECT_NE(open, closed);
+}
+
+TEST_F(TwoCameras, ListingsOverAnOpenCameraMayBeRepeated) {
+    ListCameras();
+    ZentaraHandle kept = 0;
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &kept));
+    for (int round = 0; round < 20; ++round) {
+        ASSERT_EQ(1u, ListCameras().size());
+        ZentaraHandle handle = 0;
+        ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
+        ASSERT_EQ(0u, ListCameras().size());
+        ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    }
+
+    EXPECT_EQ(1u, world.GetState(0).openHandles);
+    EXPECT_EQ(0u, world.GetState(1).openHandles);
+}
+
 TEST_F(TwoCameras, ACameraThatAListingDroppedWhileOpenEndsWithTheLibrary) {
     ListCameras();
     ZentaraHandle handle = 0;
@@ -396,6 +427,17 @@ TEST_F(Opened, AReleaseEndsACameraThatStreams) {
     Zentara_ReleaseDriver();
 
     EXPECT_EQ(0u, world.GetState().openHandles);
+    EXPECT_ZERR(zerrNone, Zentara_LoadDriver());
+}
+
+TEST_F(Opened, AReleaseDropsQueuedFramesWithoutACallback) {
+    CallbackLog calls;
+    ClientFrame frame(GetImageBytes());
+    for (int i = 0; i < 5; ++i) ASSERT_ZERR(zerrNone, Queue(frame, calls, 3));
+
+    Zentara_ReleaseDriver();
+
+    EXPECT_EQ(0u, calls.CountCalls());
     EXPECT_ZERR(zerrNone, Zentara_LoadDriver());
 }
 
