@@ -4,14 +4,14 @@
 
 namespace ZV {
 
-/// The wait clock gives every limited wait of the library its length. It normally runs in real time; a
-/// test makes it run faster by a divisor of 1 or more (0 counts as 1), so that 5000 ms pass in 5. Until
-/// it is set the divisor is that of the variable `ZENTARA_WAIT_DIVISOR`, read at the first wait; 1 when
-/// the variable is unset or no number. Thread-safe.
+/// The wait clock gives every limited wait of the library its length. It normally runs in real
+/// time; a test makes it run faster by a divisor of 1 or more (0 counts as 1), so that 5000 ms pass
+/// in 5. Until it is set the divisor is that of the variable `ZENTARA_WAIT_DIVISOR`, read at the
+/// first wait; 1 when the variable is unset or no number. Thread-safe.
 void SetWaitClockDivisor(std::uint32_t divisor);
 
-/// Real milliseconds that `timeoutMs` milliseconds of the wait clock take, rounded up to at least 1 for a
-/// limit that is not 0. `WaitForEver` stays what it is.
+/// Real milliseconds that `timeoutMs` milliseconds of the wait clock take, rounded up to at least 1
+/// for a limit that is not 0. `WaitForEver` stays what it is.
 std::uint64_t GetRealWaitMs(std::uint64_t timeoutMs);
 
 /// Microseconds of a clock that never goes back.

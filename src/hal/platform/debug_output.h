@@ -2,9 +2,9 @@
 
 namespace ZV {
 
-/// Hands a text to the system's debugger output; silent when nobody listens. On POSIX it goes to standard
-/// error while `ZENTARA_DEBUG_OUTPUT` is 1, or is appended to the file that the variable names.
-/// Thread-safe; one call is one piece of output.
+/// Hands a text to the system's debugger output; silent when nobody listens. On POSIX it goes to
+/// standard error while `ZENTARA_DEBUG_OUTPUT` is 1, or is appended to the file that the variable
+/// names. Thread-safe; one call is one piece of output.
 void WriteDebuggerOutput(const char* text);
 
 }  // namespace ZV

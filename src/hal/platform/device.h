@@ -9,8 +9,8 @@ namespace ZV {
 /// An open device of the kernel driver.
 struct PlatformDevice;
 
-/// Record of one overlapped request, with a manual-reset event of its own. It must live until its request
-/// has ended.
+/// Record of one overlapped request, with a manual-reset event of its own. It must live until its
+/// request has ended.
 struct PlatformOverlapped;
 
 /// One control request; lengths in bytes. Input and output may be one buffer.
@@ -31,11 +31,12 @@ enum class ControlOutcome {
 enum class CompletionOutcome {
     Completed,  ///< The request ended well.
     Failed,     ///< The request ended with a failure; the last platform error says which.
-    Ended,      ///< The calling thread is to end (EndThread): it must return at once, touching nothing.
-    TimedOut,   ///< The limit ran out; the request is still pended.
+    Ended,  ///< The calling thread is to end (EndThread): it must return at once, touching nothing.
+    TimedOut,  ///< The limit ran out; the request is still pended.
 };
 
-/// Opens the device at `path` for reading and writing, unshared, existing, overlapped. Null on failure.
+/// Opens the device at `path` for reading and writing, unshared, existing, overlapped. Null on
+/// failure.
 PlatformDevice* OpenDevice(const char* path);
 
 /// Null is ignored.
@@ -48,14 +49,15 @@ bool IsRealDevice(const PlatformDevice* device);
 /// answered goes to `bytes` if that is not null.
 bool ControlDevice(PlatformDevice* device, const ControlRequest& request, std::uint32_t* bytes);
 
-/// Sends a request without waiting for its end. `overlapped` must not have a request under way; its event
-/// is cleared first. A request that is done at once leaves its event signalled.
+/// Sends a request without waiting for its end. `overlapped` must not have a request under way; its
+/// event is cleared first. A request that is done at once leaves its event signalled.
 ControlOutcome ControlDeviceOverlapped(PlatformDevice* device, const ControlRequest& request,
                                        PlatformOverlapped* overlapped);
 
-/// Waits for the end of the request of `overlapped`, at most `timeoutMs` milliseconds of the wait clock;
-/// `WaitForEver` has no limit. Returns at once when no request is under way, with the outcome of the last.
-/// A thread that is to end gets `Ended` from every such wait, also when its request is done.
+/// Waits for the end of the request of `overlapped`, at most `timeoutMs` milliseconds of the wait
+/// clock; `WaitForEver` has no limit. Returns at once when no request is under way, with the
+/// outcome of the last. A thread that is to end gets `Ended` from every such wait, also when its
+/// request is done.
 CompletionOutcome WaitForCompletion(PlatformDevice* device, PlatformOverlapped* overlapped,
                                     std::uint64_t timeoutMs);
 
@@ -71,8 +73,8 @@ bool IsOverlappedPending(const PlatformOverlapped* overlapped);
 /// Null when the system has none to give.
 PlatformOverlapped* MakeOverlapped();
 
-/// Requires: no request under way (a record that has one is left alone, not taken from under the driver).
-/// Null is ignored.
+/// Requires: no request under way (a record that has one is left alone, not taken from under the
+/// driver). Null is ignored.
 void DestroyOverlapped(PlatformOverlapped* overlapped);
 
 }  // namespace ZV

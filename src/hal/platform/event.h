@@ -24,7 +24,8 @@ bool SignalEvent(PlatformEvent* event);
 void ClearEvent(PlatformEvent* event);
 
 /// Waits at most `timeoutMs` milliseconds of the wait clock (clock.h), or without limit for
-/// `WaitForEver`. Limits beyond 32 bits are waited for in slices. Null is a failed wait. Thread-safe.
+/// `WaitForEver`. Limits beyond 32 bits are waited for in slices. Null is a failed wait.
+/// Thread-safe.
 WaitOutcome WaitForEvent(PlatformEvent* event, std::uint64_t timeoutMs);
 
 /// False when the close fails; the event is then still there. Null succeeds.

@@ -5,8 +5,8 @@
 
 namespace ZV {
 
-/// Error numbers of the system as the seam reports them, the same on every platform: those of the Windows
-/// system error table.
+/// Error numbers of the system as the seam reports them, the same on every platform: those of the
+/// Windows system error table.
 inline constexpr std::uint32_t PlatformErrorNone = 0;
 inline constexpr std::uint32_t PlatformErrorFileNotFound = 2;
 inline constexpr std::uint32_t PlatformErrorAccessDenied = 5;
@@ -28,8 +28,8 @@ inline constexpr std::uint32_t PlatformErrorNoSystemResources = 1450;
 std::uint32_t GetLastPlatformError();
 void SetLastPlatformError(std::uint32_t error);
 
-/// Writes the system's text for `error`, with whatever line end the system gives it, to `text`, cut to
-/// `capacity` - 1 bytes and always terminated. False, and an empty text, if the system has none.
+/// Writes the system's text for `error`, with whatever line end the system gives it, to `text`, cut
+/// to `capacity` - 1 bytes and always terminated. False, and an empty text, if the system has none.
 bool GetPlatformErrorText(std::uint32_t error, char* text, std::size_t capacity);
 
 }  // namespace ZV

@@ -4,7 +4,8 @@
 
 namespace ZV {
 
-/// Unnamed counting semaphore with an initial count of 1 and a maximum of 100. No owner, not recursive.
+/// Unnamed counting semaphore with an initial count of 1 and a maximum of 100. No owner, not
+/// recursive.
 struct PlatformSemaphore;
 
 /// Null when the system has none to give.

@@ -13,11 +13,12 @@ struct SettingsStore;
 /// Null when there is no store.
 SettingsStore* OpenSettingsStore();
 
-/// A number of 32 bits, decimal or 0x-prefixed in a file. False, `value` untouched, when it is not there.
+/// A number of 32 bits, decimal or 0x-prefixed in a file. False, `value` untouched, when it is not
+/// there.
 bool ReadStoredNumber(SettingsStore* store, const char* name, std::uint32_t* value);
 
-/// A text, cut to `capacity` - 1 bytes and always terminated. False, `text` untouched, when it is not
-/// there.
+/// A text, cut to `capacity` - 1 bytes and always terminated. False, `text` untouched, when it is
+/// not there.
 bool ReadStoredText(SettingsStore* store, const char* name, char* text, std::size_t capacity);
 
 /// Null is ignored.

@@ -17,25 +17,26 @@ PlatformThread* StartThread(PlatformThreadEntry entry, void* argument);
 /// System identifier of `thread`.
 std::uint32_t GetThreadId(const PlatformThread* thread);
 
-/// Waits until `thread` has ended, at most `timeoutMs` milliseconds of the wait clock (clock.h). May be
-/// called again after a time-out. Thread-safe.
+/// Waits until `thread` has ended, at most `timeoutMs` milliseconds of the wait clock (clock.h).
+/// May be called again after a time-out. Thread-safe.
 WaitOutcome WaitForThread(PlatformThread* thread, std::uint64_t timeoutMs);
 
-/// Ends `thread` by asking: raises its end flag and wakes its wait for an overlapped request, which then
-/// returns `CompletionOutcome::Ended` (device.h), and waits until the thread has returned from its entry.
-/// On Windows a thread that has not ended after a second is killed. Returns false when it could not be
-/// ended; the thread is then still the caller's.
+/// Ends `thread` by asking: raises its end flag and wakes its wait for an overlapped request, which
+/// then returns `CompletionOutcome::Ended` (device.h), and waits until the thread has returned from
+/// its entry. On Windows a thread that has not ended after a second is killed. Returns false when
+/// it could not be ended; the thread is then still the caller's.
 bool EndThread(PlatformThread* thread);
 
-/// Gives up the thread's handle. A thread that still runs goes on by itself and frees what it holds.
+/// Gives up the thread's handle. A thread that still runs goes on by itself and frees what it
+/// holds.
 void CloseThread(PlatformThread* thread);
 
 /// Raises the calling thread to time-critical priority when it serves a real device; over simulated
 /// devices nothing changes. What the system refuses is not an error.
 void RaiseOwnThreadPriority(bool servesRealDevice);
 
-/// Raises the process to the realtime class and lowers it to the normal one. Only where a real device is
-/// served, and on Windows alone: elsewhere the class is left as it is.
+/// Raises the process to the realtime class and lowers it to the normal one. Only where a real
+/// device is served, and on Windows alone: elsewhere the class is left as it is.
 void RaiseProcessPriority(bool servesRealDevice);
 void LowerProcessPriority(bool servesRealDevice);
 
