@@ -173,6 +173,8 @@ HALStatus FWCameraStopStreaming(HALCamera camera, std::uint32_t streamRegister) 
     if (context->streaming.load(std::memory_order_relaxed) == 0) return HALOk;
     AbandonFrame(*context);
     if (!EndCallbackLoop(*context)) return HALStopFailed;
+    // The loop may have begun another frame before it saw the stop.
+    AbandonFrame(*context);
     (void)DestroyEvent(std::exchange(context->stopEvent, nullptr));
     const HALStatus status = StopReception(*context);
     GiveUpRing(*context, status == HALOk);

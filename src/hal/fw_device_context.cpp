@@ -89,6 +89,8 @@ bool CloseHeldDevice(FWDeviceContext& context) {
     (void)EndNotification(context);
     if (!EndHALThread(&context.callbackThread) || context.notifyThread != nullptr) return false;
     (void)DestroyEvent(std::exchange(context.stopEvent, nullptr));
+    // The next stream must not go on with a frame of this one.
+    context.assembler.AbandonFrame();
     if (context.ring != nullptr) {
         (void)EndRequests(*context.ring);
         RetireRing(context, std::move(context.ring));

@@ -11,6 +11,7 @@
 #include "hal/frame_info.h"
 #include "hal/fw_device_context.h"
 #include "hal/hal_world.h"
+#include "hal/mutex_hold.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
@@ -391,6 +392,39 @@ TEST(FWCameraStream, AFrameInHandIsAbandonedAtTheStopWithoutBeingReported) {
     EXPECT_EQ(0u, mono.taker.frame.bufferSize);
     EXPECT_FALSE(mono.taker.frame.isHeld);
     EXPECT_EQ(0u, mono.taker.images);
+}
+
+TEST(FWCameraStream, AFrameThatBeginsBeforeTheLoopSeesTheStopIsAbandonedToo) {
+    const FastWaits fast(/*divisor=*/5);
+    StreamedCamera mono(QuietMono);
+    ASSERT_EQ(HALOk, mono.Start());
+    // Stands for a loop that was about to parse a request when the stop came.
+    std::thread lateLoop([&] {
+        EXPECT_TRUE(WaitUntil([&] { return mono.Context().streaming.load() == 0; }));
+        const MutexHold hold(mono.Context().streamMutex);
+        mono.taker.frame.isHeld = true;
+        mono.Context().assembler.current = &mono.taker.frame;
+    });
+
+    EXPECT_EQ(HALOk, mono.Stop());
+    lateLoop.join();
+
+    EXPECT_EQ(nullptr, mono.Context().assembler.current);
+    EXPECT_EQ(0u, mono.taker.frame.bufferSize);
+    EXPECT_FALSE(mono.taker.frame.isHeld);
+}
+
+TEST(FWCameraStream, ADisconnectAbandonsAFrameInHand) {
+    const FastWaits fast;
+    StreamedCamera mono(QuietMono);
+    ASSERT_EQ(HALOk, mono.Start());
+    mono.taker.frame.isHeld = true;
+    mono.Context().assembler.current = &mono.taker.frame;
+
+    EXPECT_EQ(HALOk, HAL_CameraDisconnect(mono.camera));
+
+    EXPECT_EQ(nullptr, mono.Context().assembler.current);
+    EXPECT_FALSE(mono.taker.frame.isHeld);
 }
 
 TEST(FWCameraStream, AReleaseWhileStreamingEndsTheLoopAndFreesAll) {
