@@ -168,9 +168,9 @@ HALCamera MakeAdapterCamera(std::uint32_t adapterIndex, std::uint32_t nodeId) {
 HALStatus AdapterCameraConnect(HALCamera* camera, std::uint16_t payloadBytes) {
     AdapterContext* const context = GetAdapterContext(*camera);
     if (context == nullptr) return HALDeviceNotOpen;
+    camera->packetBytes = std::uint32_t{payloadBytes} + 12;
     std::unique_ptr<OpenCameraTable> table(new (std::nothrow) OpenCameraTable);
     if (table != nullptr && table->Contains(context->entry)) return HALDeviceInUse;
-    camera->packetBytes = std::uint32_t{payloadBytes} + 12;
     context->payloadBytes = payloadBytes;
     // Kept: with all entries used the camera is simply not recorded.
     if (table != nullptr) (void)table->Add(context->entry);

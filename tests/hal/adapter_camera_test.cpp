@@ -107,6 +107,7 @@ TEST_F(AdapterCamera, ACameraThatIsOpenElsewhereIs37) {
     EXPECT_EQ(HALDeviceInUse, Connect(&other));
 
     EXPECT_EQ(0, other.connected);
+    EXPECT_EQ(112u, other.packetBytes);
     EXPECT_EQ(1u, OpenCameraTable().CountUsed());
     EXPECT_EQ(HALOk, HAL_CameraRelease(&other));
     EXPECT_TRUE(AnyCameraOpen());
