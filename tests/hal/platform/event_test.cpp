@@ -155,6 +155,17 @@ TEST_F(ManualEvent, ReleasesItsWaitersAlsoWhenItIsClearedAtOnce) {
     EXPECT_EQ(WaitForEvent(event, 0), WaitOutcome::TimedOut);
 }
 
+TEST_F(ManualEvent, GivesNobodyWhoComesAfterItWasClearedTheReleaseOfAnother) {
+    ASSERT_TRUE(StartTwoWaiters());
+
+    EXPECT_TRUE(SignalEvent(event));
+    ClearEvent(event);
+    // The two have been released, and most likely have not run yet.
+    EXPECT_EQ(WaitForEvent(event, 0), WaitOutcome::TimedOut);
+
+    EXPECT_TRUE(WaitUntil([this] { return released.load() == 2; }));
+}
+
 TEST(NullEvent, FailsToBeWaitedForAndSignalled) {
     EXPECT_EQ(WaitForEvent(nullptr, 0), WaitOutcome::Failed);
     EXPECT_FALSE(SignalEvent(nullptr));

@@ -9,7 +9,9 @@
 
 // A signal releases who waits at its moment: clearing the event right after it takes nothing back
 // from them, and two signals in a row release two waiters of an automatic event, however late they
-// run. So a signal is handed to waiters by count, and stays in the event only while nobody waits.
+// run. So a signal of an automatic event is handed to waiters by count, and stays in the event only
+// while nobody waits; one of a manual event releases all who waited before its round, and nobody
+// who comes after it was cleared.
 
 namespace ZV {
 
@@ -22,6 +24,7 @@ struct PlatformEvent {
     bool isSignalled = false;        // guarded by mutex
     std::uint64_t waiterCount = 0;   // guarded by mutex; released ones that have not run yet count
     std::uint64_t releaseCount = 0;  // guarded by mutex; waiters that are to run
+    std::uint64_t round = 0;         // guarded by mutex; signals of a manual event so far
 };
 
 namespace {
@@ -37,8 +40,25 @@ void ReleaseOne(PlatformEvent* event) {
 
 void ReleaseAll(PlatformEvent* event) {
     event->isSignalled = true;
-    event->releaseCount = event->waiterCount;
+    ++event->round;
     event->released.notify_all();
+}
+
+bool WaitForRound(PlatformEvent* event, std::unique_lock<std::mutex>& lock,
+                  std::uint64_t timeoutMs) {
+    const std::uint64_t ownRound = event->round;
+    return WaitForLimit(event->released, lock, timeoutMs,
+                        [event, ownRound] { return event->round != ownRound; });
+}
+
+bool WaitForRelease(PlatformEvent* event, std::unique_lock<std::mutex>& lock,
+                    std::uint64_t timeoutMs) {
+    ++event->waiterCount;
+    const bool isReleased =
+        WaitForLimit(event->released, lock, timeoutMs, [event] { return event->releaseCount > 0; });
+    --event->waiterCount;
+    if (isReleased) --event->releaseCount;
+    return isReleased;
 }
 
 }  // namespace
@@ -80,13 +100,10 @@ WaitOutcome WaitForEvent(PlatformEvent* event, std::uint64_t timeoutMs) {
         if (event->reset == EventReset::Automatic) event->isSignalled = false;
         return WaitOutcome::Signalled;
     }
-    ++event->waiterCount;
-    const bool isReleased =
-        WaitForLimit(event->released, lock, timeoutMs, [event] { return event->releaseCount > 0; });
-    --event->waiterCount;
-    if (!isReleased) return WaitOutcome::TimedOut;
-    --event->releaseCount;
-    return WaitOutcome::Signalled;
+    const bool isReleased = event->reset == EventReset::Manual
+                                ? WaitForRound(event, lock, timeoutMs)
+                                : WaitForRelease(event, lock, timeoutMs);
+    return isReleased ? WaitOutcome::Signalled : WaitOutcome::TimedOut;
 }
 
 bool DestroyEvent(PlatformEvent* event) {
