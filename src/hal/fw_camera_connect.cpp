@@ -45,6 +45,8 @@ HALStatus OpenFreeDevice(FWDeviceContext& context) {
     return HALOk;
 }
 
+// Kept: after a failure what was reserved stays so, and the record stays connected; a disconnect
+// releases it.
 HALStatus Reserve(HALCamera camera, std::uint16_t tagCode) {
     if (const HALStatus status = FWCameraAllocateBandwidth(camera); status != HALOk) return status;
     if (const HALStatus status = FWCameraAllocateChannel(camera); status != HALOk) return status;
@@ -92,6 +94,7 @@ HALStatus FWCameraSetCallbacks(HALCamera camera, const HALStreamCallbacks* callb
 
 HALStatus FWCameraDisconnect(HALCamera* camera) {
     if (camera->connected == 0) return HALOk;
+    // Kept: a reservation that cannot be freed leaves the device open and connected.
     if (const HALStatus status = FreeReservations(*camera); status != HALOk) return status;
     FWDeviceContext& context = *GetFWContext(*camera);
     // The device is closed next, whatever the answer.
@@ -113,7 +116,8 @@ HALStatus FWCameraRelease(HALCamera camera) {
 
 HALStatus FWCameraReallocateBandwidth(HALCamera* camera, std::uint16_t payloadBytes,
                                       std::uint16_t tagCode) {
-    if (camera == nullptr) return HALDeviceNotOpen;
+    if (camera == nullptr || camera->kind != HALKindFWCamera) return HALDeviceNotOpen;
+    // Kept: a failure ends it at once, also with a part of the reservations gone.
     if (const HALStatus status = FreeReservations(*camera); status != HALOk) return status;
     StorePacketSize(camera, *GetFWContext(*camera), payloadBytes);
     return Reserve(*camera, tagCode);
@@ -130,6 +134,7 @@ HALStatus FWCameraAllocateBandwidth(HALCamera camera) {
     }
     context.bandwidthHandle = 0;
     char text[64];
+    // Kept: the number is always this status, not what the system said.
     std::snprintf(text, sizeof text, "Allocating Resources Failed with error %d",
                   static_cast<int>(HALBandwidthNotAllocated));
     WriteDebuggerOutput(text);
@@ -151,6 +156,7 @@ HALStatus FWCameraAllocateChannel(HALCamera camera) {
 HALStatus FWCameraAllocateResources(HALCamera camera, std::uint16_t tagCode) {
     if (GetFWContext(camera) == nullptr) return HALResourcesNotAllocated;
     FWDeviceContext& context = *GetFWContext(camera);
+    // Kept: the bandwidth was asked for at S800 in either case.
     if (RequestResources(context, SpeedFlagS800, tagCode)) return HALOk;
     context.speedFlag = SpeedFlagS400;
     if (context.packetStride > PacketStrideMaxS400) return HALResourcesNotAllocated;

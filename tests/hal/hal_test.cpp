@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "hal/adapter_camera.h"
 #include "hal/fw_camera.h"
 #include "hal/hal_world.h"
 
@@ -98,6 +99,15 @@ TEST(HAL, NoRecordCountsAsNotOpen) {
     EXPECT_EQ(HALDeviceNotOpen, HAL_CameraStartStreaming(nullptr, 0, 1, nullptr));
     EXPECT_EQ(HALDeviceNotOpen, FWCameraReallocateBandwidth(nullptr, 100, 1));
     EXPECT_EQ(HALOk, HAL_CameraRelease(nullptr));
+}
+
+TEST(HAL, AReallocationPastTheDispatchRefusesARecordOfAnotherKind) {
+    HALCamera camera = MakeAdapterCamera(0, 1);
+
+    EXPECT_EQ(HALDeviceNotOpen, FWCameraReallocateBandwidth(&camera, 100, 1));
+
+    EXPECT_EQ(0u, camera.packetBytes);
+    EXPECT_EQ(HALOk, HAL_CameraRelease(&camera));
 }
 
 TEST(HAL, NullOutputsAreNullData) {
