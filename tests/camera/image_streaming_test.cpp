@@ -78,19 +78,21 @@ TEST_F(OneStreamingCamera, WrapsTheParameterSetNumberAfter255) {
     EXPECT_TRUE(AwaitMoreImages(client));
 }
 
-TEST_F(OneStreamingCamera, WritesItsStartInOrder) {
+TEST_F(OneStreamingCamera, WritesItsStartAndStopInOrder) {
     (void)TakeWrites();
 
     ASSERT_EQ(CameraOk, Start());
+    ASSERT_EQ(CameraOk, camera->StopStreamingImages());
 
     const std::vector<RegisterWrite> writes = TakeWrites();
-    ASSERT_EQ(5u, writes.size());
+    ASSERT_EQ(6u, writes.size());
     EXPECT_EQ(ControlAddress + 80, writes[0].address) << "packet size";
     EXPECT_EQ(CommandAddress + 4, writes[1].address) << "take over";
     EXPECT_EQ(ControlAddress + 4, writes[2].address) << "parameter set number";
     EXPECT_EQ(CommandAddress + 4, writes[3].address) << "take over";
     EXPECT_EQ(StreamAddress + 4, writes[4].address) << "stream switch";
     EXPECT_EQ(1u, writes[4].values[0] & 1u);
+    EXPECT_EQ((RegisterWrite{StreamAddress + 4, {0}, 0}), writes[5]) << "switched off last";
 }
 
 TEST_F(OneStreamingCamera, CarriesOnWhenTheParameterSetNumberCannotBeWritten) {
