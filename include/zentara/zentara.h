@@ -49,6 +49,8 @@
  * that read, and, with zcbExposeDone, Zentara_Trigger. It must not call Zentara_CloseCamera or
  * Zentara_ReleaseDriver, which wait for the very thread that the callback runs on, nor, from a call
  * with zcbFrameDone, Zentara_Abort or Zentara_GrabFrame: each of these waits for itself for ever.
+ * Zentara_Abort is no better from a call with zcbExposeDone: it may be made up for on the frame
+ * thread, when the image is there first.
  * A callback of Zentara_QueueSettings that runs inside that call (empty queue) must not call any
  * queue function. A callback should be short: while it runs no further event of its kind is served.
  *
@@ -457,8 +459,8 @@ ZENTARA_API ZentaraResult Zentara_ListCameras(Zentara_CamListItem* items, uint32
  * Opens a camera of the list and starts its two threads. Streaming is off afterwards.
  *
  * 8 not loaded; 2 `handle` null; 11 `cameraId` is not in the list; 11 the camera is open already;
- * a camera's failure (15, 16 or 30). The second 11 stores the handle all the same if this process
- * opened it: the client then has a handle that works and a failure.
+ * a camera's failure (15, 16 or 30). The second 11 stores the handle all the same: the client then
+ * has a failure and a handle, which works if this process opened the camera.
  */
 ZENTARA_API ZentaraResult Zentara_OpenCamera(uint32_t cameraId, ZentaraHandle* handle);
 
@@ -620,7 +622,7 @@ ZENTARA_API ZentaraResult Zentara_Trigger(ZentaraHandle handle);
  * progress. Frames, buffers and blocks are the client's again when it returns. Streaming stays on.
  *
  * 8 not loaded; 9 `handle` null; 9 not open; 9 open in another process. Never call it from a
- * callback with zcbFrameDone: it waits for itself for ever.
+ * callback: from one that runs on the frame thread it waits for itself for ever.
  */
 ZENTARA_API ZentaraResult Zentara_Abort(ZentaraHandle handle);
 
