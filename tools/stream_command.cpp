@@ -301,6 +301,7 @@ ExitCode RunStream(const CommonOptions& common, const StreamOptions& options) {
     }
     Stream stream(camera, facts, options);
     const ExitCode code = stream.Run(&result);
+    camera.Close();  // No callback can come any more, so the stream's buffers may go.
     Report(common, stream.GetSums());
     if (code == ExitFailed) {
         if (result != zerrNone) PrintError("the stream ended: " + DescribeResult(result));
