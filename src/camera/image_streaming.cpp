@@ -1,3 +1,5 @@
+#include <mutex>
+
 #include "camera/morvane_fw_camera.h"
 
 namespace ZV {
@@ -16,6 +18,8 @@ CameraResult MorvaneFWCamera::StartStreamingImages(ImageCallback imageCallback,
                                                    ExposeDoneCallback exposeDoneCallback,
                                                    bool externalBuffers, void* newRefCon) {
     if (streaming.isStreaming) return CameraOk;
+    const std::lock_guard hold(streaming.switchMutex);
+    if (streaming.isStreaming) return CameraOk;  // another start was quicker
     CameraResult result = ReallocateBandwidth(CalculateRequiredPacketSize(true));
     if (result == CameraOk) result = TakeLock(streaming.streamLock);
     if (result != CameraOk) return result;
@@ -42,6 +46,7 @@ CameraResult MorvaneFWCamera::StartUnderStreamLock(const StreamCallbacks& callba
 }
 
 CameraResult MorvaneFWCamera::StopStreamingImages() {
+    const std::lock_guard hold(streaming.switchMutex);
     HALCamera record = GetHALCamera();
     HALStatus status =
         HAL_CameraStopStreaming(&record, registers.stream.GetQuadletAddress(StreamSwitch));

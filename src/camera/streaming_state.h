@@ -85,6 +85,9 @@ struct StreamingState {
     HALSemaphore* frameLock = nullptr;
     HALSemaphore* closeLock = nullptr;
     StreamCallbackSlot callbacks;
+    /// One start or stop at a time, whoever calls: the stream layer takes them only one by one.
+    /// Taken before `streamLock`, never by the bus thread.
+    std::mutex switchMutex;
 };
 
 }  // namespace ZV
