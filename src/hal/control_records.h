@@ -3,13 +3,14 @@
 #include <cstddef>
 #include <cstdint>
 
-/// Records and codes of the kernel driver's control requests. Library, simulation, tests and fuzz targets
-/// all read them here. All fields are little-endian; unset fields are 0.
+/// Records and codes of the kernel driver's control requests. Library, simulation, tests and fuzz
+/// targets all read them here. All fields are little-endian; unset fields are 0.
 namespace ZV {
 
-/// Control code of device type 0x22 from its function, method (0 buffered, 2 direct output) and access
-/// (0 any, 2 write).
-constexpr std::uint32_t MakeControlCode(std::uint32_t function, std::uint32_t method, std::uint32_t access) {
+/// Control code of device type 0x22 from its function, method (0 buffered, 2 direct output) and
+/// access (0 any, 2 write).
+constexpr std::uint32_t MakeControlCode(std::uint32_t function, std::uint32_t method,
+                                        std::uint32_t access) {
     return (0x22u << 16) | (access << 14) | (function << 2) | method;
 }
 
@@ -97,7 +98,7 @@ inline constexpr std::uint32_t SpeedFlagS800 = 8;
 struct AllocateBandwidthRecord {
     std::uint32_t maximumBytesPerFrame;
     std::uint32_t speed;
-    std::uint64_t bandwidthHandle;        ///< Out.
+    std::uint64_t bandwidthHandle;         ///< Out.
     std::uint32_t bytesPerFrameAvailable;  ///< Out.
     std::uint32_t speedSelected;           ///< Out.
 };
@@ -135,9 +136,11 @@ struct StreamSwitchRecord {
 };
 static_assert(sizeof(StreamSwitchRecord) == 16);
 
-inline constexpr std::size_t HandleRecordBytes = 8;   ///< Free bandwidth, free resources, detach buffers.
+inline constexpr std::size_t HandleRecordBytes =
+    8;  ///< Free bandwidth, free resources, detach buffers.
 inline constexpr std::size_t ChannelRecordBytes = 4;  ///< Free channel.
-inline constexpr std::size_t PlainRecordBytes = 4;    ///< Enter, leave, notify enable and disable, busy.
+inline constexpr std::size_t PlainRecordBytes =
+    4;  ///< Enter, leave, notify enable and disable, busy.
 inline constexpr std::size_t NotifyRecordBytes = 2056;
 
 /// Answer of FW_IOCTL_QUERY_BUSY for a device that is held by another open handle.

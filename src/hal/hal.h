@@ -6,8 +6,8 @@
 
 #include "zentara/zentara.h"
 
-/// The flat seam between the camera classes and everything that touches the operating system: the 1394
-/// device, threads, locks and events. Exported under exactly these names.
+/// The flat seam between the camera classes and everything that touches the operating system: the
+/// 1394 device, threads, locks and events. Exported under exactly these names.
 namespace ZV {
 
 struct tStFrameInfo;
@@ -24,7 +24,8 @@ inline constexpr HALStatus HALThreadNotTerminated = 23;
 inline constexpr HALStatus HALBandwidthNotAllocated = 24;
 inline constexpr HALStatus HALBandwidthNotFreed = 25;
 inline constexpr HALStatus HALChannelNotAllocated = 26;
-inline constexpr HALStatus HALChannelNotFreed = 27;  ///< Also: the in-use query of a connect failed.
+inline constexpr HALStatus HALChannelNotFreed =
+    27;  ///< Also: the in-use query of a connect failed.
 inline constexpr HALStatus HALResourcesNotAllocated = 28;
 inline constexpr HALStatus HALResourcesNotFreed = 29;  ///< Also: buffers could not be detached.
 inline constexpr HALStatus HALAdapterThreadNotStarted = 30;
@@ -41,12 +42,13 @@ inline constexpr HALStatus HALListingFailed = 998;
 inline constexpr std::uint32_t HALKindFWCamera = 0;
 inline constexpr std::uint32_t HALKindAdapter = 1;
 
-/// The handle of one device, 32 bytes, copied by value. Any `kind` but the two makes every bus operation a
-/// no-op that returns 0.
+/// The handle of one device, 32 bytes, copied by value. Any `kind` but the two makes every bus
+/// operation a no-op that returns 0.
 struct HALCamera {
     std::uint32_t index;  ///< Position in the enumeration, from 0.
     std::uint32_t kind;
-    std::uint8_t connected;  ///< 1 while the record owns an open device, or another user held it when listed.
+    std::uint8_t connected;  ///< 1 while the record owns an open device, or another user held it
+                             ///< when listed.
     std::uint8_t padding9[3];
     std::uint32_t cameraWord;   ///< Identity quadlet; the model id in its upper 16 bits.
     std::uint32_t packetBytes;  ///< Payload last passed to connect or reallocate, plus 12.
@@ -70,15 +72,15 @@ extern "C" {
 // Lifetime and list.
 ZENTARA_API HALStatus HAL_Open(void);
 ZENTARA_API HALStatus HAL_Close(void);
-/// Lists at most `maxCameras` devices and reads the identity quadlet of each free one. The list is a new
-/// block for HAL_MemoryFree. 17 on any failure, list and count untouched.
+/// Lists at most `maxCameras` devices and reads the identity quadlet of each free one. The list is
+/// a new block for HAL_MemoryFree. 17 on any failure, list and count untouched.
 ZENTARA_API HALStatus HAL_CameraGetList(HALCamera** list, std::uint32_t primaryIdAddress,
                                         std::uint32_t secondaryIdAddress, std::uint32_t maxCameras,
                                         std::uint32_t* count);
 ZENTARA_API HALStatus HAL_MemoryFree(void* memory);
 ZENTARA_API HALStatus HAL_AdapterOpen(std::uint32_t, void*);
-/// Text of the calling thread's last platform error; `status` plays no part. The text stays good until the
-/// thread's next call.
+/// Text of the calling thread's last platform error; `status` plays no part. The text stays good
+/// until the thread's next call.
 ZENTARA_API const char* HAL_ErrorMessage(HALStatus status);
 
 // Connection.
@@ -99,8 +101,8 @@ ZENTARA_API HALStatus HAL_CameraRegisterAsyncWriteCallback(HALCamera* camera, st
                                                            HALAsyncWriteCallback callback);
 
 // Register access; data are host-order quadlets.
-ZENTARA_API HALStatus HAL_CameraReadData(HALCamera* camera, std::uint32_t address, std::uint32_t* data,
-                                         std::uint32_t quadlets);
+ZENTARA_API HALStatus HAL_CameraReadData(HALCamera* camera, std::uint32_t address,
+                                         std::uint32_t* data, std::uint32_t quadlets);
 ZENTARA_API HALStatus HAL_CameraWriteData(HALCamera* camera, std::uint32_t address,
                                           const std::uint32_t* data, std::uint32_t quadlets);
 ZENTARA_API HALStatus HAL_CameraSetShouldOutputReads(std::uint32_t, std::uint8_t on);
@@ -128,7 +130,8 @@ ZENTARA_API HALStatus HAL_SemaphoreDestroy(HALSemaphore** semaphore);
 ZENTARA_API HALStatus HAL_ConditionCreate(HALCondition** condition);
 ZENTARA_API HALStatus HAL_ConditionWait(HALCondition* condition);
 /// Waits `timeoutMicroseconds` / 1000 milliseconds: below 1000 it polls.
-ZENTARA_API HALStatus HAL_ConditionTimedWait(HALCondition* condition, std::uint64_t timeoutMicroseconds);
+ZENTARA_API HALStatus HAL_ConditionTimedWait(HALCondition* condition,
+                                             std::uint64_t timeoutMicroseconds);
 ZENTARA_API HALStatus HAL_ConditionReset(HALCondition* condition);
 ZENTARA_API HALStatus HAL_ConditionSignal(HALCondition* condition);
 ZENTARA_API HALStatus HAL_ConditionDestroy(HALCondition** condition);
@@ -139,8 +142,8 @@ ZENTARA_API HALStatus FWCameraReallocateBandwidth(HALCamera* camera, std::uint16
 
 }  // extern "C"
 
-/// Ends a HAL thread's wait record check: true when HAL_ThreadCreate could start its thread. A thread that
-/// could not be made counts as ended.
+/// Ends a HAL thread's wait record check: true when HAL_ThreadCreate could start its thread. A
+/// thread that could not be made counts as ended.
 bool IsHALThreadStarted(const HALThread* thread);
 
 /// What a waiter for frames has seen: it goes on at once when `count` no longer holds `seen`.
@@ -153,7 +156,8 @@ struct FrameArrivals {
 /// signal is heard, also between two waits.
 HALStatus WaitForFrameArrival(HALCamera* camera, const FrameArrivals& arrivals);
 
-/// `halOutputWrites` and `halOutputReads`: traces are printed only while the switch holds exactly 1.
+/// `halOutputWrites` and `halOutputReads`: traces are printed only while the switch holds
+/// exactly 1.
 std::uint8_t GetHalOutputReads();
 std::uint8_t GetHalOutputWrites();
 

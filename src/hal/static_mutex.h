@@ -4,8 +4,8 @@
 
 namespace ZV {
 
-/// Leaf mutex for state of the process: needs no constructor at load and no destructor at the end on
-/// any platform, so that a process may end at any moment. Lockable by std::lock_guard; not
+/// Leaf mutex for state of the process: needs no constructor at load and no destructor at the end
+/// on any platform, so that a process may end at any moment. Lockable by std::lock_guard; not
 /// recursive. Waiters sleep.
 class StaticMutex {
   public:

@@ -46,7 +46,8 @@ TEST_F(Handles, TheListingAfterAnOpenCameraKeepsItsHandle) {
     EXPECT_NE(nullptr, FindCamera(handle));
     ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
     ListCameras();
-    EXPECT_EQ(nullptr, FindCamera(handle));
+    // The address may be that of a new camera by now, which nobody has opened.
+    EXPECT_FALSE(IsOpen(FindCamera(handle)));
 }
 
 }  // namespace

@@ -2,6 +2,7 @@
 
 #include "imaging/ex_image.h"
 #include "imaging/image_pipeline.h"
+#include "support/wait_until.h"
 
 namespace ZV::Test {
 
@@ -35,7 +36,7 @@ std::vector<RegisterWrite> CameraWorld::TakeWrites() {
 void* TestClient::ReceiveImage(ZImageReceivedCallbackStruct* record) {
     auto& client = *static_cast<TestClient*>(record->refCon);
     client.isInCallback = true;
-    while (client.isBlocked) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    (void)WaitUntil([&] { return !client.isBlocked; }, std::chrono::minutes(5));
     {
         const std::lock_guard hold(client.mutex);
         const ZExImage* image = record->image;
