@@ -4,6 +4,7 @@
 
 #include "api/entry_queue.h"
 #include "api/handles.h"
+#include "camera/morvane_fw_camera.h"
 
 namespace ZV {
 
@@ -23,6 +24,11 @@ bool Holds(const std::vector<ZCamera*>& cameras, const ZCamera* camera) {
 void FreeCameras(std::vector<ZCamera*>& cameras) {
     for (ZCamera* camera : cameras) UnregisterCamera(camera);
     (void)ZCamera::FreeCameraList(cameras);
+}
+
+/// Every camera of the list is of this class.
+bool HasLivingThreads(const ZCamera& camera) {
+    return static_cast<const MorvaneFWCamera&>(camera).HasLivingThreads();
 }
 
 }  // namespace
@@ -54,8 +60,10 @@ void CameraStore::DetachContext(ZCamera& camera) {
     CameraContext* const context = GetCameraContext(camera);
     camera.SetRefCon(nullptr);
     if (context != nullptr) ClearQueue(*context);
-    // A close that failed leaves the camera open and its threads running on the context.
-    if (!camera.IsCameraOpen()) FreeContextsOf(camera);
+    // A close that failed leaves the camera open and its threads running on the context; one that
+    // succeeded may leave an exposure callback that lasts.
+    if (camera.IsCameraOpen() || HasLivingThreads(camera)) return;
+    FreeContextsOf(camera);
 }
 
 void CameraStore::FreeAll() {

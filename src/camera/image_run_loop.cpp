@@ -105,6 +105,10 @@ bool MorvaneFWCamera::IsFrameValid(tStFrameInfo* frame) {
     if (frame == nullptr || !frame->valid) return false;
     // A frame made under another size is dropped without a word to the client.
     if (frame->bufferSize != CalculateFrameBytes()) return false;
+    // One whose record was made while a setting changed does not describe its own buffer.
+    const std::uint64_t bytesPerPixel = (frame->bitDepth + 7) / 8;
+    const std::uint64_t pixels = std::uint64_t{frame->width} * frame->height;
+    if (frame->bufferSize != pixels * bytesPerPixel) return false;
     return frame->frameStatus != FrameRefused || GetTriggerMode() != 0;
 }
 

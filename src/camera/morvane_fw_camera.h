@@ -351,6 +351,13 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void PrivateImageStreamingRunLoop();
     void PrivateRunExposeDoneCB();
 
+    /// True while one of the camera's two threads lives: a close does not wait for ever for an
+    /// exposure callback that lasts.
+    bool HasLivingThreads() const {
+        return streaming.runLoopsAlive.load(std::memory_order_acquire) != 0 ||
+               streaming.exposeThreadsAlive.load(std::memory_order_acquire) != 0;
+    }
+
     /// Ends what a close has left: wakes and joins the threads, lets the device go without a
     /// request. To be called before the object is deleted; waits for a client's callback to return.
     void EndWhatCloseLeft();
