@@ -36,6 +36,10 @@ class ReadyCamera : public CameraWorld, public testing::Test {
         ASSERT_EQ(CameraOk, camera->Ready());
         (void)TakeWrites();
     }
+    // The client goes before the camera: no thread may still call it then.
+    void TearDown() override {
+        if (camera != nullptr) (void)camera->CloseCamera();
+    }
     /// Writes to the control block as quadlet and value; others fail the test.
     ControlWrites TakeControlWrites() {
         ControlWrites writes;
