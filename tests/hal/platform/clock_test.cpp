@@ -3,11 +3,15 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <cstdlib>
 
 #include "hal/platform/wait_outcome.h"
+#include "support/scoped_variable.h"
 
 namespace ZV {
 namespace {
+
+using Test::ScopedVariable;
 
 class WaitClock : public testing::Test {
   protected:
@@ -51,6 +55,15 @@ TEST_F(WaitClock, HoldsLimitsBeyond32Bits) {
 
     EXPECT_EQ(GetRealWaitMs(50'000'000'000), 5'000'000'000u);
     EXPECT_EQ(GetRealWaitMs(WaitForEver - 1), (WaitForEver - 1) / 10 + 1);
+}
+
+TEST(WaitClockDeathTest, TakesItsDivisorFromItsVariableInANewProcess) {
+    testing::FLAGS_gtest_death_test_style = "threadsafe";
+    const ScopedVariable variable("ZENTARA_WAIT_DIVISOR", "1000");
+
+    EXPECT_EXIT(std::_Exit(static_cast<int>(GetRealWaitMs(5000))), testing::ExitedWithCode(5), "");
+    variable.Set("none");
+    EXPECT_EXIT(std::_Exit(static_cast<int>(GetRealWaitMs(100))), testing::ExitedWithCode(100), "");
 }
 
 TEST(MonotonicClock, NeverGoesBack) {
