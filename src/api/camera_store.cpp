@@ -60,10 +60,11 @@ void CameraStore::DetachContext(ZCamera& camera) {
     CameraContext* const context = GetCameraContext(camera);
     camera.SetRefCon(nullptr);
     if (context != nullptr) ClearQueue(*context);
-    // A close that failed leaves the camera open and its threads running on the context; one that
-    // succeeded may leave an exposure callback that lasts.
-    if (camera.IsCameraOpen() || HasLivingThreads(camera)) return;
-    FreeContextsOf(camera);
+    // A close that failed leaves the camera open and its threads running on the context.
+    if (camera.IsCameraOpen()) return;
+    TakeOutContextsOf(camera);
+    // One that succeeded may leave an exposure callback that lasts.
+    if (!HasLivingThreads(camera)) FreeContextsOf(camera);
 }
 
 void CameraStore::FreeAll() {
@@ -90,10 +91,15 @@ void CameraStore::RetireList() {
     retiredCameras.insert(retiredCameras.end(), cameraList.begin(), cameraList.end());
 }
 
-void CameraStore::FreeContextsOf(ZCamera& camera) {
+// The pipeline's only user, the run loop, has ended. A wheel that stayed in it would meet the next
+// one.
+void CameraStore::TakeOutContextsOf(ZCamera& camera) {
     for (const OwnedContext& owned : contexts) {
         if (owned.camera == &camera) DetachCameraContext(camera, *owned.context);
     }
+}
+
+void CameraStore::FreeContextsOf(const ZCamera& camera) {
     std::erase_if(contexts, [&](const OwnedContext& owned) { return owned.camera == &camera; });
 }
 

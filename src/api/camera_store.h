@@ -45,7 +45,8 @@ class CameraStore {
     void UnregisterClosedCameras();
     void FreeUnusedRetiredCameras();
     void RetireList();
-    void FreeContextsOf(ZCamera& camera);
+    void TakeOutContextsOf(ZCamera& camera);
+    void FreeContextsOf(const ZCamera& camera);
     void FreeContextsWithoutCamera();
 
     std::vector<ZCamera*> cameraList;

@@ -2,11 +2,13 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <cstring>
 #include <thread>
 
 #include "api/handles.h"
 #include "api/settings_block.h"
+#include "hal/platform/clock.h"
 #include "support/flat_camera.h"
 
 namespace ZV {
@@ -14,6 +16,8 @@ namespace {
 
 class Context : public Test::OpenedCamera {
   protected:
+    explicit Context(std::string_view scenario = ZV::Test::SmallMono) : OpenedCamera(scenario) {}
+
     ZCamera& GetCamera() { return *FindCamera(handle); }
     CameraContext& GetContext() { return *GetCameraContext(GetCamera()); }
 };
@@ -61,6 +65,50 @@ TEST_F(Context, PostProcessingRunsRatioThenBayerThenWhiteBalance) {
     EXPECT_TRUE(context.postPipeline->RemoveFilter(context.bayerFilter));
     EXPECT_TRUE(context.postPipeline->RemoveFilter(context.whiteBalance.get()));
     EXPECT_FALSE(context.postPipeline->RemoveFilter(context.rgbWheel.get()));
+}
+
+/// An exposure callback that stays inside until the test lets it go.
+struct LastingCallback {
+    std::atomic<bool> isInside{false};
+    std::atomic<bool> mayLeave{false};
+
+    static void Stay(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t) {
+        auto& self = *reinterpret_cast<LastingCallback*>(static_cast<std::uintptr_t>(userPrivate));
+        self.isInside = true;
+        EXPECT_TRUE(ZV::Test::WaitUntil([&] { return self.mayLeave.load(); }));
+    }
+};
+
+/// One frame comes for each trigger, and never ends: its exposure is told by the exposure thread
+/// alone.
+class EndlessFrame : public Context {
+  protected:
+    EndlessFrame()
+        : Context(R"({"base": "mono", "cameras": [{"faults":
+              [{"kind": "losePacket", "packet": 1, "count": 0}]}]})") {}
+};
+
+TEST_F(EndlessFrame, AnExposureCallbackThatOutlastsTheCloseLeavesNoWheelInThePipeline) {
+    LastingCallback callback;
+    ZV::Test::ClientFrame frame(GetImageBytes());
+    ZCamera& camera = GetCamera();
+    ZRGBFilterWheel* const wheel = GetContext().rgbWheel.get();
+    ASSERT_ZERR(zerrNone,
+                Zentara_QueueFrame(handle, frame.Get(), LastingCallback::Stay, zcbExposeDone,
+                                   reinterpret_cast<std::uintptr_t>(&callback), 0));
+    ASSERT_EQ(CameraOk, camera.SetTriggerMode(ztrigSoftware));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_ZERR(zerrNone, Zentara_Trigger(handle));
+    ASSERT_TRUE(ZV::Test::WaitUntil([&] { return callback.isInside.load(); }));
+
+    SetWaitClockDivisor(1000);
+    EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    SetWaitClockDivisor(1);
+
+    EXPECT_FALSE(camera.GetImagePipeline()->RemoveFilter(wheel));
+    callback.mayLeave = true;
+    Zentara_ReleaseDriver();
+    EXPECT_ZERR(zerrNone, Zentara_LoadDriver());
 }
 
 TEST_F(Context, LastSettingsAreExchangedWhole) {
