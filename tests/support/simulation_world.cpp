@@ -110,6 +110,24 @@ const KernelDriver& GetKernelDriver() {
     return *ZentaraSimulation_GetKernelDriver(KernelDriverVersion);
 }
 
+/// The records whose line contains `part`. A stream goes on writing: what stands in the file at the
+/// call is read, so that a reader never runs after the writer.
+std::vector<TraceRecord> ReadRecords(const std::filesystem::path& path, std::string_view part) {
+    std::error_code failure;
+    const std::uintmax_t bytes = std::filesystem::file_size(path, failure);
+    std::vector<TraceRecord> records;
+    std::ifstream file(path);
+    std::uintmax_t read = 0;
+    for (std::string line; !failure && read < bytes && std::getline(file, line);) {
+        read += line.size() + 1;
+        if (line.find(part) == std::string::npos) continue;
+        const Json parsed = Json::parse(line, nullptr, false);
+        // The last line may be half written.
+        if (parsed.is_object()) records.push_back(ParseRecord(parsed));
+    }
+    return records;
+}
+
 }  // namespace
 
 std::uint64_t CalculateChecksum(const void* bytes, std::size_t count) {
@@ -144,14 +162,7 @@ void SimulationWorld::End() {
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadTrace() const {
-    std::vector<TraceRecord> records;
-    std::ifstream file(folder / TraceFile);
-    for (std::string line; std::getline(file, line);) {
-        const Json parsed = Json::parse(line, nullptr, false);
-        // The last line may be half written.
-        if (parsed.is_object()) records.push_back(ParseRecord(parsed));
-    }
-    return records;
+    return ReadRecords(folder / TraceFile, "");
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadTrace(std::string_view type,
@@ -173,8 +184,9 @@ std::vector<TraceRecord> SimulationWorld::ReadFrames(std::uint32_t camera) const
 
 std::vector<RegisterWrite> SimulationWorld::ReadRegisterWrites(std::uint32_t camera) const {
     std::vector<RegisterWrite> writes;
-    for (const TraceRecord& record : ReadRequests(camera)) {
-        if (record.code == FW_IOCTL_ASYNC_WRITE) writes.push_back(ParseWrite(record));
+    for (const TraceRecord& record : ReadRecords(folder / TraceFile, "FW_IOCTL_ASYNC_WRITE")) {
+        if (record.type == "request" && record.camera == camera)
+            writes.push_back(ParseWrite(record));
     }
     return writes;
 }
