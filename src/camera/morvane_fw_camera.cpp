@@ -82,7 +82,7 @@ void MorvaneFWCamera::DestroySynchronisation() {
 
 void MorvaneFWCamera::FreeFrames() {
     while (tStFrameInfo* frame = streaming.frameQueue.TakeAny()) DiscardFrame(frame);
-    FreeImage(streaming.oneImage.exchange(nullptr));
+    FreeImage(streaming.oneImage);
 }
 
 void MorvaneFWCamera::EndWhatCloseLeft() {

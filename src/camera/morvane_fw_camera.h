@@ -471,6 +471,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void ServeExposeDone();
     void RunShielded(void (MorvaneFWCamera::*step)());
 
+    HALStatus ForgetOneImage();
+    ZExImage* ClaimOneImage();
     CameraResult AwaitOneImage();
     std::uint64_t CalculateOneImageWait();
     static void* TakeOneImage(ZImageReceivedCallbackStruct* record);

@@ -1,4 +1,6 @@
 #include <cstdio>
+#include <mutex>
+#include <utility>
 
 #include "camera/morvane_fw_camera.h"
 
@@ -11,11 +13,9 @@ constexpr std::uint64_t WaitBase = 5000000000;
 }  // namespace
 
 CameraResult MorvaneFWCamera::GetOneImage(ZExImage** image) {
-    FreeImage(streaming.oneImage.exchange(nullptr));  // one that came too late for its call
     const bool wasStreaming = streaming.isStreaming;
-    const HALStatus status = HAL_ConditionReset(streaming.oneImageCondition);
+    const HALStatus status = ForgetOneImage();
     if (status != HALOk) return ReportHalStatus(status);
-    streaming.oneImageReady = false;
 
     StreamCallbacks former;
     auto* const self = static_cast<ZCamera*>(this);
@@ -35,8 +35,22 @@ CameraResult MorvaneFWCamera::GetOneImage(ZExImage** image) {
         result = StopStreamingImages();
         if (result != CameraOk) return result;
     }
-    *image = streaming.oneImageReady ? streaming.oneImage.exchange(nullptr) : nullptr;
+    *image = ClaimOneImage();
     return *image != nullptr ? CameraOk : CameraNoImage;
+}
+
+/// Drops the image and the signal that came too late for their call. One step under the mutex, as
+/// in the callback: a run loop late with the former call's image must not leave half of it.
+HALStatus MorvaneFWCamera::ForgetOneImage() {
+    const std::lock_guard hold(streaming.oneImageMutex);
+    FreeImage(std::exchange(streaming.oneImage, nullptr));
+    streaming.oneImageReady = false;
+    return HAL_ConditionReset(streaming.oneImageCondition);
+}
+
+ZExImage* MorvaneFWCamera::ClaimOneImage() {
+    const std::lock_guard hold(streaming.oneImageMutex);
+    return streaming.oneImageReady ? std::exchange(streaming.oneImage, nullptr) : nullptr;
 }
 
 CameraResult MorvaneFWCamera::AwaitOneImage() {
@@ -59,11 +73,8 @@ std::uint64_t MorvaneFWCamera::CalculateOneImageWait() {
 void* MorvaneFWCamera::TakeOneImage(ZImageReceivedCallbackStruct* record) {
     auto& camera = static_cast<MorvaneFWCamera&>(*static_cast<ZCamera*>(record->refCon));
     StreamingState& streaming = camera.streaming;
-    if (streaming.oneImageReady) {
-        FreeImage(streaming.oneImage.exchange(nullptr));
-        streaming.oneImageReady = false;
-    }
-    FreeImage(streaming.oneImage.exchange(record->image));
+    const std::lock_guard hold(streaming.oneImageMutex);
+    FreeImage(std::exchange(streaming.oneImage, record->image));
     streaming.oneImageReady = true;
     const HALStatus status = HAL_ConditionSignal(streaming.oneImageCondition);
     if (status != HALOk) {

@@ -58,9 +58,11 @@ struct StreamingState {
     HALCondition* spareCondition = nullptr;       ///< Waited on by nobody.
     HALCondition* oneImageCondition = nullptr;    ///< GetOneImage waits here.
     HALCondition* exposeDoneCondition = nullptr;  ///< The expose thread waits here.
-    HALCondition* pauseCondition = nullptr;    ///< Never signalled: the pauses of a polling wait.
-    std::atomic<ZExImage*> oneImage{nullptr};  ///< Owned until GetOneImage hands it out.
-    Relaxed<bool> oneImageReady{false};
+    HALCondition* pauseCondition = nullptr;  ///< Never signalled: the pauses of a polling wait.
+    /// Leaf: image, flag and signal of GetOneImage change in one step.
+    std::mutex oneImageMutex;
+    ZExImage* oneImage = nullptr;  ///< Owned until GetOneImage hands it out.
+    bool oneImageReady = false;
     Relaxed<bool> isStreaming{false};
     Relaxed<bool> runLoopActive{false};     ///< Keeps the run loop alive.
     Relaxed<bool> exposeDoneActive{false};  ///< Keeps the expose thread alive.
