@@ -99,8 +99,13 @@ void Camera::Close() {
 }
 
 std::optional<std::uint32_t> Camera::GetInfo(std::uint32_t key) const {
+    // Success may leave the word untouched (the sensor kind of a sensor of neither kind): what
+    // keeps two different words as they were is no answer.
     std::uint32_t value = 0;
     if (Zentara_GetInfo(handle, key, &value) != zerrNone) return std::nullopt;
+    if (value != 0) return value;
+    std::uint32_t other = 1;
+    if (Zentara_GetInfo(handle, key, &other) != zerrNone || other != 0) return std::nullopt;
     return value;
 }
 

@@ -45,6 +45,7 @@ class Camera {
     void Close();
 
     [[nodiscard]] ZentaraHandle GetHandle() const { return handle; }
+    /// Nothing when the library refuses the key or succeeds without an answer.
     [[nodiscard]] std::optional<std::uint32_t> GetInfo(std::uint32_t key) const;
     [[nodiscard]] std::string GetModelName() const;
     [[nodiscard]] std::string GetSerialNumber() const;

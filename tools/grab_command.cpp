@@ -74,7 +74,7 @@ void Report(const CommonOptions& common, const GrabOptions& options, const Image
                                     {"frameNumber", image.frameNumber},
                                     {"frameError", image.frameError},
                                     {"model", image.model}};
-        Print(report.dump(2) + "\n");
+        PrintJson(report);
         return;
     }
     Print(fmt::format("{}: {} x {}, {} bits, {:g} s, {}\n", options.output, image.width,

@@ -1,5 +1,7 @@
 #include "image_file.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <array>
 #include <cctype>
@@ -7,6 +9,7 @@
 #include <cstdio>
 #include <cstring>
 #include <filesystem>
+#include <random>
 #include <string_view>
 #include <system_error>
 
@@ -37,6 +40,34 @@ const KindRow* FindKind(const std::string& path) {
     return row == Kinds.end() ? nullptr : row;
 }
 
+/// A new folder beside the place of a file, removed with what is in it. Only a folder is made
+/// exclusively and then written to by name, as the libraries of the formats want it.
+class UnfinishedFolder {
+  public:
+    explicit UnfinishedFolder(const std::filesystem::path& parent) {
+        std::random_device random;
+        do {
+            path = parent / fmt::format(".zentara-{:08x}", random());
+        } while (!std::filesystem::create_directory(path, failure) && IsTaken());
+    }
+    ~UnfinishedFolder() {
+        std::error_code ignored;
+        if (!failure) std::filesystem::remove_all(path, ignored);
+    }
+    UnfinishedFolder(const UnfinishedFolder&) = delete;
+    UnfinishedFolder& operator=(const UnfinishedFolder&) = delete;
+
+    [[nodiscard]] const std::error_code& GetFailure() const { return failure; }
+    [[nodiscard]] std::string GetPath(const char* name) const { return (path / name).string(); }
+
+  private:
+    /// A folder of the name is no failure to the standard library, a file of the name is one.
+    [[nodiscard]] bool IsTaken() const { return !failure || failure == std::errc::file_exists; }
+
+    std::filesystem::path path;
+    std::error_code failure;
+};
+
 }  // namespace
 
 ImageKind GetImageKind(const std::string& path) {
@@ -48,17 +79,14 @@ std::string WriteImage(const std::string& path, const Image& image) {
     const KindRow* row = FindKind(path);
     if (row == nullptr) return "the ending of the name is none of .fits, .tiff, .png, .raw";
     // The finished file takes its name in one step, so that nobody ever sees half of it.
-    const std::string unfinished = path + ".part";
-    std::error_code ignored;
-    std::filesystem::remove(unfinished, ignored);
+    const UnfinishedFolder folder(std::filesystem::path(path).parent_path());
+    if (folder.GetFailure()) return folder.GetFailure().message();
+    const std::string unfinished = folder.GetPath("image");
     std::string reason = row->write(unfinished, image);
-    if (reason.empty()) {
-        std::error_code renamed;
-        std::filesystem::rename(unfinished, path, renamed);
-        if (renamed) reason = renamed.message();
-    }
-    if (!reason.empty()) std::filesystem::remove(unfinished, ignored);
-    return reason;
+    if (!reason.empty()) return reason;
+    std::error_code renamed;
+    std::filesystem::rename(unfinished, path, renamed);
+    return renamed ? renamed.message() : std::string{};
 }
 
 std::string DescribeFileFailure() {

@@ -85,7 +85,7 @@ ExitCode RunInfo(const CommonOptions& common) {
     const ExitCode opened = OpenListedCamera(driver, common.camera, &camera, &uniqueId);
     if (opened != ExitDone) return opened;
     if (common.asJson) {
-        Print(GetInfoAsJson(camera).dump(2) + "\n");
+        PrintJson(GetInfoAsJson(camera));
     } else {
         PrintInfo(camera);
     }

@@ -75,7 +75,7 @@ ExitCode RunList(const CommonOptions& common) {
     if (common.asJson) {
         nlohmann::json list = nlohmann::json::array();
         for (const ListedCamera& camera : cameras) list.push_back(ToJson(camera));
-        Print(nlohmann::json{{"cameras", list}}.dump(2) + "\n");
+        PrintJson(nlohmann::json{{"cameras", list}});
     } else {
         PrintTable(cameras);
     }

@@ -1,5 +1,7 @@
 #include "output.h"
 
+#include <nlohmann/json.hpp>
+
 namespace ZentaraProgram {
 namespace {
 
@@ -13,6 +15,10 @@ void SetOutput(std::FILE* stream) {
 
 void Print(const std::string& text) {
     (void)std::fputs(text.c_str(), output);  // A failure stays in the stream; FlushOutput tells.
+}
+
+void PrintJson(const nlohmann::json& value) {
+    Print(value.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
 }
 
 void PrintError(const std::string& text) {

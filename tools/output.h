@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdio>
+#include <nlohmann/json_fwd.hpp>
 #include <string>
 
 namespace ZentaraProgram {
@@ -8,6 +9,8 @@ namespace ZentaraProgram {
 /// The program's own standard output: results only. Messages go to standard error.
 void SetOutput(std::FILE* stream);
 void Print(const std::string& text);
+/// A serial number or a file name need not be UTF-8: bytes that are not become U+FFFD.
+void PrintJson(const nlohmann::json& value);
 void PrintError(const std::string& text);
 
 /// False when something that was printed could not be written (a full disk, a closed pipe).

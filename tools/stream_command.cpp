@@ -260,7 +260,7 @@ void Report(const CommonOptions& common, const StreamSums& sums) {
                                     {"drops", sums.drops},
                                     {"damaged", sums.damaged},
                                     {"files", sums.files}};
-        Print(report.dump(2) + "\n");
+        PrintJson(report);
         return;
     }
     Print(fmt::format(

@@ -162,6 +162,57 @@ TEST(Program, InfoTellsModelAndSensor) {
     EXPECT_TRUE(info["intensifierModel"].is_null());
 }
 
+TEST(Program, InfoHasNoSensorKindForASensorThatIsNeitherMonoNorBayer) {
+    // The colour kind stands in bits 8 to 11 of configuration quadlet 17.
+    const TemporaryFolder folder;
+    const std::string scenario = folder.GetPath("kind.json");
+    WriteFile(scenario, R"({"base": "mono", "cameras": [{"configuration": {"17": 1280}}]})");
+
+    const ProgramResult asJson = RunProgram({"info", "0", "--simulation", scenario, "--json"});
+    const ProgramResult asText = RunProgram({"info", "0", "--simulation", scenario});
+
+    EXPECT_EQ(0, asJson.exitCode) << asJson.errors;
+    EXPECT_TRUE(json::parse(asJson.output)["ccdType"].is_null());
+    EXPECT_THAT(asText.output, testing::ContainsRegex("Sensor kind [(]0 mono, 1 Bayer[)] +-\n"));
+}
+
+TEST(Program, InfoTellsTheSensorKindsThatAre0And1) {
+    for (const auto& [scenario, kind] : {std::pair{"mono", 0}, {"colour", 1}}) {
+        const ProgramResult result = RunProgram({"info", "0", "--simulation", scenario, "--json"});
+
+        EXPECT_EQ(kind, json::parse(result.output)["ccdType"]) << scenario;
+    }
+}
+
+TEST(Program, ASerialNumberThatIsNotUtf8IsPrintedWithReplacementsInJson) {
+    // The serial number begins at configuration quadlet 18: "A", a byte that is no UTF-8, "B".
+    const TemporaryFolder folder;
+    const std::string scenario = folder.GetPath("serial.json");
+    WriteFile(scenario, R"({"base": "mono",
+        "cameras": [{"configuration": {"18": 1107247616, "19": 0}}]})");
+    const std::string expected =
+        "A\xEF\xBF\xBD"
+        "B";
+
+    const ProgramResult list = RunProgram({"list", "--simulation", scenario, "--json"});
+    const ProgramResult info = RunProgram({"info", "0", "--simulation", scenario, "--json"});
+
+    ASSERT_EQ(0, list.exitCode) << list.errors;
+    EXPECT_EQ(expected, json::parse(list.output)["cameras"][0]["serialNumber"]);
+    ASSERT_EQ(0, info.exitCode) << info.errors;
+    EXPECT_EQ(expected, json::parse(info.output)["serialNumber"]);
+}
+
+TEST(Program, AFileNameThatIsNotUtf8IsPrintedWithReplacementsInJson) {
+    const TemporaryFolder folder;
+
+    const ProgramResult result = RunProgram(
+        {"grab", "0", "--simulation", "mono", "--json", "-o", folder.GetPath("a\xFF.raw")});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    EXPECT_EQ(folder.GetPath("a\xEF\xBF\xBD.raw"), json::parse(result.output)["file"]);
+}
+
 TEST(Program, ARefusedScenarioEndsWithCode2AndNamesThePlace) {
     const TemporaryFolder folder;
     WriteFile(folder.GetPath("bad.json"), R"({"base": "mono", "cameras": [{"colour": 1}]})");
@@ -309,6 +360,24 @@ TEST(Program, AnOlderFileStaysWhenANewOneCannotBeWritten) {
     EXPECT_EQ("older", ReadFile(path));
 }
 
+TEST(Program, FilesWithNamesLikeThatOfTheImageAreLeftAlone) {
+    const TemporaryFolder folder;
+    for (const char* ending : {"fits", "tiff", "png", "raw"}) {
+        const std::string path = folder.GetPath("image.") + ending;
+        for (const char* tail : {".part", ".tmp", "~"}) WriteFile(path + tail, "the user's");
+
+        EXPECT_EQ(0, RunProgram({"grab", "0", "--simulation", "mono", "-o", path}).exitCode);
+        std::filesystem::remove(path);
+        std::filesystem::create_directory(path);  // This one cannot be written.
+        EXPECT_EQ(1, RunProgram({"grab", "0", "--simulation", "mono", "-o", path}).exitCode);
+
+        for (const char* tail : {".part", ".tmp", "~"}) {
+            EXPECT_EQ("the user's", ReadFile(path + tail)) << path << tail;
+        }
+    }
+    EXPECT_EQ(16U, folder.ListFiles().size());
+}
+
 TEST(Program, StreamCountsItsFramesAndWritesNumberedFiles) {
     const TemporaryFolder folder;
 
@@ -345,7 +414,7 @@ TEST(Program, AnInterruptEndsAStreamCleanlyWithCode130) {
 
     EXPECT_EQ(130, result.exitCode);
     EXPECT_THAT(result.output, HasSubstr("files written"));
-    for (const std::string& name : folder.ListFiles()) EXPECT_THAT(name, Not(HasSubstr(".part")));
+    EXPECT_THAT(folder.ListFiles(), testing::Each(testing::MatchesRegex("night-[0-9]{6}[.]raw")));
 }
 
 /// A scenario of one quick camera without noise, with a trace beside it.
