@@ -512,6 +512,158 @@ ZENTARA_API ZentaraResult _Zentara_factory_reserved0(ZentaraHandle handle, uint3
 ZENTARA_API ZentaraResult Zentara_ReadSettingsFromCam(ZentaraHandle handle,
                                                       Zentara_Settings* settings);
 
+/**
+ * Fills `settings` with the camera's defaults, all 260 bytes. The depth of the image format and the
+ * high gain mode are the present ones. Switches post-processing off at once, before anything is
+ * sent; what the next send is compared with stays.
+ *
+ * 8 not loaded; 9 `handle` null; 2 `settings` null; 9 not open; 9 open in another process.
+ */
+ZENTARA_API ZentaraResult Zentara_ReadDefaultSettings(ZentaraHandle handle,
+                                                      Zentara_Settings* settings);
+
+/** Does nothing. 8 not loaded; else 1. */
+ZENTARA_API ZentaraResult Zentara_TranslateSettings(ZentaraHandle handle,
+                                                    Zentara_Settings* settings);
+
+/**
+ * Mends `settings` in place so that it fits the camera, as every send does first: readout speed of
+ * a 16-bit format, region of interest, exposures. Gain, offset and temperature are left to the
+ * camera. The microsecond words do not follow what is changed in the 64-bit exposures.
+ *
+ * On a camera in real-time video a block for the standard mode makes the camera leave the mode and
+ * enter it again, which stops a stream.
+ *
+ * 8 not loaded; 9 `handle` null; 2 `settings` null; 9 not a camera, or open in another process; the
+ * failure of a question for the exposure's limits, after the region of interest has been mended: 3
+ * for a block without its magic number.
+ */
+ZENTARA_API ZentaraResult Zentara_PreflightSettings(ZentaraHandle handle,
+                                                    Zentara_Settings* settings);
+
+/**
+ * Makes `settings` the state of the camera. The block is mended as by Zentara_PreflightSettings,
+ * its values are set one after the other in a fixed order, and what the camera made of region,
+ * binning and readout speed is read back into the block. Goes over the bus. Streaming that had to
+ * stop goes on afterwards. A setting that the camera does not have is no failure.
+ *
+ * The first failure ends the call: what was set before it stays set. Waits while another thread
+ * sends settings or queues.
+ *
+ * 8 not loaded; 9 `handle` null; 3 `settings` null or without its magic number; 9 not open; 9 open
+ * in another process; a camera's failure (15, 16 or 30).
+ */
+ZENTARA_API ZentaraResult Zentara_SendSettingsToCam(ZentaraHandle handle,
+                                                    Zentara_Settings* settings);
+
+/* ---- Parameters of a settings block ---- */
+
+/**
+ * The value of a parameter, and its least and greatest value. A block is read; the camera is not.
+ *
+ * `key` is one of zprm..., zprmS32... or zprm64.... Gain, offset, exposures and normalised gain are
+ * worked out from the values that are sent, whatever their own words hold. Where a key has a list
+ * of allowed values and no range, its limits are the first and the last entry of that list.
+ *
+ * 8 not loaded; 2 `settings` null; 2 `value` null; 3 no magic number; 3 the block's camera is not
+ * open; 1 the camera does not have the key, or the key has no such value (`*value` untouched).
+ */
+ZENTARA_API ZentaraResult Zentara_GetParam(Zentara_Settings* settings, uint32_t key,
+                                           uint32_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParamMin(Zentara_Settings* settings, uint32_t key,
+                                              uint32_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParamMax(Zentara_Settings* settings, uint32_t key,
+                                              uint32_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParamS32(Zentara_Settings* settings, uint32_t key,
+                                              int32_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParamS32Min(Zentara_Settings* settings, uint32_t key,
+                                                 int32_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParamS32Max(Zentara_Settings* settings, uint32_t key,
+                                                 int32_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParam64(Zentara_Settings* settings, uint32_t key,
+                                             uint64_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParam64Min(Zentara_Settings* settings, uint32_t key,
+                                                uint64_t* value);
+/** See Zentara_GetParam. */
+ZENTARA_API ZentaraResult Zentara_GetParam64Max(Zentara_Settings* settings, uint32_t key,
+                                                uint64_t* value);
+
+/**
+ * Stores a value in a block; the camera changes when the block is sent.
+ *
+ * A value beyond the limits passes where the key has a range and no list: the camera's answer shows
+ * when the block is sent. Gain, offset and normalised gain are stored as the signed keys that are
+ * sent; exposures of 32 bits are stored in their 64-bit key as well.
+ *
+ * 8 not loaded; 2 `settings` null; 3 no magic number; 1 no such key; 3 the block's camera is not
+ * open; 1 the camera does not have the key; 1 a binning that is not in the list, or a key that
+ * cannot be set (nothing stored); 2 any other value that is not in its list, or a cooling target
+ * beyond its limits (nothing stored); 2 an exposure beyond its limits, which is stored all the same
+ * and brought to the nearest limit by the send.
+ */
+ZENTARA_API ZentaraResult Zentara_SetParam(Zentara_Settings* settings, uint32_t key,
+                                           uint32_t value);
+/** See Zentara_SetParam. Gain and offset are not checked. */
+ZENTARA_API ZentaraResult Zentara_SetParamS32(Zentara_Settings* settings, uint32_t key,
+                                              int32_t value);
+/** See Zentara_SetParam. The gain of the intensifier is not checked. */
+ZENTARA_API ZentaraResult Zentara_SetParam64(Zentara_Settings* settings, uint32_t key,
+                                             uint64_t value);
+
+/**
+ * 0 if the camera has the parameter, 1 if not.
+ *
+ * 8 not loaded; 9 `handle` null; 9 not open; 9 open in another process; 1 no such key.
+ */
+ZENTARA_API ZentaraResult Zentara_IsParamSupported(ZentaraHandle handle, uint32_t key);
+/** See Zentara_IsParamSupported. */
+ZENTARA_API ZentaraResult Zentara_IsParamS32Supported(ZentaraHandle handle, uint32_t key);
+/** See Zentara_IsParamSupported. */
+ZENTARA_API ZentaraResult Zentara_IsParam64Supported(ZentaraHandle handle, uint32_t key);
+
+/**
+ * 0 if the key has a continuous range, 1 if not.
+ *
+ * 8 not loaded; 2 `settings` null; 3 no magic number; 1 no such key; 1 the camera does not have the
+ * key. A block whose camera is not open is answered as if the camera had every key.
+ */
+ZENTARA_API ZentaraResult Zentara_IsRangeTable(Zentara_Settings* settings, uint32_t key);
+/** See Zentara_IsRangeTable. */
+ZENTARA_API ZentaraResult Zentara_IsRangeTableS32(Zentara_Settings* settings, uint32_t key);
+/** See Zentara_IsRangeTable. */
+ZENTARA_API ZentaraResult Zentara_IsRangeTable64(Zentara_Settings* settings, uint32_t key);
+
+/** 0 if the key has a list of allowed values, 1 if not. Tests as Zentara_IsRangeTable. */
+ZENTARA_API ZentaraResult Zentara_IsSparseTable(Zentara_Settings* settings, uint32_t key);
+/** 8 not loaded; else 1. */
+ZENTARA_API ZentaraResult Zentara_IsSparseTableS32(Zentara_Settings* settings, uint32_t key);
+/** 8 not loaded; else 1. */
+ZENTARA_API ZentaraResult Zentara_IsSparseTable64(Zentara_Settings* settings, uint32_t key);
+
+/**
+ * Lists the allowed values of a key. `*size` is the room in `table`, entries, and becomes the
+ * number of entries written; a list that does not fit is cut without an error.
+ *
+ * 8 not loaded; 2 `settings`, `table` or `size` null; 3 no magic number; 3 the block's camera is
+ * not open; 0 for a `*size` of 0, with nothing written; 1 for a negative one; 1 the camera does not
+ * have the key, or the key has no list.
+ */
+ZENTARA_API ZentaraResult Zentara_GetParamSparseTable(Zentara_Settings* settings, uint32_t key,
+                                                      uint32_t* table, int32_t* size);
+/** 8 not loaded; else 1, and `*size` becomes 0. */
+ZENTARA_API ZentaraResult Zentara_GetParamSparseTableS32(Zentara_Settings* settings, uint32_t key,
+                                                         int32_t* table, int32_t* size);
+/** 8 not loaded; else 1, and `*size` becomes 0. */
+ZENTARA_API ZentaraResult Zentara_GetParamSparseTable64(Zentara_Settings* settings, uint32_t key,
+                                                        uint64_t* table, int32_t* size);
+
 /* ---- Information ---- */
 
 /**

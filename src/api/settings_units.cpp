@@ -33,10 +33,14 @@ std::uint64_t ConvertMicrosecondsToNanoseconds(std::uint32_t microseconds) {
 }
 
 std::uint32_t ConvertMegahertzToSpeedIndex(float megahertz) {
+    return FindSpeedIndex(megahertz).value_or(0);
+}
+
+std::optional<std::uint32_t> FindSpeedIndex(float megahertz) {
     for (const SpeedRow& row : Speeds) {
         if (row.megahertz == megahertz) return row.index;
     }
-    return 0;
+    return std::nullopt;
 }
 
 float ConvertSpeedIndexToMegahertz(std::uint32_t index) {

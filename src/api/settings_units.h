@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 
 namespace ZV {
 
@@ -12,6 +13,8 @@ namespace ZV {
 
 /// Readout speed index of a frequency; 0, the index of 20 MHz, for a frequency without one.
 [[nodiscard]] std::uint32_t ConvertMegahertzToSpeedIndex(float megahertz);
+/// Nothing for a frequency without an index.
+[[nodiscard]] std::optional<std::uint32_t> FindSpeedIndex(float megahertz);
 /// 0.0 for an index without a frequency.
 [[nodiscard]] float ConvertSpeedIndexToMegahertz(std::uint32_t index);
 
