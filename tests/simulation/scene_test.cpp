@@ -12,12 +12,14 @@
 #include <vector>
 
 #include "support/reference_renderer.h"
+#include "support/temporary_folder.h"
 
 namespace ZV::Simulation {
 namespace {
 
 using Test::ReferenceCamera;
 using Test::ReferenceRenderer;
+using Test::TemporaryFolder;
 
 std::unique_ptr<Scene> Make(const SceneDescription& description, std::uint32_t width,
                             std::uint32_t height, std::uint64_t seed = 1) {
@@ -154,28 +156,22 @@ TEST(SceneTest, AnUnknownKindIsRefusedByName) {
 /// A folder for image files, which goes with the test.
 class SceneImageTest : public testing::Test {
   protected:
-    SceneImageTest() {
-        std::string name = (std::filesystem::temp_directory_path() / "scene-XXXXXX").string();
-        folder = mkdtemp(name.data());
-    }
-    ~SceneImageTest() override { std::filesystem::remove_all(folder); }
-
     SceneDescription Describe(const char* name) const {
         SceneDescription description;
         description.kind = "image";
-        description.path = (folder / name).string();
+        description.path = folder.GetPath(name);
         return description;
     }
 
     void ExpectRefused(const char* name, const std::string& reason) const {
         std::string message;
         EXPECT_EQ(nullptr, MakeScene(Describe(name), 4, 4, 1, &message));
-        EXPECT_EQ("image file \"" + (folder / name).string() + "\": " + reason, message);
+        EXPECT_EQ("image file \"" + folder.GetPath(name) + "\": " + reason, message);
     }
 
     void WriteTiff16(const char* name, const std::vector<std::uint16_t>& samples,
                      std::uint32_t width, std::uint16_t channels) const {
-        TIFF* file = TIFFOpen((folder / name).c_str(), "w");
+        TIFF* file = TIFFOpen(folder.GetPath(name).c_str(), "w");
         ASSERT_NE(nullptr, file);
         const std::size_t line = std::size_t{width} * channels;
         TIFFSetField(file, TIFFTAG_IMAGEWIDTH, width);
@@ -194,7 +190,7 @@ class SceneImageTest : public testing::Test {
         TIFFClose(file);
     }
 
-    std::filesystem::path folder;
+    const TemporaryFolder folder;
 };
 
 TEST_F(SceneImageTest, AnImageIsScaledToTheSensorByItsNearestPixel) {
@@ -226,8 +222,8 @@ TEST_F(SceneImageTest, APngOf8BitsBecomesLinearLight) {
     image.height = 1;
     image.format = PNG_FORMAT_RGB;
     const png_byte pixels[] = {255, 0, 188, 0, 255, 0};
-    ASSERT_NE(0,
-              png_image_write_to_file(&image, (folder / "two.png").c_str(), 0, pixels, 0, nullptr));
+    ASSERT_NE(0, png_image_write_to_file(&image, folder.GetPath("two.png").c_str(), 0, pixels, 0,
+                                         nullptr));
 
     const auto scene = Make(Describe("two.png"), 2, 1);
 
@@ -241,7 +237,7 @@ TEST_F(SceneImageTest, AFitsImageIsScaledToItsGreatestValueAndItsFirstRowIsOnTop
     int status = 0;
     LONGLONG sizes[] = {2, 2};
     float values[] = {50, 100, -5, 25};
-    fits_create_diskfile(&file, (folder / "sky.fits").c_str(), &status);
+    fits_create_diskfile(&file, folder.GetPath("sky.fits").c_str(), &status);
     fits_create_imgll(file, FLOAT_IMG, 2, sizes, &status);
     fits_write_img(file, TFLOAT, 1, 4, values, &status);
     fits_close_file(file, &status);
@@ -257,7 +253,7 @@ TEST_F(SceneImageTest, AFileThatIsNotThereIsRefusedWithItsPath) {
 }
 
 TEST_F(SceneImageTest, AFileOfAnotherKindIsRefused) {
-    std::FILE* file = std::fopen((folder / "text.png").c_str(), "w");
+    std::FILE* file = std::fopen(folder.GetPath("text.png").c_str(), "w");
     std::fputs("not an image", file);
     std::fclose(file);
 
@@ -266,13 +262,13 @@ TEST_F(SceneImageTest, AFileOfAnotherKindIsRefused) {
 
 TEST_F(SceneImageTest, AnImageFileCutAtAnyLengthIsRefusedOrReadButNeverCrashes) {
     WriteTiff16("whole.tif", std::vector<std::uint16_t>(64, 4000), 8, 1);
-    std::vector<char> bytes(std::filesystem::file_size(folder / "whole.tif"));
-    std::FILE* whole = std::fopen((folder / "whole.tif").c_str(), "rb");
+    std::vector<char> bytes(std::filesystem::file_size(folder.GetPath("whole.tif")));
+    std::FILE* whole = std::fopen(folder.GetPath("whole.tif").c_str(), "rb");
     ASSERT_EQ(bytes.size(), std::fread(bytes.data(), 1, bytes.size(), whole));
     std::fclose(whole);
 
     for (std::size_t length = 0; length < bytes.size(); length += 7) {
-        std::FILE* cut = std::fopen((folder / "cut.tif").c_str(), "wb");
+        std::FILE* cut = std::fopen(folder.GetPath("cut.tif").c_str(), "wb");
         std::fwrite(bytes.data(), 1, length, cut);
         std::fclose(cut);
         std::string message;

@@ -19,11 +19,6 @@ constexpr char Variable[] = "ZENTARA_SIMULATION";
 constexpr char ScenarioFile[] = "scenario.json";
 constexpr char TraceFile[] = "trace.jsonl";
 
-std::filesystem::path MakeFolder() {
-    std::string path = (std::filesystem::temp_directory_path() / "zentara-XXXXXX").string();
-    return mkdtemp(path.data()) != nullptr ? path : ".";
-}
-
 void SetDefault(Json* object, const char* key, const Json& value) {
     if (!object->contains(key)) (*object)[key] = value;
 }
@@ -137,20 +132,18 @@ std::uint64_t CalculateChecksum(const void* bytes, std::size_t count) {
     return sum;
 }
 
-SimulationWorld::SimulationWorld(std::string_view scenario) : folder(MakeFolder()) {
-    std::ofstream(folder / ScenarioFile) << MakeDocument(scenario).dump(2);
+SimulationWorld::SimulationWorld(std::string_view scenario) {
+    std::ofstream(GetScenarioPath()) << MakeDocument(scenario).dump(2);
     setenv(Variable, GetScenarioPath().c_str(), 1);
 }
 
 SimulationWorld::~SimulationWorld() {
     End();
     unsetenv(Variable);
-    std::error_code ignored;
-    std::filesystem::remove_all(folder, ignored);
 }
 
 std::string SimulationWorld::GetScenarioPath() const {
-    return (folder / ScenarioFile).string();
+    return folder.GetPath(ScenarioFile);
 }
 
 bool SimulationWorld::Start() {
@@ -162,7 +155,7 @@ void SimulationWorld::End() {
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadTrace() const {
-    return ReadRecords(folder / TraceFile, "");
+    return ReadRecords(folder.GetPath(TraceFile), "");
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadTrace(std::string_view type,
@@ -184,7 +177,8 @@ std::vector<TraceRecord> SimulationWorld::ReadFrames(std::uint32_t camera) const
 
 std::vector<RegisterWrite> SimulationWorld::ReadRegisterWrites(std::uint32_t camera) const {
     std::vector<RegisterWrite> writes;
-    for (const TraceRecord& record : ReadRecords(folder / TraceFile, "FW_IOCTL_ASYNC_WRITE")) {
+    for (const TraceRecord& record :
+         ReadRecords(folder.GetPath(TraceFile), "FW_IOCTL_ASYNC_WRITE")) {
         if (record.type == "request" && record.camera == camera)
             writes.push_back(ParseWrite(record));
     }

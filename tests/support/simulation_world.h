@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "simulation/zentara_simulation.h"
+#include "support/temporary_folder.h"
 
 namespace ZV::Test {
 
@@ -57,7 +58,7 @@ class SimulationWorld {
     SimulationWorld& operator=(const SimulationWorld&) = delete;
 
     /// Folder of the world's files; more may be put there.
-    const std::filesystem::path& GetFolder() const { return folder; }
+    const std::filesystem::path& GetFolder() const { return folder.GetFolder(); }
     /// The scenario file, which is what `ZENTARA_SIMULATION` says.
     std::string GetScenarioPath() const;
 
@@ -83,7 +84,7 @@ class SimulationWorld {
   private:
     std::vector<TraceRecord> ReadTrace(std::string_view type, std::uint32_t camera) const;
 
-    std::filesystem::path folder;
+    TemporaryFolder folder;
 };
 
 }  // namespace ZV::Test

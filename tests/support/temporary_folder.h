@@ -2,12 +2,14 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace ZV::Test {
 
@@ -26,6 +28,7 @@ class TemporaryFolder {
     TemporaryFolder(const TemporaryFolder&) = delete;
     TemporaryFolder& operator=(const TemporaryFolder&) = delete;
 
+    const std::filesystem::path& GetFolder() const { return path; }
     std::string GetPath(std::string_view name) const { return (path / name).string(); }
 
     std::string WriteFile(std::string_view name, std::string_view content) const {
@@ -36,6 +39,16 @@ class TemporaryFolder {
     std::string ReadFile(std::string_view name) const {
         std::ifstream file(path / name, std::ios::binary);
         return {std::istreambuf_iterator<char>(file), {}};
+    }
+
+    /// Names of the files in it, sorted.
+    std::vector<std::string> ListFiles() const {
+        std::vector<std::string> names;
+        for (const auto& entry : std::filesystem::directory_iterator(path)) {
+            names.push_back(entry.path().filename().string());
+        }
+        std::sort(names.begin(), names.end());
+        return names;
     }
 
   private:

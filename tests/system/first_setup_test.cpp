@@ -248,6 +248,8 @@ INSTANTIATE_TEST_SUITE_P(
         MakeCase("TheSensorOfFolaryIsOdd", "Folary",
                  R"({"sensor": {"width": 641, "height": 481}})"),
         MakeCase("AWheelModelHasAMosaic", "SolvaneG1", R"({"sensor": {"colour": "bayer"}})"),
+        MakeCase("TheFilterWheelHasDelays", "SolvaneG2",
+                 R"({"configuration": {"9": "0x00ABCDEF"}})"),
         MakeCase("ItsFeaturesAreAllThere", "SolvaneG1", R"({"configuration": {"169": "0x1F5E"}})"),
         MakeCase("TheVerticalClockHasNoResolution", "TirelM1", R"({"configuration": {"200": 0}})"),
         MakeCase("MiscCtrlIsZero", "TirelM1", R"({"configuration": {"208": 0}})"),

@@ -5,7 +5,6 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
@@ -57,26 +56,6 @@ std::vector<std::string> MakeCommandLine(const std::vector<std::string>& argumen
 }
 
 }  // namespace
-
-TemporaryFolder::TemporaryFolder() {
-    std::string name = (std::filesystem::temp_directory_path() / "zentara-XXXXXX").string();
-    if (mkdtemp(name.data()) == nullptr) std::abort();
-    folder = name;
-}
-
-TemporaryFolder::~TemporaryFolder() {
-    std::error_code ignored;
-    std::filesystem::remove_all(folder, ignored);
-}
-
-std::vector<std::string> TemporaryFolder::ListFiles() const {
-    std::vector<std::string> names;
-    for (const auto& entry : std::filesystem::directory_iterator(folder)) {
-        names.push_back(entry.path().filename().string());
-    }
-    std::sort(names.begin(), names.end());
-    return names;
-}
 
 RunningProgram::RunningProgram(const std::vector<std::string>& arguments,
                                const std::vector<std::string>& variables)

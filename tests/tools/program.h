@@ -1,35 +1,20 @@
 #pragma once
 
 #include <chrono>
-#include <filesystem>
 #include <string>
 #include <vector>
 
+#include "support/temporary_folder.h"
+
 /// The zentara program as a child process.
 namespace ZentaraTest {
+
+using ZV::Test::TemporaryFolder;
 
 struct ProgramResult {
     int exitCode = -1;
     std::string output;  ///< Standard output.
     std::string errors;  ///< Standard error.
-};
-
-/// A folder of its own for one test, removed with what is in it.
-class TemporaryFolder {
-  public:
-    TemporaryFolder();
-    ~TemporaryFolder();
-    TemporaryFolder(const TemporaryFolder&) = delete;
-    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
-
-    [[nodiscard]] std::string GetPath(const std::string& name) const {
-        return (folder / name).string();
-    }
-    /// Names of the files in it, sorted.
-    [[nodiscard]] std::vector<std::string> ListFiles() const;
-
-  private:
-    std::filesystem::path folder;
 };
 
 /// A run that goes on beside the test.
