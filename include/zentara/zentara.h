@@ -740,9 +740,6 @@ ZENTARA_API ZentaraResult Zentara_QueueFrame(ZentaraHandle handle, Zentara_Frame
  * runs before the call returns, and the result is that of the change. That callback must not call
  * any queue function or change settings.
  *
- * A change of settings is not built yet: wherever one is due the result, or the callback's
- * errorCode, is zerrNotSupported (1) and the camera is untouched.
- *
  * 8 not loaded; 9 `handle` null; 9 not open; 9 open in another process; 3 `settings` null or
  * without its magic number; 22 there are 100 entries in the queue; 3 the change cannot be queued;
  * with an empty queue the result of the change.

@@ -4,7 +4,6 @@
 #include "api/entry_queue.h"
 #include "api/exported_call.h"
 #include "api/frame_export.h"
-#include "api/send_settings.h"
 #include "api/settings_block.h"
 #include "diagnostics/log.h"
 #include "imaging/ex_image.h"
@@ -133,7 +132,8 @@ void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold) {
     const EntryHold change(context, TakeSettingsEntry(context, /*index=*/1, /*countMin=*/2));
     if (!change) return;
     ZentaraResult result = zerrNone;
-    queueHold.RunReleased([&] { result = SendSettings(change->camera, change->settings); });
+    queueHold.RunReleased(
+        [&] { result = Zentara_SendSettingsToCam(change->camera, change->settings); });
     if (!WantsCall(*change, zcbFrameDone)) return;
     queueHold.RunReleased([&] { CallClient(*change, result, change->flags); });
 }
@@ -219,7 +219,7 @@ void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
     const EntryHold change(context, TakeSettingsEntry(context, /*index=*/0, /*countMin=*/2));
     if (entry->kind == QueueKindFrame) DeliverFrame(context, *entry, image, status);
     if (!change) return;
-    const ZentaraResult result = SendSettings(change->camera, change->settings);
+    const ZentaraResult result = Zentara_SendSettingsToCam(change->camera, change->settings);
     if (WantsCall(*change, zcbFrameDone)) CallClient(*change, result, change->flags);
 }
 

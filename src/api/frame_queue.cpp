@@ -3,7 +3,6 @@
 #include "api/exported_call.h"
 #include "api/frame_export.h"
 #include "api/handles.h"
-#include "api/send_settings.h"
 #include "api/settings_block.h"
 #include "api/stream_compatibility.h"
 #include "camera/camera.h"
@@ -54,7 +53,7 @@ ZentaraResult SendUnlocked(CameraContext& context, const QueueEntry& entry) {
         ~Released() { lock.Wait(); }
     };
     const Released released(*context.queueLock);
-    return SendSettings(entry.camera, entry.settings);
+    return Zentara_SendSettingsToCam(entry.camera, entry.settings);
 }
 
 ZentaraResult ApplyAtOnce(const char* function, CameraContext& context, const QueueEntry& entry) {

@@ -29,8 +29,7 @@ void FillDefaults(const SettingsSource& source, ZentaraHandle handle, Zentara_Se
     SetSettingsMagic(settings);
 }
 
-ZentaraResult ReadDefaults(const char* function, ZentaraHandle handle,
-                           Zentara_Settings* settings) {
+ZentaraResult ReadDefaults(const char* function, ZentaraHandle handle, Zentara_Settings* settings) {
     if (!ZCamera::IsInitalized()) return zerrNotLoaded;
     if (handle == 0) return zerrBadHandle;
     if (settings == nullptr) return zerrBadParameter;
