@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <condition_variable>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -17,6 +18,8 @@
 #include "zentara/zentara.h"
 
 namespace ZV {
+
+class EventService;
 
 inline constexpr std::uint16_t QueueKindFrame = 0;
 inline constexpr std::uint16_t QueueKindSettings = 1;
@@ -68,6 +71,8 @@ struct CameraContext {
     Relaxed<std::uint8_t> postProcessing{0};     ///< 1 when post-processing is on.
 
     mutable std::mutex queueMutex;
+    EventService* services = nullptr;        ///< What threads serve now. Guarded by queueMutex.
+    std::condition_variable serviceChanged;  ///< A service has ended or moved on.
     mutable std::mutex settingsMutex;
     std::mutex postMutex;  ///< One run of `postPipeline` at a time: a grab and a delivery may meet.
 };

@@ -1,6 +1,7 @@
 #include "api/camera_context.h"
 #include "api/delivery.h"
 #include "api/entry_queue.h"
+#include "api/event_service.h"
 #include "api/exported_call.h"
 #include "api/frame_export.h"
 #include "api/handles.h"
@@ -87,14 +88,10 @@ ZentaraResult Abort(const char* function, ZentaraHandle handle) {
     CameraContext* const context = GetCameraContext(*camera);
     if (context == nullptr) return zerrBadHandle;
 
-    // Kept: from a callback that runs under this lock an abort waits for itself for ever.
-    const SemaphoreHold delivery(*context->deliveryLock);
-    {
-        const SemaphoreHold queueing(*context->queueLock);
-        context->abortRequested = 1;
-    }
-    ClearQueue(*context);
-    (void)camera->Abort();  // kept: its result is ignored
+    ReleaseOwnServices(*context);
+    DropQueue(*camera, *context);
+    // With no lock held: what ExposeDone has begun goes on to its end and calls back no more.
+    AwaitExposures(*context);
     return zerrNone;
 }
 

@@ -2,6 +2,7 @@
 
 #include "api/camera_context.h"
 #include "api/entry_queue.h"
+#include "api/event_service.h"
 #include "api/exported_call.h"
 #include "api/frame_export.h"
 #include "api/settings_block.h"
@@ -15,6 +16,10 @@
 // every callback and every send. ImageReceived holds `deliveryLock` throughout and never takes
 // `queueLock`. The entry at work is held, so that an abort or an image may take it out of the queue
 // meanwhile.
+//
+// Hand-overs. Each of the two stands in the context's list of services while it works: a frame
+// callback waits there for the exposure callback of its frame, and an abort for what was begun
+// before it, so that no callback comes late.
 
 namespace ZV {
 
@@ -87,19 +92,8 @@ bool WantsCall(const QueueEntry& entry, std::uint32_t event) {
 
 // ---- An exposure has ended ----
 
-/// The entry that an exposure belongs to: the first one, or the one behind it if the first has had
-/// its exposure callback already, with one settings change in between passed over.
-std::uint32_t ChooseExposedEntry(CameraContext& context) {
-    const EntryHold first(context, HoldEntry(context, 0));
-    if (!first || first->exposeDoneCalled != 1) return 0;
-    if (GetQueueCount(context) <= 1 || context.abortRequested != 0) return 0;
-    const EntryHold second(context, HoldEntry(context, 1));
-    if (!second || second->kind == QueueKindFrame) return 1;
-    if (GetQueueCount(context) <= 2 || context.abortRequested != 0) return 1;
-    return 2;
-}
-
-void CallExposeDone(CameraContext& context, QueueHold& queueHold, QueueEntry& entry) {
+void CallExposeDone(CameraContext& context, QueueHold& queueHold, EventService& service,
+                    QueueEntry& entry) {
     if (context.abortRequested != 0) {
         ZLogMessage(ExposeDoneName,
                     "Not calling expose done callback because Zentara_Abort was called");
@@ -116,12 +110,12 @@ void CallExposeDone(CameraContext& context, QueueHold& queueHold, QueueEntry& en
         ZLogMessage(ExposeDoneName, "Not calling expose done callback because it is null");
         return;
     }
-    bool isOurs = false;
+    // The image may have been quicker, or an abort, which a send in progress does not keep out.
+    if (!service.ClaimExposeDone(entry)) return;
     queueHold.RunReleased([&] {
-        isOurs = ClaimExposeDone(context, entry);
-        if (isOurs) CallClient(entry, zerrNone, zcbExposeDone);
+        CallClient(entry, zerrNone, zcbExposeDone);
+        service.EndExposeDone();
     });
-    if (!isOurs) return;
     ZLogMessage(ExposeDoneName, "Called expose done callback for frame number %d", entry.userData);
 }
 
@@ -146,19 +140,23 @@ void ServeExposure(CameraContext& context) {
                     "called");
         return;
     }
-    const std::uint32_t index = ChooseExposedEntry(context);
-    const EntryHold chosen(context, HoldEntry(context, index));
+    EventService service(context, EventService::Kind::Exposure);
+    std::uint32_t index = 0;
+    const EntryHold chosen(context, HoldExposedEntry(context, &index));
     if (!chosen || chosen->kind != QueueKindFrame) return;
-    if ((chosen->flags & zcbExposeDone) != 0) CallExposeDone(context, queueHold, *chosen);
+    if ((chosen->flags & zcbExposeDone) != 0) CallExposeDone(context, queueHold, service, *chosen);
     if (index == 0) ApplySettingsEarly(context, queueHold);
 }
 
 // ---- An image has arrived ----
 
 /// The exposure callback always comes before the frame callback: it is made up for here.
-void MakeUpForExposeDone(CameraContext& context, QueueEntry& entry) {
+void MakeUpForExposeDone(CameraContext& context, EventService& service, QueueEntry& entry) {
     if (entry.kind != QueueKindFrame || (entry.flags & zcbExposeDone) == 0) return;
-    if (entry.exposeDoneCalled != 0) return;
+    if (entry.exposeDoneCalled != 0) {
+        service.AwaitExposeDone(entry);
+        return;
+    }
     ZLogMessage(ImageReceivedName,
                 "Received a frame but the expose done callback wasn't called.  Calling it now "
                 "before returning the frame.");
@@ -166,8 +164,12 @@ void MakeUpForExposeDone(CameraContext& context, QueueEntry& entry) {
     if (entry.callback == nullptr) {
         ZLogMessage(ImageReceivedName, "Not calling expose done callback because it is null");
     }
-    if (!ClaimExposeDone(context, entry) || entry.callback == nullptr) return;
-    CallClient(entry, zerrNone, zcbExposeDone);
+    if (!service.ClaimExposeDone(entry)) {
+        service.AwaitExposeDone(entry);  // it began in this very moment
+        return;
+    }
+    if (entry.callback != nullptr) CallClient(entry, zerrNone, zcbExposeDone);
+    service.EndExposeDone();
 }
 
 void CallFrameDone(CameraContext& context, const QueueEntry& entry) {
@@ -207,10 +209,11 @@ void DeliverFrame(CameraContext& context, const QueueEntry& entry, ZExImage* ima
 
 void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
     const SemaphoreHold delivery(*context.deliveryLock);
+    EventService service(context, EventService::Kind::Image);
     {
         const EntryHold head(context, HoldEntry(context, 0));
         if (!head) return;
-        MakeUpForExposeDone(context, *head);
+        MakeUpForExposeDone(context, service, *head);
     }
     const EntryHold entry(context, TakeFirstEntry(context));
     if (!entry) return;

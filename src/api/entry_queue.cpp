@@ -18,6 +18,16 @@ QueueEntry* TakeEntryAt(CameraContext& context, std::uint32_t index) {
     return taken;
 }
 
+std::uint32_t FindExposedEntry(const CameraContext& context) {
+    const auto& queue = context.queue;
+    const auto goesOnBehind = [&](std::uint32_t index) {
+        return context.queueCount > index + 1 && context.abortRequested == 0;
+    };
+    if (queue[0]->exposeDoneCalled != 1 || !goesOnBehind(0)) return 0;
+    if (queue[1]->kind == QueueKindFrame || !goesOnBehind(1)) return 1;
+    return 2;
+}
+
 void DropHold(QueueEntry* entry) {
     --entry->holdCount;
     if (entry->holdCount == 0) delete entry;
@@ -66,6 +76,15 @@ QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index) {
     return entry;
 }
 
+QueueEntry* HoldExposedEntry(CameraContext& context, std::uint32_t* index) {
+    const std::lock_guard hold(context.queueMutex);
+    if (context.queueCount == 0) return nullptr;
+    *index = FindExposedEntry(context);
+    QueueEntry* const entry = context.queue[*index];
+    ++entry->holdCount;
+    return entry;
+}
+
 QueueEntry* TakeFirstEntry(CameraContext& context) {
     const std::lock_guard hold(context.queueMutex);
     if (context.queueCount == 0) return nullptr;
@@ -77,13 +96,6 @@ QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index, std::
     if (context.queueCount < countMin || index >= context.queueCount) return nullptr;
     if (context.queue[index]->kind != QueueKindSettings) return nullptr;
     return TakeEntryAt(context, index);
-}
-
-bool ClaimExposeDone(CameraContext& context, QueueEntry& entry) {
-    const std::lock_guard hold(context.queueMutex);
-    if (entry.exposeDoneCalled != 0) return false;
-    entry.exposeDoneCalled = 1;
-    return true;
 }
 
 void LetGoOfEntry(CameraContext& context, QueueEntry* entry) {

@@ -21,6 +21,11 @@ namespace ZV {
 /// The entry at `index`, held for the caller; null at or beyond the count.
 [[nodiscard]] QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index);
 
+/// The entry that an ended exposure belongs to, held for the caller, and its place: the first one,
+/// or the one behind it if the first has had its exposure callback already, with one settings
+/// change in between passed over. Null when the queue is empty.
+[[nodiscard]] QueueEntry* HoldExposedEntry(CameraContext& context, std::uint32_t* index);
+
 /// Takes the entry at index 0 out and hands the queue's hold to the caller; null when the queue is
 /// empty.
 [[nodiscard]] QueueEntry* TakeFirstEntry(CameraContext& context);
@@ -29,10 +34,6 @@ namespace ZV {
 /// entries, and hands the queue's hold to the caller; else null, and the queue stays as it is.
 [[nodiscard]] QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index,
                                             std::uint32_t countMin);
-
-/// Marks the exposure callback of a frame as called. False when another thread has done so: exactly
-/// one of two threads gets true.
-[[nodiscard]] bool ClaimExposeDone(CameraContext& context, QueueEntry& entry);
 
 /// Lets go of an entry. Null is ignored.
 void LetGoOfEntry(CameraContext& context, QueueEntry* entry);

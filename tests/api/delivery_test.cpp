@@ -472,6 +472,100 @@ TEST_F(Delivery, AnAbortWaitsForADeliveryInProgress) {
     EXPECT_EQ(0u, CountQueued());
 }
 
+/// Callbacks of one frame: that of its exposure stays inside until the test lets it go.
+struct SlowExposure {
+    ZentaraHandle handle = 0;
+    bool aborts = false;
+    std::atomic<bool> isInside{false}, mayLeave{false}, hasLeft{false}, isDelivered{false};
+    std::atomic<bool> wasLeftAtDelivery{false};
+
+    static void Serve(std::uint64_t userPrivate, std::uint32_t, std::uint32_t,
+                      std::uint32_t flags) {
+        auto& self = *reinterpret_cast<SlowExposure*>(static_cast<std::uintptr_t>(userPrivate));
+        if (flags == zcbExposeDone) {
+            self.isInside = true;
+            EXPECT_TRUE(WaitUntil([&] { return self.mayLeave.load(); }));
+            if (self.aborts) {
+                EXPECT_ZERR(zerrNone, Zentara_Abort(self.handle));
+            }
+            self.hasLeft = true;
+        } else {
+            self.wasLeftAtDelivery = self.hasLeft.load();
+            self.isDelivered = true;
+        }
+    }
+    ZentaraResult Queue(ClientFrame& frame) {
+        return Zentara_QueueFrame(handle, frame.Get(), Serve, zcbFrameDone | zcbExposeDone,
+                                  reinterpret_cast<std::uintptr_t>(this), 0);
+    }
+};
+
+TEST_F(Delivery, AFrameCallbackWaitsUntilTheExposureCallbackOfItsFrameHasReturned) {
+    SlowExposure slow{.handle = handle};
+    ASSERT_ZERR(zerrNone, slow.Queue(frame));
+    std::thread exposing([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return slow.isInside.load(); }));
+    std::thread receiving([&] { ReceiveImage(); });
+    EXPECT_FALSE(WaitUntil([&] { return slow.isDelivered.load(); }, std::chrono::milliseconds(50)));
+
+    slow.mayLeave = true;
+    exposing.join();
+    receiving.join();
+
+    EXPECT_TRUE(slow.isDelivered);
+    EXPECT_TRUE(slow.wasLeftAtDelivery);
+}
+
+TEST_F(Delivery, AnAbortReturnsAfterAnExposureCallbackThatWasBegun) {
+    SlowExposure slow{.handle = handle};
+    ASSERT_ZERR(zerrNone, slow.Queue(frame));
+    std::thread exposing([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return slow.isInside.load(); }));
+    std::atomic<bool> hasReturned{false};
+    std::thread client([&] {
+        EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+        EXPECT_TRUE(slow.hasLeft);
+        hasReturned = true;
+    });
+    EXPECT_TRUE(WaitUntil([&] { return CountQueued() == 0; }));
+    EXPECT_FALSE(WaitUntil([&] { return hasReturned.load(); }, std::chrono::milliseconds(50)));
+
+    slow.mayLeave = true;
+    exposing.join();
+    client.join();
+
+    EXPECT_FALSE(slow.isDelivered);
+}
+
+TEST_F(Delivery, AnExposureCallbackMayAbortWhileTheImageOfItsFrameWaitsForIt) {
+    SlowExposure slow{.handle = handle, .aborts = true};
+    ASSERT_ZERR(zerrNone, slow.Queue(frame));
+    std::thread exposing([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return slow.isInside.load(); }));
+    std::thread receiving([&] { ReceiveImage(); });
+
+    slow.mayLeave = true;
+    exposing.join();
+    receiving.join();
+
+    EXPECT_TRUE(slow.hasLeft);
+    EXPECT_EQ(0u, CountQueued());
+}
+
+TEST_F(Delivery, TwoThreadsMayAbortAtATimeOneOfThemFromAnExposureCallback) {
+    SlowExposure slow{.handle = handle, .aborts = true};
+    ASSERT_ZERR(zerrNone, slow.Queue(frame));
+    std::thread exposing([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return slow.isInside.load(); }));
+    std::thread client([&] { EXPECT_ZERR(zerrNone, Zentara_Abort(handle)); });
+
+    slow.mayLeave = true;
+    exposing.join();
+    client.join();
+
+    EXPECT_EQ(0u, CountQueued());
+}
+
 TEST_F(Delivery, WithoutAContextNothingIsServedAndTheImageIsLetGo) {
     CameraContext* const context = GetCameraContext(GetCamera());
     GetCamera().SetRefCon(nullptr);

@@ -94,19 +94,26 @@ TEST_F(EntryQueue, AnIndexBeyondTheQueueHoldsNothing) {
     LetGoOfEntry(context, nullptr);
 }
 
-TEST_F(EntryQueue, OneOfTwoThreadsGetsTheExposureCallback) {
-    for (std::uint32_t round = 0; round < 200; ++round) {
-        ASSERT_TRUE(Append(round));
-        QueueEntry* const entry = TakeFirstEntry(context);
-        bool isOther = false;
-        std::thread other([&] { isOther = ClaimExposeDone(context, *entry); });
-        const bool isOurs = ClaimExposeDone(context, *entry);
-        other.join();
+TEST_F(EntryQueue, AnExposureBelongsToTheFirstEntryThatHasNotHadItsCallback) {
+    const auto find = [&] {
+        std::uint32_t index = 99;
+        LetGoOfEntry(context, HoldExposedEntry(context, &index));
+        return index;
+    };
+    std::uint32_t index = 99;
+    EXPECT_EQ(nullptr, HoldExposedEntry(context, &index));
+    EXPECT_EQ(99u, index);
 
-        EXPECT_NE(isOurs, isOther);
-        EXPECT_EQ(1, entry->exposeDoneCalled);
-        LetGoOfEntry(context, entry);
-    }
+    ASSERT_TRUE(Append(0));
+    EXPECT_EQ(0u, find());
+    context.queue[0]->exposeDoneCalled = 1;
+    EXPECT_EQ(0u, find()) << "a lone frame is passed over by nothing";
+    ASSERT_TRUE(Append(1, QueueKindSettings));
+    EXPECT_EQ(1u, find());
+    ASSERT_TRUE(Append(2));
+    EXPECT_EQ(2u, find());
+    context.abortRequested = 1;
+    EXPECT_EQ(0u, find());
 }
 
 TEST_F(EntryQueue, StaysWholeWhileThreadsAppendTakeAndClear) {

@@ -1,0 +1,57 @@
+#pragma once
+
+#include <thread>
+
+#include "api/camera_context.h"
+
+namespace ZV {
+
+/// What one thread of the engine serves for a client at the moment: the end of an exposure or an
+/// image. It lies on the stack of that thread and stands in its context's list from construction to
+/// destruction, so that others can wait for its end.
+///
+/// No wait is without a way out: none waits for the own thread's service, nor for one whose client
+/// has called Zentara_Abort from its callback, and an exposure is waited for five seconds at most.
+class EventService {
+  public:
+    enum class Kind { Exposure, Image };
+
+    EventService(CameraContext& served, Kind servedKind);
+    ~EventService();
+    EventService(const EventService&) = delete;
+    EventService& operator=(const EventService&) = delete;
+
+    /// Claims the exposure callback of a frame for this thread. False when the frame is no longer
+    /// in the queue or its callback has been claimed already: of two threads one gets true.
+    [[nodiscard]] bool ClaimExposeDone(QueueEntry& entry);
+    /// The claimed callback has returned.
+    void EndExposeDone();
+    /// Waits while another thread is inside the exposure callback of `entry`.
+    void AwaitExposeDone(const QueueEntry& entry);
+
+  private:
+    friend void ReleaseOwnServices(CameraContext& context);
+    friend void AwaitExposures(CameraContext& context);
+    friend void AwaitImages(CameraContext& context);
+
+    static bool HasOthers(const CameraContext& context, Kind kind);
+
+    CameraContext& context;
+    const Kind kind;
+    const std::thread::id thread = std::this_thread::get_id();
+    // All below: guarded by queueMutex.
+    const QueueEntry* calledEntry = nullptr;  ///< Its exposure callback is running.
+    bool isReleased = false;                  ///< Nobody waits for it any more.
+    EventService* next = nullptr;
+};
+
+/// Lets nobody wait for what this very thread is serving: it is about to wait itself.
+void ReleaseOwnServices(CameraContext& context);
+
+/// Waits until no other thread serves the end of an exposure, or five seconds have passed.
+void AwaitExposures(CameraContext& context);
+
+/// Waits until no other thread serves an image.
+void AwaitImages(CameraContext& context);
+
+}  // namespace ZV
