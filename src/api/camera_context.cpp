@@ -41,10 +41,11 @@ std::unique_ptr<CameraContext> MakeCameraContext(ZCamera& camera) {
     if (!IsComplete(*context) || camera.GetImagePipeline() == nullptr) return nullptr;
 
     context->postPipeline->Setup(camera.GetCCDWidth(), camera.GetCCDHeight());
-    camera.GetImagePipeline()->AddFilter(context->rgbWheel.get());
     context->postPipeline->AddFilter(context->ratioCorrection);
     context->postPipeline->AddFilter(context->bayerFilter);
     context->postPipeline->AddFilter(context->whiteBalance.get());
+    // Last, when nothing can fail any more: the camera's pipeline keeps the wheel by its address.
+    camera.GetImagePipeline()->AddFilter(context->rgbWheel.get());
     return context;
 }
 

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "api/entry_queue.h"
+#include "api/event_service.h"
 #include "api/handles.h"
 #include "camera/morvane_fw_camera.h"
 
@@ -14,6 +15,12 @@ namespace {
 // has no context, and neither has one whose close failed.
 bool IsInUse(ZCamera* camera) {
     return camera->IsCameraOpen() && GetCameraContext(*camera) != nullptr;
+}
+
+/// What the client gets back with its close nobody may write to afterwards.
+void AwaitServices(CameraContext& context) {
+    AwaitImages(context);
+    AwaitExposures(context);
 }
 
 bool Holds(const std::vector<ZCamera*>& cameras, const ZCamera* camera) {
@@ -51,9 +58,13 @@ CameraResult CameraStore::MakeList() {
     return result;
 }
 
-void CameraStore::AttachContext(ZCamera& camera, std::unique_ptr<CameraContext> context) {
+bool CameraStore::AttachContext(ZCamera& camera) {
+    contexts.reserve(contexts.size() + 1);  // behind the making nothing may fail any more
+    std::unique_ptr<CameraContext> context = MakeCameraContext(camera);
+    if (!context) return false;
     camera.SetRefCon(context.get());
     contexts.push_back({&camera, std::move(context)});
+    return true;
 }
 
 void CameraStore::DetachContext(ZCamera& camera) {
@@ -61,7 +72,10 @@ void CameraStore::DetachContext(ZCamera& camera) {
     camera.SetRefCon(nullptr);
     if (context != nullptr) ClearQueue(*context);
     // A close that failed leaves the camera open and its threads running on the context.
-    if (camera.IsCameraOpen()) return;
+    if (camera.IsCameraOpen()) {
+        if (context != nullptr) AwaitServices(*context);
+        return;
+    }
     TakeOutContextsOf(camera);
     // One that succeeded may leave an exposure callback that lasts.
     if (!HasLivingThreads(camera)) FreeContextsOf(camera);

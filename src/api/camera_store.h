@@ -26,10 +26,13 @@ class CameraStore {
     /// here.
     CameraResult MakeList();
 
-    /// Attaches a context to its camera; the store owns it.
-    void AttachContext(ZCamera& camera, std::unique_ptr<CameraContext> context);
+    /// Makes the context of a camera that has just been opened and attaches it; the store owns it.
+    /// False when there is no memory, or by the exception that says so: the camera and the store
+    /// are then as they were.
+    [[nodiscard]] bool AttachContext(ZCamera& camera);
 
-    /// Ends what belongs to a camera whose close has just returned. A context that a thread of the
+    /// Ends what belongs to a camera whose close has just returned. What is queued is the client's
+    /// again at the return: a delivery in progress is waited for. A context that a thread of the
     /// camera may still use stays, retired, until the threads have ended.
     void DetachContext(ZCamera& camera);
 

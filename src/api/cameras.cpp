@@ -36,13 +36,13 @@ ZentaraResult ListCameras(const char* function, Zentara_CamListItem* items, std:
 }
 
 ZentaraResult MakeAndAttachContext(ZCamera& camera) {
-    std::unique_ptr<CameraContext> context = MakeCameraContext(camera);
-    if (!context) {
-        (void)camera.CloseCamera();  // there is no better code than the one for the context
-        return zerrDriverFault;
-    }
-    CameraStore::Get().AttachContext(camera, std::move(context));
-    return zerrNone;
+    const ZentaraResult result = Guarded([&] {
+        const bool isAttached = CameraStore::Get().AttachContext(camera);
+        return isAttached ? ZentaraResult{zerrNone} : ZentaraResult{zerrDriverFault};
+    });
+    // There is no better code than the one for the context.
+    if (result != zerrNone) (void)camera.CloseCamera();
+    return result;
 }
 
 ZentaraResult OpenCamera(const char* function, std::uint32_t cameraId, ZentaraHandle* handle) {

@@ -65,6 +65,7 @@ ZentaraResult SetStreaming(const char* function, ZentaraHandle handle, std::uint
     ZCamera* const camera = FindCamera(handle);
     if (!IsOpen(camera)) return zerrBadHandle;
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
+    if (GetCameraContext(*camera) == nullptr) return zerrBadHandle;  // images have no taker
     return enable != 0 ? StartStreaming(function, *camera) : StopStreaming(function, *camera);
 }
 
@@ -75,8 +76,20 @@ ZentaraResult Trigger(const char* function, ZentaraHandle handle) {
     if (!IsOpen(camera)) return zerrBadHandle;
     if (!camera->IsCameraStreaming()) return zerrNotStreaming;
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
+    if (GetCameraContext(*camera) == nullptr) return zerrBadHandle;  // as above
     if (camera->GetTriggerMode() != ztrigSoftware) return zerrNotSupported;
     return TranslateCameraResult(camera->SoftwareTrigger());
+}
+
+void DropQueue(ZCamera& camera, CameraContext& context) {
+    // Kept: from a callback that runs under this lock an abort waits for itself for ever.
+    const SemaphoreHold delivery(*context.deliveryLock);
+    {
+        const SemaphoreHold queueing(*context.queueLock);
+        context.abortRequested = 1;
+    }
+    ClearQueue(context);
+    (void)camera.Abort();  // kept: its result is ignored
 }
 
 ZentaraResult Abort(const char* function, ZentaraHandle handle) {
