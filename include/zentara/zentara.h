@@ -45,10 +45,11 @@
  * camera do not touch the bus unless they say so.
  *
  * Callbacks come from the library's own threads: the frame thread and the exposure thread of the
- * camera, which are alive from open to close. A callback may call Zentara_QueueFrame, the functions
- * that read, and, with zcbExposeDone, Zentara_Trigger. It must not call Zentara_CloseCamera or
- * Zentara_ReleaseDriver, which wait for the very thread that the callback runs on, nor, from a call
- * with zcbFrameDone, Zentara_Abort or Zentara_GrabFrame: each of these waits for itself for ever.
+ * camera, which are alive from open to close. A callback may call Zentara_QueueFrame,
+ * Zentara_QueueSettings, the functions that read, and, with zcbExposeDone, Zentara_Trigger. It must
+ * not call Zentara_CloseCamera or Zentara_ReleaseDriver, which wait for the very thread that the
+ * callback runs on, nor, from a call with zcbFrameDone, Zentara_Abort or Zentara_GrabFrame: each of
+ * these waits for itself for ever.
  * Zentara_Abort is no better from a call with zcbExposeDone: it may be made up for on the frame
  * thread, when the image is there first.
  * A callback of Zentara_QueueSettings that runs inside that call (empty queue) must not call any
@@ -459,15 +460,17 @@ ZENTARA_API ZentaraResult Zentara_ListCameras(Zentara_CamListItem* items, uint32
  * Opens a camera of the list and starts its two threads. Streaming is off afterwards.
  *
  * 8 not loaded; 2 `handle` null; 11 `cameraId` is not in the list; 11 the camera is open already;
- * a camera's failure (15, 16 or 30). The second 11 stores the handle all the same: the client then
- * has a failure and a handle, which works if this process opened the camera.
+ * a camera's failure (15, 16 or 30); 16 there is no memory (the camera is closed again). The second
+ * 11 stores the handle all the same: the client then has a failure and a handle, which works if
+ * this process opened the camera.
  */
 ZENTARA_API ZentaraResult Zentara_OpenCamera(uint32_t cameraId, ZentaraHandle* handle);
 
 /**
  * Stops streaming, ends the camera's threads, drops what is queued without calling a callback, and
  * gives the camera back. The client's frames, buffers and blocks are the client's again. What the
- * camera operations report is ignored.
+ * camera operations report is ignored: should the close fail, the camera answers as closed all the
+ * same, and a later call of this function tries it again.
  *
  * 8 not loaded; 9 `handle` null; 9 open in another process; 9 not open. Never call it from a
  * callback of this camera: it waits for that callback for ever.
@@ -721,11 +724,12 @@ ZENTARA_API ZentaraResult Zentara_GrabFrame(ZentaraHandle handle, Zentara_Frame*
  *
  * `callback` may be null. `flags` are the events that the client wants, zcbFrameDone and
  * zcbExposeDone. `userPrivate` and `userData` go to the callback unchanged. For one frame the
- * callback with zcbExposeDone always comes before the one with zcbFrameDone. May be called from a
- * callback, also for the frame that it delivers.
+ * callback with zcbExposeDone always comes before the one with zcbFrameDone, which waits up to five
+ * seconds for it to return. May be called from a callback, also for the frame that it delivers.
  *
  * 8 not loaded; 9 `handle` null; 9 not open; 9 open in another process; 2 `frame` null; 22 there
- * are 100 entries in the queue; 18 bufferSize is smaller than the camera's image.
+ * are 100 entries in the queue; 18 bufferSize is smaller than the camera's image; 16 there is no
+ * memory for the entry.
  */
 ZENTARA_API ZentaraResult Zentara_QueueFrame(ZentaraHandle handle, Zentara_Frame* frame,
                                              ZentaraAsyncCallback callback, uint32_t flags,
@@ -742,7 +746,7 @@ ZENTARA_API ZentaraResult Zentara_QueueFrame(ZentaraHandle handle, Zentara_Frame
  *
  * 8 not loaded; 9 `handle` null; 9 not open; 9 open in another process; 3 `settings` null or
  * without its magic number; 22 there are 100 entries in the queue; 3 the change cannot be queued;
- * with an empty queue the result of the change.
+ * with an empty queue the result of the change, else 16 there is no memory for the entry.
  */
 ZENTARA_API ZentaraResult Zentara_QueueSettings(ZentaraHandle handle, Zentara_Settings* settings,
                                                 ZentaraAsyncCallback callback, uint32_t flags,
@@ -768,7 +772,8 @@ ZENTARA_API ZentaraResult Zentara_Trigger(ZentaraHandle handle);
 /**
  * Drops what is queued without calling a callback and stops what the camera is doing: a
  * Zentara_GrabFrame that waits ends, and the next image is refused. Waits for a delivery that is in
- * progress. Frames, buffers and blocks are the client's again when it returns. Streaming stays on.
+ * progress, and up to five seconds for an exposure callback. No callback comes afterwards for what
+ * was queued before; frames, buffers and blocks are the client's again. Streaming stays on.
  *
  * 8 not loaded; 9 `handle` null; 9 not open; 9 open in another process. Never call it from a
  * callback: from one that runs on the frame thread it waits for itself for ever.
