@@ -35,6 +35,7 @@ struct ParameterText {
 /// How the log words a value behind its label.
 enum class LogForm {
     Number,        ///< "Gain: 7"
+    WithUnit,      ///< "Trigger Delay: 500 ns", by the row's unit.
     Named,         ///< "SyncB: 1 (Expose)", by the row's value names.
     Microseconds,  ///< "Exposure: 1500 us (1.5 ms)"
     Nanoseconds,   ///< "Exposure (64-bit): 1500000 ns (1.5 ms)"
