@@ -1,6 +1,9 @@
 // The parameters of a settings block: single values and their limits. Editing a block touches no
 // camera; the camera of the block only lends its limits and conversions.
 
+#include <optional>
+#include <type_traits>
+
 #include "api/exported_call.h"
 #include "api/parameter_checks.h"
 #include "api/parameter_table.h"
@@ -59,6 +62,8 @@ struct Question {
     Zentara_Settings* block;
     std::uint32_t key;
     Value* value;
+    /// Whether a key beyond the family's last is printed like an answer.
+    bool printsUnknownKey = false;
 };
 
 /// What is asked of a key once the arguments have passed.
@@ -75,9 +80,10 @@ ZentaraResult AskParameter(const Question<typename Family::Value>& question,
     if (!HasSettingsMagic(*question.block)) return zerrBadSettings;
     ZCamera* const camera = FindBlockCamera(*question.block);
     if (camera == nullptr) return zerrBadSettings;
-    if (!Family::IsSupported(*question.block, question.key)) return zerrNotSupported;
+    const bool isSupported = Family::IsSupported(*question.block, question.key);
     const auto* const row = Family::FindRow(question.key);
-    if (row == nullptr) return zerrNotSupported;
+    if (row == nullptr && question.printsUnknownKey) Family::Print(question.key, *question.value);
+    if (row == nullptr || !isSupported) return zerrNotSupported;
     const ZentaraResult result = answer(*row, *camera, question);
     Family::Print(question.key, *question.value);
     return result;
@@ -115,7 +121,9 @@ ZentaraResult AnswerBound(const ParameterRow<typename Family::Value>& row, ZCame
     }
     const auto limit = Which == Bound::Least ? row.limits.least : row.limits.greatest;
     if (limit == nullptr) return zerrNotSupported;
-    *question.value = limit(camera);
+    const std::optional<typename Family::Value> value = limit(camera);
+    if (!value) return zerrNotSupported;
+    *question.value = *value;
     return zerrNone;
 }
 
@@ -197,13 +205,14 @@ ZentaraResult Zentara_GetParamS32(Zentara_Settings* settings, uint32_t key, int3
 
 ZentaraResult Zentara_GetParamS32Min(Zentara_Settings* settings, uint32_t key, int32_t* value) {
     using Family = ZV::SignedFamily;
-    return ZV::AskTraced<Family>(__func__, {settings, key, value},
+    // Kept: the limits of a signed key that does not exist print the out value all the same.
+    return ZV::AskTraced<Family>(__func__, {settings, key, value, true},
                                  ZV::AnswerBound<Family, ZV::Bound::Least>);
 }
 
 ZentaraResult Zentara_GetParamS32Max(Zentara_Settings* settings, uint32_t key, int32_t* value) {
     using Family = ZV::SignedFamily;
-    return ZV::AskTraced<Family>(__func__, {settings, key, value},
+    return ZV::AskTraced<Family>(__func__, {settings, key, value, true},
                                  ZV::AnswerBound<Family, ZV::Bound::Greatest>);
 }
 

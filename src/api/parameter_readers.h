@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <vector>
 
 #include "api/parameter_table.h"
@@ -27,17 +28,17 @@ Value GiveInitial(const SettingsSource&) {
 }
 
 template <typename Value, auto Operation>
-Value Ask(ZCamera& camera) {
+std::optional<Value> Ask(ZCamera& camera) {
     return static_cast<Value>((camera.*Operation)());
 }
 
 template <auto Operation>
-std::uint32_t AskMicroseconds(ZCamera& camera) {
+std::optional<std::uint32_t> AskMicroseconds(ZCamera& camera) {
     return ConvertNanosecondsToMicroseconds((camera.*Operation)());
 }
 
 template <typename Value, Value Constant>
-Value Give(ZCamera&) {
+std::optional<Value> Give(ZCamera&) {
     return Constant;
 }
 

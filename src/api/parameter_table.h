@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <span>
 #include <vector>
 
@@ -60,11 +61,15 @@ struct SettingsSource {
     CameraContext& context;
 };
 
-/// Least and greatest value of a key; null for none.
+/// Least or greatest value of a key on a camera; nothing where it would be of an empty list.
+template <typename Value>
+using ParameterLimit = std::optional<Value> (*)(ZCamera& camera);
+
+/// Null for a key without limits.
 template <typename Value>
 struct ParameterLimits {
-    Value (*least)(ZCamera& camera) = nullptr;
-    Value (*greatest)(ZCamera& camera) = nullptr;
+    ParameterLimit<Value> least = nullptr;
+    ParameterLimit<Value> greatest = nullptr;
 };
 
 /// What Zentara_GetParam... answers for a key; null in a row for the stored word.

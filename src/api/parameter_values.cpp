@@ -165,35 +165,36 @@ bool IsSecondRevision(ZCamera& camera) {
     return camera.GetHardwareVersion() >= 2;
 }
 
-std::uint32_t GetFirstReadoutSpeed(ZCamera& camera) {
+std::optional<std::uint32_t> GetFirstReadoutSpeed(ZCamera& camera) {
     std::vector<float> modes;
     camera.GetReadoutFrequencyModes(modes);
-    return modes.empty() ? 0 : ConvertMegahertzToSpeedIndex(modes.front());
+    if (modes.empty()) return std::nullopt;
+    return ConvertMegahertzToSpeedIndex(modes.front());
 }
 
-std::uint32_t GetLastColumn(ZCamera& camera) {
+std::optional<std::uint32_t> GetLastColumn(ZCamera& camera) {
     return camera.GetCCDWidth() - 1;
 }
 
-std::uint32_t GetLastRow(ZCamera& camera) {
+std::optional<std::uint32_t> GetLastRow(ZCamera& camera) {
     return camera.GetCCDHeight() - 1;
 }
 
-std::uint32_t GetFirstSyncBMode(ZCamera& camera) {
+std::optional<std::uint32_t> GetFirstSyncBMode(ZCamera& camera) {
     const std::vector<std::uint32_t> modes = GetSyncBModes(camera);
-    return modes.empty() ? 0 : modes.front();
+    return modes.empty() ? std::nullopt : std::optional(modes.front());
 }
 
-std::uint32_t GetLastSyncBMode(ZCamera& camera) {
+std::optional<std::uint32_t> GetLastSyncBMode(ZCamera& camera) {
     const std::vector<std::uint32_t> modes = GetSyncBModes(camera);
-    return modes.empty() ? 0 : modes.back();
+    return modes.empty() ? std::nullopt : std::optional(modes.back());
 }
 
-std::uint32_t GetLeastNormalizedGain(ZCamera& camera) {
+std::optional<std::uint32_t> GetLeastNormalizedGain(ZCamera& camera) {
     return TruncateToMillionths(camera.GetNormalizedGainMin());
 }
 
-std::uint32_t GetGreatestNormalizedGain(ZCamera& camera) {
+std::optional<std::uint32_t> GetGreatestNormalizedGain(ZCamera& camera) {
     return TruncateToMillionths(camera.GetNormalizedGainMax());
 }
 

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstdint>
+#include <optional>
 #include <vector>
 
 #include "api/parameter_table.h"
@@ -92,14 +93,14 @@ std::int32_t GetDefaultGaindB(const SettingsSource& source);
 
 bool IsSecondRevision(ZCamera& camera);
 
-std::uint32_t GetFirstReadoutSpeed(ZCamera& camera);
-std::uint32_t GetLastColumn(ZCamera& camera);
-std::uint32_t GetLastRow(ZCamera& camera);
-std::uint32_t GetFirstSyncBMode(ZCamera& camera);
-std::uint32_t GetLastSyncBMode(ZCamera& camera);
+std::optional<std::uint32_t> GetFirstReadoutSpeed(ZCamera& camera);
+std::optional<std::uint32_t> GetLastColumn(ZCamera& camera);
+std::optional<std::uint32_t> GetLastRow(ZCamera& camera);
+std::optional<std::uint32_t> GetFirstSyncBMode(ZCamera& camera);
+std::optional<std::uint32_t> GetLastSyncBMode(ZCamera& camera);
 /// In millionths, truncated.
-std::uint32_t GetLeastNormalizedGain(ZCamera& camera);
-std::uint32_t GetGreatestNormalizedGain(ZCamera& camera);
+std::optional<std::uint32_t> GetLeastNormalizedGain(ZCamera& camera);
+std::optional<std::uint32_t> GetGreatestNormalizedGain(ZCamera& camera);
 
 void ListReadoutSpeeds(ZCamera& camera, std::vector<std::uint32_t>& values);
 void ListImageFormats(ZCamera& camera, std::vector<std::uint32_t>& values);
