@@ -1,8 +1,11 @@
 #include "api/parameter_documents.h"
 
+#include <algorithm>
 #include <span>
 #include <sstream>
+#include <vector>
 
+#include "api/information_table.h"
 #include "api/parameter_table.h"
 
 namespace ZV::Test {
@@ -10,7 +13,11 @@ namespace {
 
 struct Key {
     std::uint32_t number;
-    ParameterText text;
+    std::string name;
+    const char* unit;
+    const char* range;
+    const char* meaning;
+    std::span<const ValueName> values;
     bool hasRange;
     bool hasList;
 };
@@ -26,9 +33,24 @@ template <typename Row>
 std::vector<Key> CollectKeys(std::span<const Row> rows) {
     std::vector<Key> keys;
     for (const Row& row : rows) {
-        keys.push_back({row.key, row.text, row.hasRange, row.list != nullptr});
+        keys.push_back({row.key, row.text.name, row.text.unit, row.text.range, row.text.meaning,
+                        row.text.values, row.hasRange, row.list != nullptr});
     }
     return keys;
+}
+
+/// A key that the log has no name for is called as in zentara.h.
+std::string GetInformationName(const InformationRow& row) {
+    return row.name != nullptr ? row.name : "zinfReserved" + std::to_string(row.key);
+}
+
+Family CollectInformation() {
+    Family family{"Information", "Information", "", {}};
+    for (const InformationRow& row : GetInformationRows()) {
+        family.keys.push_back({row.key, GetInformationName(row), row.unit, "", row.meaning,
+                               row.values, false, false});
+    }
+    return family;
 }
 
 std::vector<Family> CollectFamilies() {
@@ -50,28 +72,45 @@ void PrintKeys(std::ostream& out, const Family& family) {
     out << "\n## " << family.title << "\n\nRead and written by " << family.functions << ".\n\n"
         << "| Key | Name | Unit | Values | Tables | Meaning |\n|---|---|---|---|---|---|\n";
     for (const Key& key : family.keys) {
-        out << "| " << key.number << " | `" << key.text.name << "` | " << key.text.unit << " | "
-            << key.text.range << " | " << GetTables(key) << " | " << key.text.meaning << " |\n";
+        out << "| " << key.number << " | `" << key.name << "` | " << key.unit << " | " << key.range
+            << " | " << GetTables(key) << " | " << key.meaning << " |\n";
+    }
+}
+
+void PrintInformation(std::ostream& out, const Family& family) {
+    out << "\n## " << family.title << "\n\nRead by `Zentara_GetInfo`. A yes or no is 1 or 0.\n\n"
+        << "| Key | Name | Unit | Meaning |\n|---|---|---|---|\n";
+    for (const Key& key : family.keys) {
+        out << "| " << key.number << " | `" << key.name << "` | " << key.unit << " | "
+            << key.meaning << " |\n";
     }
 }
 
 void PrintValues(std::ostream& out, const Key& key) {
-    if (key.text.values.empty()) return;
-    out << "\n`" << key.text.name << "`:\n\n| Value | Name |\n|---|---|\n";
-    for (const ValueName& value : key.text.values) {
+    if (key.values.empty()) return;
+    out << "\n`" << key.name << "`:\n\n| Value | Name |\n|---|---|\n";
+    for (const ValueName& value : key.values) {
         out << "| " << value.value << " | " << value.name << " |\n";
     }
 }
 
 void PrintRow(std::ostream& out, const Family& family, const Key& key) {
-    out << "{ParameterFamily::" << family.name << ", " << key.number << ", \"" << key.text.name
-        << "\", \"" << key.text.unit << "\", \"" << key.text.meaning << "\", {";
+    out << "{ParameterFamily::" << family.name << ", " << key.number << ", \"" << key.name
+        << "\", \"" << key.unit << "\", \"" << key.meaning << "\", {";
     const char* separator = "";
-    for (const ValueName& value : key.text.values) {
+    for (const ValueName& value : key.values) {
         out << separator << "{" << value.value << ", \"" << value.name << "\"}";
         separator = ", ";
     }
     out << "}},\n";
+}
+
+std::size_t CountMostValues(const std::vector<Family>& families) {
+    std::size_t most = 0;
+    for (const Family& family : families) {
+        for (const Key& key : family.keys) most = std::max(most, key.values.size());
+    }
+    return most;
 }
 
 constexpr const char* DocumentHead =
@@ -92,7 +131,7 @@ constexpr const char* NamesHead =
     "//\n"
     "// One row per key, in the order of the families and of the numbers, for an initialiser of\n"
     "//     {ParameterFamily family; std::uint32_t key; const char* name; const char* unit;\n"
-    "//      const char* meaning; ValueName values[MaximalValueNames];}\n"
+    "//      const char* meaning; ValueName values[N];}\n"
     "// with struct ValueName {std::uint32_t value; const char* name;}: the values' names, if "
     "any,\n"
     "// come first and the rest of the array is empty. The includer gives these types their "
@@ -102,9 +141,11 @@ constexpr const char* NamesHead =
 
 std::string MakeParameterDocument() {
     std::ostringstream out;
-    const std::vector<Family> families = CollectFamilies();
+    std::vector<Family> families = CollectFamilies();
     out << DocumentHead;
     for (const Family& family : families) PrintKeys(out, family);
+    families.push_back(CollectInformation());
+    PrintInformation(out, families.back());
     out << "\n## Names of values\n";
     for (const Family& family : families) {
         for (const Key& key : family.keys) PrintValues(out, key);
@@ -115,7 +156,10 @@ std::string MakeParameterDocument() {
 std::string MakeParameterNames() {
     std::ostringstream out;
     out << NamesHead;
-    for (const Family& family : CollectFamilies()) {
+    std::vector<Family> families = CollectFamilies();
+    families.push_back(CollectInformation());
+    out << "// The longest list of names has " << CountMostValues(families) << ".\n";
+    for (const Family& family : families) {
         for (const Key& key : family.keys) PrintRow(out, family, key);
     }
     return out.str();
