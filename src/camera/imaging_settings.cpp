@@ -20,28 +20,37 @@ CameraResult MorvaneFWCamera::ChangeField(const RegisterField& field, std::uint3
     return WriteControlField(field, value);
 }
 
-// The four compare the register, not the getter: a model may state its position from another
-// corner.
+// The ROI's fields compare the register, not the getter: a model may state its position from
+// another corner.
+CameraResult MorvaneFWCamera::ChangeROIField(const RegisterField& field, std::uint32_t value,
+                                             std::uint32_t greatest, StopStep stopStep) {
+    if (value == ReadControlField(field)) return CameraOk;
+    if (stopStep == StopStep::Due) TurnOffStreaming();
+    return WriteControlField(field, std::min(value, greatest));
+}
+
+std::uint32_t MorvaneFWCamera::GetGreatestROIWidth() {
+    return GetMaxCCDWidthForBinningMode(GetSymmetricalBinningMode());
+}
+
+std::uint32_t MorvaneFWCamera::GetGreatestROIHeight() {
+    return GetMaxCCDHeightForBinningMode(GetSymmetricalBinningMode());
+}
+
 CameraResult MorvaneFWCamera::SetROIX(std::uint32_t x) {
-    if (x == ReadControlField(ControlRoiX)) return CameraOk;
-    return ChangeField(ControlRoiX, x);
+    return ChangeROIField(ControlRoiX, x, ROIUnlimited, StopStep::Due);
 }
 
 CameraResult MorvaneFWCamera::SetROIY(std::uint32_t y) {
-    if (y == ReadControlField(ControlRoiY)) return CameraOk;
-    return ChangeField(ControlRoiY, y);
+    return ChangeROIField(ControlRoiY, y, ROIUnlimited, StopStep::Due);
 }
 
 CameraResult MorvaneFWCamera::SetROIWidth(std::uint32_t width) {
-    if (width == ReadControlField(ControlRoiWidth)) return CameraOk;
-    const std::uint32_t greatest = GetMaxCCDWidthForBinningMode(GetSymmetricalBinningMode());
-    return ChangeField(ControlRoiWidth, std::min(width, greatest));
+    return ChangeROIField(ControlRoiWidth, width, GetGreatestROIWidth(), StopStep::Due);
 }
 
 CameraResult MorvaneFWCamera::SetROIHeight(std::uint32_t height) {
-    if (height == ReadControlField(ControlRoiHeight)) return CameraOk;
-    const std::uint32_t greatest = GetMaxCCDHeightForBinningMode(GetSymmetricalBinningMode());
-    return ChangeField(ControlRoiHeight, std::min(height, greatest));
+    return ChangeROIField(ControlRoiHeight, height, GetGreatestROIHeight(), StopStep::Due);
 }
 
 CameraResult MorvaneFWCamera::SetROI(std::uint32_t x, std::uint32_t y, std::uint32_t width,

@@ -417,6 +417,14 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
 
     /// Stop step, then the field.
     CameraResult ChangeField(const RegisterField& field, std::uint32_t value);
+    /// Whether a change has still to stop the stream first, or runs where that is done.
+    enum class StopStep { Due, Done };
+    static constexpr std::uint32_t ROIUnlimited = 0xFFFFFFFF;
+    /// Changes one field of the ROI, cut down to `greatest`, unless `value` is in place.
+    CameraResult ChangeROIField(const RegisterField& field, std::uint32_t value,
+                                std::uint32_t greatest, StopStep stopStep);
+    std::uint32_t GetGreatestROIWidth();
+    std::uint32_t GetGreatestROIHeight();
     CameraResult WriteExposure(std::uint32_t quadlet, std::uint32_t lowQuadlet,
                                std::uint64_t nanoseconds, std::uint32_t microseconds);
     CameraResult WriteTweak(std::uint32_t quadlet, std::uint32_t value);

@@ -81,17 +81,24 @@ CameraResult MorvaneFWCamera::WriteBinning(std::uint32_t mode) {
 }
 
 // The results are dropped: the binning stands, and each step says on its own what it could not do.
+// The stop step is done, and none of these may stop a stream: they run under `streamLock`, for
+// which a stop waits. A stream that another client has started meanwhile runs on; its frames of the
+// old size are dropped.
 void MorvaneFWCamera::FitROIToBinning(std::uint32_t mode, std::uint32_t formerMode) {
+    const auto put = [this](const RegisterField& field, std::uint32_t value,
+                            std::uint32_t greatest) {
+        (void)ChangeROIField(field, value, greatest, StopStep::Done);
+    };
     if (mode > 1) {
-        (void)SetROIWidth(GetMaxCCDWidthForBinningMode(mode));
-        (void)SetROIX(0);
-        (void)SetROIHeight(GetMaxCCDHeightForBinningMode(mode));
-        (void)SetROIY(0);
+        put(ControlRoiWidth, GetMaxCCDWidthForBinningMode(mode), GetGreatestROIWidth());
+        put(ControlRoiX, 0, ROIUnlimited);
+        put(ControlRoiHeight, GetMaxCCDHeightForBinningMode(mode), GetGreatestROIHeight());
+        put(ControlRoiY, 0, ROIUnlimited);
     } else if (formerMode > 1) {
-        (void)SetROIWidth(GetCCDWidth());
-        (void)SetROIHeight(GetCCDHeight());
-        (void)SetROIX(0);
-        (void)SetROIY(0);
+        put(ControlRoiWidth, GetCCDWidth(), GetGreatestROIWidth());
+        put(ControlRoiHeight, GetCCDHeight(), GetGreatestROIHeight());
+        put(ControlRoiX, 0, ROIUnlimited);
+        put(ControlRoiY, 0, ROIUnlimited);
     }
 }
 

@@ -1,6 +1,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <thread>
+
 #include "camera/bare_camera.h"
 #include "camera/packet_size.h"
 #include "camera/test_camera.h"
@@ -74,6 +77,61 @@ TEST(SymmetricalBinning, RefusesAModeWithStreamingAlreadyStoppedAndTheCodeCleare
         EXPECT_EQ(500u << 16 | 400, camera.ReadControl(3)) << "the ROI stays";
         EXPECT_EQ(CameraOk, camera.UpdateSettingsOnCamera()) << "the lock has been given";
     }
+}
+
+/// Stands in for another client that starts the stream behind the stop step.
+struct StreamStartsMeanwhile : BinningCamera {
+    std::uint32_t GetMaxCCDWidthForBinningMode(std::uint32_t mode) override {
+        streaming.isStreaming = true;
+        return BinningCamera::GetMaxCCDWidthForBinningMode(mode);
+    }
+};
+
+TEST(SymmetricalBinning, LeavesAStreamAloneThatAnotherClientStartsBehindItsStopStep) {
+    StreamStartsMeanwhile camera;
+    std::atomic<bool> hasReturned{false};
+    CameraResult result = CameraBadValue;
+
+    std::thread setter([&] {
+        result = camera.SetSymmetricalBinning(2);
+        hasReturned = true;
+    });
+    const bool isInTime = WaitUntil([&] { return hasReturned.load(); });
+    // A setter that waits for the lock it holds gets it from here, so that the test ends.
+    if (!isInTime) (void)HAL_SemaphoreSignal(camera.streaming.streamLock);
+    setter.join();
+
+    EXPECT_TRUE(isInTime);
+    EXPECT_EQ(CameraOk, result);
+    EXPECT_TRUE(camera.streaming.isStreaming);
+    EXPECT_FALSE(camera.streaming.restartAfterUpdate);
+    EXPECT_EQ(500u << 16 | 400, camera.ReadControl(3));
+    EXPECT_EQ(0u, camera.ReadControl(4));
+}
+
+TEST(SymmetricalBinning, WritesWidthXHeightYWhenItBinsAndSizeBeforePositionWhenItEnds) {
+    CameraWorld world(SmallCamera);
+    ASSERT_EQ(CameraOk, world.camera->Ready());
+    ASSERT_EQ(CameraOk, world.camera->SetROI(3, 5, 32, 16));
+    (void)world.TakeWrites();
+
+    ASSERT_EQ(CameraOk, world.camera->SetSymmetricalBinning(2));
+    EXPECT_THAT(world.TakeWrites(),
+                ElementsAre(RegisterWrite{ControlAddress + 8, {1}, 0},
+                            RegisterWrite{ControlAddress + 16, {5}, 0},
+                            RegisterWrite{ControlAddress + 12, {32u << 16 | 24}, 0},
+                            RegisterWrite{ControlAddress + 16, {0}, 0}))
+        << "a width in place is not written";
+
+    ASSERT_EQ(CameraOk, world.camera->SetROI(3, 5, 16, 8));
+    (void)world.TakeWrites();
+    ASSERT_EQ(CameraOk, world.camera->SetSymmetricalBinning(1));
+    EXPECT_THAT(world.TakeWrites(),
+                ElementsAre(RegisterWrite{ControlAddress + 8, {0}, 0},
+                            RegisterWrite{ControlAddress + 12, {64u << 16 | 8}, 0},
+                            RegisterWrite{ControlAddress + 12, {64u << 16 | 48}, 0},
+                            RegisterWrite{ControlAddress + 16, {5}, 0},
+                            RegisterWrite{ControlAddress + 16, {0}, 0}));
 }
 
 TEST(SymmetricalBinning, SendsNothingForAModeThatItRefuses) {
