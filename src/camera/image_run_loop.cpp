@@ -9,6 +9,7 @@
 // The expose thread sleeps on `exposeDoneCondition` and tells the client of each exposure's end.
 
 #include <cstdio>
+#include <cstring>
 #include <exception>
 #include <memory>
 #include <new>
@@ -96,6 +97,8 @@ void MorvaneFWCamera::ServeFrame(tStFrameInfo* frame) {
         DiscardFrame(frame);
         return;
     }
+    // Nothing has been written to a refused frame: it must not show what its buffer held.
+    if (frame->frameStatus == FrameRefused) std::memset(frame->buffer, 0, frame->bufferSize);
     ZExImage* image = MakeImage(*frame);
     FreeFrame(frame);
     if (image != nullptr) DeliverImage(image);

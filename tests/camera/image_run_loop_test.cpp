@@ -18,10 +18,10 @@ class CameraWithARunLoop : public CameraWorld, public testing::Test {
     }
     void TearDown() override { EXPECT_EQ(CameraOk, camera->CloseCamera()); }
 
-    void Bring(std::uint32_t frameStatus = 0) {
+    void Bring(std::uint32_t frameStatus = 0, std::uint8_t heldBefore = 0) {
         tStFrameInfo* frame = camera->PrivatePeekNewFrame();
         ASSERT_NE(nullptr, frame);
-        std::fill_n(frame->buffer, frame->bufferSize, std::uint8_t{0});
+        std::fill_n(frame->buffer, frame->bufferSize, heldBefore);
         frame->frameStatus = frameStatus;
         frame->isHeld.store(false, std::memory_order_release);
         camera->PrivateImageHasArrived();
@@ -75,6 +75,18 @@ TEST_F(CameraWithARunLoop, DeliversARefusedFrameAsOutOfSyncInATriggeredMode) {
 
     ASSERT_TRUE(AwaitImages(1));
     EXPECT_EQ(FrameStatusOutOfSync, client.GetDeliveries()[0].status);
+}
+
+TEST_F(CameraWithARunLoop, DeliversARefusedFrameBlackWhateverItsBufferHeld) {
+    camera->StoreControl(11, 1);
+
+    Bring(FrameRefused, 0xEE);
+    ASSERT_TRUE(AwaitImages(1));
+    Bring(FrameMissingData, 0xEE);
+    ASSERT_TRUE(AwaitImages(2));
+
+    EXPECT_TRUE(client.GetDeliveries()[0].isBlack);
+    EXPECT_FALSE(client.GetDeliveries()[1].isBlack) << "other frames are delivered as they are";
 }
 
 TEST_F(CameraWithARunLoop, DropsAFrameOfAFormerSizeWithoutAWord) {

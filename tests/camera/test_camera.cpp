@@ -1,10 +1,20 @@
 #include "camera/test_camera.h"
 
+#include <algorithm>
+
 #include "imaging/ex_image.h"
 #include "imaging/image_pipeline.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
+namespace {
+
+bool IsBlack(const ZExImage& image) {
+    const std::uint8_t* const pixels = image.GetImageData();
+    return std::all_of(pixels, pixels + image.GetImageSize(), [](auto byte) { return byte == 0; });
+}
+
+}  // namespace
 
 CameraResult TestCamera::Ready() {
     CameraResult result = OpenCamera();
@@ -41,11 +51,11 @@ void* TestClient::ReceiveImage(ZImageReceivedCallbackStruct* record) {
         const std::lock_guard hold(client.mutex);
         const ZExImage* image = record->image;
         if (image != nullptr) {
-            client.deliveries.push_back({true, record->status, image->GetImageFormat(),
-                                         image->GetWidth(), image->GetHeight(),
-                                         image->GetImageSize(), image->GetCamera()});
+            client.deliveries.push_back(
+                {true, record->status, image->GetImageFormat(), image->GetWidth(),
+                 image->GetHeight(), image->GetImageSize(), image->GetCamera(), IsBlack(*image)});
         } else {
-            client.deliveries.push_back({false, record->status, 0, 0, 0, 0, nullptr});
+            client.deliveries.push_back({false, record->status, 0, 0, 0, 0, nullptr, false});
         }
     }
     ZCamera::FreeImage(record->image);

@@ -83,6 +83,7 @@ class TestClient {
         std::uint16_t status;
         std::uint32_t format, width, height, size;
         const void* camera;
+        bool isBlack;  ///< Every byte of the image is 0.
     };
     std::vector<Delivery> GetDeliveries() const;
 

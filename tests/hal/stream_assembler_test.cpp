@@ -106,7 +106,7 @@ TEST_F(StreamAssemblerTest, AStaleParameterSetNumberLeavesNoFrameAndItsPacketsPa
 
     EXPECT_EQ(takes, 0);
     EXPECT_TRUE(doneStatus.empty());
-    EXPECT_EQ(frame.Pixels(), Bytes(16, 0)) << "a triggered mode delivers it";
+    EXPECT_EQ(frame.Pixels(), Bytes(16, HeldBefore)) << "who delivers it clears it";
 }
 
 TEST_F(StreamAssemblerTest, KeptARefusedStartMarksTheRecordThatWasNeverTaken) {
@@ -120,7 +120,7 @@ TEST_F(StreamAssemblerTest, KeptARefusedStartMarksTheRecordThatWasNeverTaken) {
     EXPECT_EQ(takes, 0);
     EXPECT_EQ(assembler.current, nullptr);
     EXPECT_FALSE(frame.info.isHeld);
-    EXPECT_EQ(frame.Pixels(), Bytes(16, 0));
+    EXPECT_EQ(frame.Pixels(), Bytes(16, HeldBefore));
 }
 
 TEST_F(StreamAssemblerTest, ARefusedRecordThatIsAcceptedLaterLosesItsStatus) {
