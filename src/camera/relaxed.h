@@ -14,9 +14,9 @@ class Relaxed {
     Relaxed& operator=(const Relaxed&) = delete;
 
     operator T() const { return value.load(std::memory_order_relaxed); }
-    T operator=(T newValue) {
+    Relaxed& operator=(T newValue) {
         value.store(newValue, std::memory_order_relaxed);
-        return newValue;
+        return *this;
     }
 
   private:
