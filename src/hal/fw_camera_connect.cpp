@@ -37,11 +37,11 @@ HALStatus OpenFreeDevice(FWDeviceContext& context) {
     if (device == nullptr) return HALDeviceNotOpen;
     const HALStatus status = QueryFree(device);
     // A device that this record held until now goes before its handle is forgotten.
-    if (status != HALOk || (context.device != nullptr && !CloseHeldDevice(context))) {
+    if (status != HALOk || (context.device.IsOpen() && !CloseHeldDevice(context))) {
         CloseDevice(device);
         return status != HALOk ? status : HALDeviceInUse;
     }
-    context.device = device;
+    context.device.Put(device);
     return HALOk;
 }
 

@@ -20,10 +20,13 @@ constexpr bool FitsRequest(std::uint64_t bytes) {
     return bytes <= std::numeric_limits<std::uint32_t>::max();
 }
 
-HALStatus SendAsyncRead(PlatformDevice* device, std::uint32_t address, std::uint32_t* data,
+HALStatus SendAsyncRead(DeviceSlot& slot, std::uint32_t address, std::uint32_t* data,
                         std::uint32_t quadlets) {
     const OwnedOverlapped overlapped(MakeOverlapped());
     if (overlapped == nullptr) return HALReadFailed;
+    const DeviceUse use(slot, overlapped.get());
+    PlatformDevice* const device = use.GetDevice();
+    if (device == nullptr) return HALDeviceNotOpen;  // closed meanwhile
     const AsyncReadRecord record = MakeAsyncReadRecord(address, quadlets);
     const ControlRequest request{FW_IOCTL_ASYNC_READ, &record, sizeof record, data, record.bytes};
     const ControlOutcome outcome = ControlDeviceOverlapped(device, request, overlapped.get());
@@ -36,13 +39,16 @@ HALStatus SendAsyncRead(PlatformDevice* device, std::uint32_t address, std::uint
     return HALOk;
 }
 
-HALStatus SendAsyncWrite(PlatformDevice* device, std::uint32_t address, const std::uint32_t* data,
+HALStatus SendAsyncWrite(DeviceSlot& slot, std::uint32_t address, const std::uint32_t* data,
                          std::uint32_t quadlets) {
     const std::uint64_t recordBytes = GetAsyncWriteBytes(quadlets);
     if (!FitsRequest(recordBytes)) return HALWriteFailed;
     const OwnedOverlapped overlapped(MakeOverlapped());
     const OwnedMemory record(static_cast<std::uint8_t*>(std::malloc(recordBytes)));
     if (overlapped == nullptr || record == nullptr) return HALWriteFailed;
+    const DeviceUse use(slot, overlapped.get());
+    PlatformDevice* const device = use.GetDevice();
+    if (device == nullptr) return HALDeviceNotOpen;  // closed while the mutex was waited for
     FillAsyncWriteRecord(record.get(), address, data, quadlets);
     const ControlRequest request{FW_IOCTL_ASYNC_WRITE, record.get(),
                                  static_cast<std::uint32_t>(recordBytes), nullptr, 0};
@@ -57,8 +63,8 @@ HALStatus SendAsyncWrite(PlatformDevice* device, std::uint32_t address, const st
 
 HALStatus FWCameraReadData(HALCamera camera, std::uint32_t address, std::uint32_t* data,
                            std::uint32_t quadlets) {
-    const FWDeviceContext* const context = GetFWContext(camera);
-    if (context == nullptr || context->device == nullptr) return HALDeviceNotOpen;
+    FWDeviceContext* const context = GetFWContext(camera);
+    if (context == nullptr || !context->device.IsOpen()) return HALDeviceNotOpen;
     if (data == nullptr) return HALNullData;
     if (!FitsRequest(std::uint64_t{quadlets} * 4)) return HALReadFailed;
     return SendAsyncRead(context->device, address, data, quadlets);
@@ -66,8 +72,8 @@ HALStatus FWCameraReadData(HALCamera camera, std::uint32_t address, std::uint32_
 
 HALStatus FWCameraWriteData(HALCamera camera, std::uint32_t address, const std::uint32_t* data,
                             std::uint32_t quadlets) {
-    const FWDeviceContext* const context = GetFWContext(camera);
-    if (context == nullptr || context->device == nullptr) return HALDeviceNotOpen;
+    FWDeviceContext* const context = GetFWContext(camera);
+    if (context == nullptr || !context->device.IsOpen()) return HALDeviceNotOpen;
     const MutexHold hold(context->deviceMutex);
     if (data == nullptr) return HALNullData;
     return SendAsyncWrite(context->device, address, data, quadlets);

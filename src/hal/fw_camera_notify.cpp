@@ -23,7 +23,7 @@ ControlOutcome SendNotifyWait(const FWDeviceContext& context) {
     std::memset(notification.record + ClearedRecordBegin, 0, ClearedRecordEnd - ClearedRecordBegin);
     const ControlRequest request{FW_IOCTL_NOTIFY_WAIT, notification.record, NotifyRecordBytes,
                                  notification.record, NotifyRecordBytes};
-    return ControlDeviceOverlapped(context.device, request, notification.overlapped);
+    return ControlDeviceOverlapped(context.device.Get(), request, notification.overlapped);
 }
 
 void* RunNotificationLoop(void* argument) {
@@ -33,14 +33,14 @@ void* RunNotificationLoop(void* argument) {
         // A request that was refused has no end to wait for.
         if (SendNotifyWait(context) == ControlOutcome::Failed) return nullptr;
         const CompletionOutcome outcome =
-            WaitForCompletion(context.device, overlapped, WaitForEver);
+            WaitForCompletion(context.device.Get(), overlapped, WaitForEver);
         if (outcome == CompletionOutcome::Ended) return nullptr;
         ClearOverlapped(overlapped);
     }
     return nullptr;
 }
 
-bool SendPlain(const FWDeviceContext& context, std::uint32_t code) {
+bool SendPlain(FWDeviceContext& context, std::uint32_t code) {
     std::uint32_t record = 0;
     return SendRecord(context.device, code, &record, PlainRecordBytes);
 }
@@ -49,7 +49,7 @@ bool SendPlain(const FWDeviceContext& context, std::uint32_t code) {
 
 HALStatus FWCameraEnableNotification(HALCamera camera) {
     FWDeviceContext* const context = GetFWContext(camera);
-    if (context == nullptr || context->device == nullptr) return HALDeviceNotOpen;
+    if (context == nullptr || !context->device.IsOpen()) return HALDeviceNotOpen;
     if (!EndNotification(*context)) return HALWriteFailed;
     const MutexHold hold(context->deviceMutex);
     if (!SendPlain(*context, FW_IOCTL_NOTIFY_ENABLE)) return HALWriteFailed;
@@ -63,7 +63,7 @@ HALStatus FWCameraEnableNotification(HALCamera camera) {
 
 HALStatus FWCameraDisableNotification(HALCamera camera) {
     FWDeviceContext* const context = GetFWContext(camera);
-    if (context == nullptr || context->device == nullptr) return HALDeviceNotOpen;
+    if (context == nullptr || !context->device.IsOpen()) return HALDeviceNotOpen;
     const MutexHold hold(context->deviceMutex);
     context->notifying.store(0, std::memory_order_relaxed);
     return SendPlain(*context, FW_IOCTL_NOTIFY_DISABLE) ? HALOk : HALWriteFailed;

@@ -27,7 +27,7 @@ void EnterStream(RequestRing& ring) {
     const ControlRequest request{FW_IOCTL_STREAM_ENTER, &ring.enterRecord, PlainRecordBytes,
                                  &ring.enterRecord, PlainRecordBytes};
     // Nobody waits for its end before the ring is given up.
-    (void)ControlDeviceOverlapped(ring.context->device, request, ring.enterOverlapped);
+    (void)ControlDeviceOverlapped(ring.context->device.Get(), request, ring.enterOverlapped);
 }
 
 void LeaveStream(FWDeviceContext& context) {
@@ -57,7 +57,7 @@ LoopStep ServeRequest(const RequestRing& ring, IsochRequestSlot& slot, bool serv
 
 void* RunCallbackLoop(void* argument) {
     RequestRing& ring = *static_cast<RequestRing*>(argument);
-    const bool servesRealDevice = IsRealDevice(ring.context->device);
+    const bool servesRealDevice = IsRealDevice(ring.context->device.Get());
     EnterStream(ring);
     RaiseOwnThreadPriority(servesRealDevice);
     for (std::size_t i = 0;; i = (i + 1) % ring.requests.size()) {
@@ -151,7 +151,7 @@ HALStatus WriteStreamRegister(HALCamera camera, std::uint32_t streamRegister, st
 HALStatus FWCameraStartStreaming(HALCamera camera, std::uint32_t streamRegister,
                                  std::uint16_t streamingVersion) {
     FWDeviceContext* const context = GetFWContext(camera);
-    if (context == nullptr || context->device == nullptr) return HALReadFailed;
+    if (context == nullptr || !context->device.IsOpen()) return HALReadFailed;
     if (context->streaming.load(std::memory_order_relaxed) != 0) return HALOk;
     if (context->ring != nullptr) return HALReadFailed;  // A loop that could not be ended has it.
     if (!MakeStreamObjects(*context)) {

@@ -46,6 +46,11 @@ bool SendRecord(PlatformDevice* device, std::uint32_t code, void* record, std::u
     return ControlDevice(device, ControlRequest{code, record, bytes, record, bytes}, nullptr);
 }
 
+bool SendRecord(DeviceSlot& slot, std::uint32_t code, void* record, std::uint32_t bytes) {
+    const DeviceUse use(slot);
+    return SendRecord(use.GetDevice(), code, record, bytes);
+}
+
 bool FinishRequest(PlatformDevice* device, PlatformOverlapped* overlapped) {
     const CompletionOutcome outcome = WaitForCompletion(device, overlapped, WaitForEver);
     if (outcome != CompletionOutcome::Ended) return outcome == CompletionOutcome::Completed;
@@ -57,9 +62,12 @@ bool FinishRequest(PlatformDevice* device, PlatformOverlapped* overlapped) {
     return false;
 }
 
-bool SendOverlapped(PlatformDevice* device, const ControlRequest& request) {
+bool SendOverlapped(DeviceSlot& slot, const ControlRequest& request) {
     const OwnedOverlapped overlapped(MakeOverlapped());
     if (overlapped == nullptr) return false;
+    const DeviceUse use(slot, overlapped.get());
+    PlatformDevice* const device = use.GetDevice();
+    if (device == nullptr) return false;
     const ControlOutcome outcome = ControlDeviceOverlapped(device, request, overlapped.get());
     if (outcome != ControlOutcome::Pending) return outcome == ControlOutcome::Done;
     return FinishRequest(device, overlapped.get());
@@ -80,7 +88,7 @@ bool EndNotification(FWDeviceContext& context) {
     context.notifying.store(0, std::memory_order_relaxed);
     if (!EndHALThread(&context.notifyThread)) return false;
     if (context.notification == nullptr) return true;
-    return EndRequest(context.device, context.notification->overlapped);
+    return EndRequest(context.device.Get(), context.notification->overlapped);
 }
 
 bool CloseHeldDevice(FWDeviceContext& context) {
@@ -88,6 +96,8 @@ bool CloseHeldDevice(FWDeviceContext& context) {
     // What the driver still holds of it, the close ends.
     (void)EndNotification(context);
     if (!EndHALThread(&context.callbackThread) || context.notifyThread != nullptr) return false;
+    PlatformDevice* const device = context.device.TakeOut();
+    if (device == nullptr && context.device.IsOpen()) return false;
     (void)DestroyEvent(std::exchange(context.stopEvent, nullptr));
     // The next stream must not go on with a frame of this one.
     context.assembler.AbandonFrame();
@@ -95,7 +105,7 @@ bool CloseHeldDevice(FWDeviceContext& context) {
         (void)EndRequests(*context.ring);
         RetireRing(context, std::move(context.ring));
     }
-    CloseDevice(std::exchange(context.device, nullptr));
+    CloseDevice(device);
     FreeRetiredRings(context);
     FreeNotification(context);
     return true;

@@ -5,6 +5,7 @@
 #include <memory>
 
 #include "hal/control_records.h"
+#include "hal/device_slot.h"
 #include "hal/frame_gate.h"
 #include "hal/hal.h"
 #include "hal/platform/device.h"
@@ -38,7 +39,7 @@ struct FWDeviceContext {
     FWDeviceContext& operator=(const FWDeviceContext&) = delete;
 
     char devicePath[DevicePathBytes] = {};
-    PlatformDevice* device = nullptr;  ///< Null when closed. Every request goes through it.
+    DeviceSlot device;  ///< Every request goes through it.
     std::uint64_t bandwidthHandle = 0;
     std::uint64_t resourceHandle = 0;
     PlatformMutex* streamMutex = nullptr;  ///< Guards submission and parsing. From the first start.
@@ -66,8 +67,10 @@ inline FWDeviceContext* GetFWContext(const HALCamera& camera) {
 }
 
 /// Sends a buffered request with one record as input and output and waits for the answer. False for
-/// a failure, and for a device that is not open.
+/// a failure, and for a device that is not open. Thread-safe with a slot.
 [[nodiscard]] bool SendRecord(PlatformDevice* device, std::uint32_t code, void* record,
+                              std::uint32_t bytes);
+[[nodiscard]] bool SendRecord(DeviceSlot& slot, std::uint32_t code, void* record,
                               std::uint32_t bytes);
 
 struct OverlappedDeleter {
@@ -80,7 +83,8 @@ using OwnedOverlapped = std::unique_ptr<PlatformOverlapped, OverlappedDeleter>;
 [[nodiscard]] bool FinishRequest(PlatformDevice* device, PlatformOverlapped* overlapped);
 
 /// Sends a request overlapped and waits without limit for its end. False when it failed.
-[[nodiscard]] bool SendOverlapped(PlatformDevice* device, const ControlRequest& request);
+/// Thread-safe.
+[[nodiscard]] bool SendOverlapped(DeviceSlot& slot, const ControlRequest& request);
 
 /// Keeps `ring` until the device handle is closed.
 void RetireRing(FWDeviceContext& context, std::unique_ptr<RequestRing> ring);
@@ -92,8 +96,9 @@ void RetireRing(FWDeviceContext& context, std::unique_ptr<RequestRing> ring);
 /// Ends the notification loop and takes its request back. False when one of them lives on.
 [[nodiscard]] bool EndNotification(FWDeviceContext& context);
 
-/// Ends what runs over the device (both threads), closes it and frees what was kept for it. Sends
-/// no control request. False when a thread could not be ended: all it may use stays.
+/// Ends what runs over the device (both threads, calls under way), closes it and frees what was
+/// kept for it. Sends no control request. False when one of them could not be ended: all it may use
+/// stays.
 [[nodiscard]] bool CloseHeldDevice(FWDeviceContext& context);
 
 }  // namespace ZV

@@ -21,7 +21,7 @@ bool SetUpSlot(RequestRing& ring, std::uint32_t index) {
     slot.index = index;
     slot.active = 1;
     slot.buffer = static_cast<std::uint8_t*>(std::calloc(bytes, 1));
-    slot.device = ring.context->device;
+    slot.device = ring.context->device.Get();
     slot.mutex = ring.context->streamMutex;
     slot.overlapped = MakeOverlapped();
     slot.assembler = &ring.context->assembler;

@@ -3,11 +3,13 @@
 #include <atomic>
 #include <cstring>
 #include <string>
+#include <string_view>
 #include <thread>
 #include <vector>
 
 #include "hal/control_records.h"
 #include "hal/debug_output_file.h"
+#include "hal/fw_device_context.h"
 #include "hal/hal_world.h"
 #include "support/wait_until.h"
 
@@ -181,6 +183,62 @@ TEST_F(FWCameraIO, AReadThatNeverCompletesEndsWhenTheCameraGoesAway) {
     reader.join();
 
     EXPECT_EQ(HALReadFailed, status.load());
+}
+
+class AccessUnderWay : public FWCameraIO, public testing::WithParamInterface<const char*> {};
+
+TEST_P(AccessUnderWay, EndsWhenAnotherThreadClosesTheDevice) {
+    const bool isRead = std::string_view(GetParam()) == "FW_IOCTL_ASYNC_READ";
+    ASSERT_TRUE(mono.world.AddFault(std::string(R"({"kind":"neverComplete","code":")") +
+                                    GetParam() + R"("})"));
+    std::atomic<HALStatus> status{HALOk};
+    std::thread accessor([&, record = *camera]() mutable {
+        std::uint32_t data = 0;
+        status = isRead ? HAL_CameraReadData(&record, ScratchAddress, &data, 1)
+                        : HAL_CameraWriteData(&record, ScratchAddress, &data, 1);
+    });
+    ASSERT_TRUE(WaitUntil([&] { return mono.world.GetState().pendedRequests == 1; }));
+
+    // What a release does; a disconnect's requests would wait behind the write.
+    EXPECT_TRUE(CloseHeldDevice(*GetFWContext(*camera)));
+    accessor.join();
+
+    EXPECT_EQ(isRead ? HALReadFailed : HALStatus{995}, status.load());
+    EXPECT_EQ(0u, mono.world.GetState().openHandles);
+    std::uint32_t data = 0;
+    EXPECT_EQ(HALDeviceNotOpen, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+}
+
+INSTANTIATE_TEST_SUITE_P(Codes, AccessUnderWay,
+                         testing::Values("FW_IOCTL_ASYNC_READ", "FW_IOCTL_ASYNC_WRITE"));
+
+TEST_F(FWCameraIO, AccessesFromManyThreadsMeetAnOpenDeviceOrNone) {
+    std::atomic<bool> mayEnd{false};
+    std::atomic<std::uint32_t> strange{0};
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 3; ++i) {
+        threads.emplace_back([&, record = *camera]() mutable {
+            while (!mayEnd) {
+                std::uint32_t data = 0;
+                const HALStatus read = HAL_CameraReadData(&record, ScratchAddress, &data, 1);
+                if (read != HALOk && read != HALDeviceNotOpen && read != HALReadFailed) ++strange;
+                const HALStatus written = HAL_CameraWriteData(&record, ScratchAddress, &data, 1);
+                if (written != HALOk && written != HALDeviceNotOpen && written != HALWriteFailed &&
+                    written != 995) {
+                    ++strange;
+                }
+            }
+        });
+    }
+
+    for (int round = 0; round < 30; ++round) {
+        EXPECT_EQ(HALOk, HAL_CameraDisconnect(camera));
+        EXPECT_EQ(HALOk, ConnectPlain(camera, 100));
+    }
+    mayEnd = true;
+    for (std::thread& thread : threads) thread.join();
+
+    EXPECT_EQ(0u, strange.load());
 }
 
 TEST_F(FWCameraIO, AReadPassesByAWriteThatIsPended) {
