@@ -167,27 +167,34 @@ HALStatus FWCameraFreeBandwidth(HALCamera camera) {
     FWDeviceContext* const context = GetFWContext(camera);
     if (context == nullptr) return HALBandwidthNotFreed;
     std::uint64_t handle = context->bandwidthHandle;
-    const bool freed =
-        SendRecord(context->device, FW_IOCTL_FREE_BANDWIDTH, &handle, HandleRecordBytes);
-    return freed ? HALOk : HALBandwidthNotFreed;
+    if (!SendRecord(context->device, FW_IOCTL_FREE_BANDWIDTH, &handle, HandleRecordBytes)) {
+        return HALBandwidthNotFreed;
+    }
+    context->bandwidthHandle = 0;
+    return HALOk;
 }
 
 HALStatus FWCameraFreeChannel(HALCamera camera) {
     FWDeviceContext* const context = GetFWContext(camera);
     if (context == nullptr) return HALChannelNotFreed;
     std::uint32_t channel = context->channel;
-    const bool freed =
-        SendRecord(context->device, FW_IOCTL_FREE_CHANNEL, &channel, ChannelRecordBytes);
-    return freed ? HALOk : HALChannelNotFreed;
+    if (!SendRecord(context->device, FW_IOCTL_FREE_CHANNEL, &channel, ChannelRecordBytes)) {
+        return HALChannelNotFreed;
+    }
+    // The number may be another camera's from here on.
+    context->channel = AnyChannel;
+    return HALOk;
 }
 
 HALStatus FWCameraFreeResources(HALCamera camera) {
     FWDeviceContext* const context = GetFWContext(camera);
     if (context == nullptr) return HALResourcesNotFreed;
     std::uint64_t handle = context->resourceHandle;
-    const bool freed =
-        SendRecord(context->device, FW_IOCTL_FREE_RESOURCES, &handle, HandleRecordBytes);
-    return freed ? HALOk : HALResourcesNotFreed;
+    if (!SendRecord(context->device, FW_IOCTL_FREE_RESOURCES, &handle, HandleRecordBytes)) {
+        return HALResourcesNotFreed;
+    }
+    context->resourceHandle = 0;
+    return HALOk;
 }
 
 HALStatus FWCameraFastestPacketSizeSupported(HALCamera camera, std::uint16_t* bytes) {

@@ -181,6 +181,33 @@ TEST_P(FailedReservation, IsTheResultOfAReallocation) {
     EXPECT_EQ(1, camera->connected);
 }
 
+TEST_P(FailedReservation, OfAReallocationLeavesNothingThatADisconnectFreesTwice) {
+    ASSERT_EQ(HALOk, ConnectPlain(camera, 100));
+    ASSERT_TRUE(mono.world.AddFault(FailRequest(GetParam().code, GetParam().failures)));
+    (void)mono.TakeRequests();
+    ASSERT_EQ(GetParam().status, HAL_CameraReallocateBandwidth(camera, 200, 1));
+    const auto reallocated = mono.TakeRequests();
+
+    EXPECT_EQ(HALOk, HAL_CameraDisconnect(camera));
+
+    const auto freed = mono.TakeRequests();
+    ASSERT_EQ(4u, freed.size());
+    // What was granted anew is freed, and where nothing was the driver is told "none".
+    const auto granted = [&](std::uint32_t code, std::size_t offset, auto none) {
+        for (const TraceRecord& record : reallocated) {
+            if (record.code != code || record.error != 0) continue;
+            return GetWord<decltype(none)>(record.output, offset);
+        }
+        return none;
+    };
+    EXPECT_EQ(granted(FW_IOCTL_ALLOC_RESOURCES, 32, std::uint64_t{0}),
+              GetWord<std::uint64_t>(freed[0].input, 0));
+    EXPECT_EQ(granted(FW_IOCTL_ALLOC_CHANNEL, 4, AnyChannel),
+              GetWord<std::uint32_t>(freed[1].input, 0));
+    EXPECT_EQ(granted(FW_IOCTL_ALLOC_BANDWIDTH, 8, std::uint64_t{0}),
+              GetWord<std::uint64_t>(freed[2].input, 0));
+}
+
 INSTANTIATE_TEST_SUITE_P(
     Codes, FailedReservation,
     testing::Values(FailedRequest{"FW_IOCTL_ALLOC_BANDWIDTH", HALBandwidthNotAllocated, 1},
