@@ -6,6 +6,7 @@
 #include "hal/control_records.h"
 #include "hal/fw_camera_records.h"
 #include "hal/fw_device_context.h"
+#include "hal/platform/clock.h"
 
 namespace ZV {
 namespace {
@@ -26,6 +27,15 @@ bool SetUpSlot(RequestRing& ring, std::uint32_t index) {
     slot.overlapped = MakeOverlapped();
     slot.assembler = &ring.context->assembler;
     return slot.buffer != nullptr && slot.overlapped != nullptr;
+}
+
+bool EndRequestUntil(PlatformDevice* device, PlatformOverlapped* overlapped,
+                     std::uint64_t deadlineMs) {
+    if (!IsOverlappedPending(overlapped)) return true;
+    CancelOverlapped(device, overlapped);
+    const std::uint64_t now = GetWaitClockMs();
+    (void)WaitForCompletion(device, overlapped, now < deadlineMs ? deadlineMs - now : 0);
+    return !IsOverlappedPending(overlapped);
 }
 
 std::uint32_t ReadPacketLength(const std::uint8_t* packet) {
@@ -71,17 +81,16 @@ void ParseRequest(const RequestRing& ring, const IsochRequestSlot& slot) {
 }
 
 bool EndRequest(PlatformDevice* device, PlatformOverlapped* overlapped) {
-    if (!IsOverlappedPending(overlapped)) return true;
-    CancelOverlapped(device, overlapped);
-    (void)WaitForCompletion(device, overlapped, RequestEndTimeoutMs);
-    return !IsOverlappedPending(overlapped);
+    return EndRequestUntil(device, overlapped, GetWaitClockMs() + RequestEndTimeoutMs);
 }
 
 bool EndRequests(RequestRing& ring) {
+    PlatformDevice* const device = ring.requests.front().device;
+    const std::uint64_t deadlineMs = GetWaitClockMs() + RequestEndTimeoutMs;
     for (IsochRequestSlot& slot : ring.requests) {
-        if (!EndRequest(slot.device, slot.overlapped)) return false;
+        if (!EndRequestUntil(device, slot.overlapped, deadlineMs)) return false;
     }
-    return EndRequest(ring.requests.front().device, ring.enterOverlapped);
+    return EndRequestUntil(device, ring.enterOverlapped, deadlineMs);
 }
 
 bool IsRingPending(const RequestRing& ring) {

@@ -54,8 +54,8 @@ void ParseRequest(const RequestRing& ring, const IsochRequestSlot& slot);
 /// clock. False when it has not ended.
 [[nodiscard]] bool EndRequest(PlatformDevice* device, PlatformOverlapped* overlapped);
 
-/// Takes back what is still pended and waits for its end as EndRequest does. False at the first one
-/// that has not ended.
+/// Takes back what is still pended and waits for its end, at most a second of the wait clock for
+/// the whole set. False at the first one that has not ended.
 [[nodiscard]] bool EndRequests(RequestRing& ring);
 
 [[nodiscard]] bool IsRingPending(const RequestRing& ring);

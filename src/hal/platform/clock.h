@@ -14,6 +14,10 @@ void SetWaitClockDivisor(std::uint32_t divisor);
 /// for a limit that is not 0. `WaitForEver` stays what it is.
 std::uint64_t GetRealWaitMs(std::uint64_t timeoutMs);
 
+/// Milliseconds that the wait clock has run. Its differences measure limited waits; a change of the
+/// divisor makes it jump.
+std::uint64_t GetWaitClockMs();
+
 /// Microseconds of a clock that never goes back.
 std::uint64_t GetMonotonicMicroseconds();
 

@@ -43,4 +43,9 @@ std::uint64_t GetRealWaitMs(std::uint64_t timeoutMs) {
     return (timeoutMs - 1) / GetDivisor() + 1;
 }
 
+std::uint64_t GetWaitClockMs() {
+    constexpr std::uint64_t MicrosecondsPerMillisecond = 1000;
+    return GetMonotonicMicroseconds() * GetDivisor() / MicrosecondsPerMillisecond;
+}
+
 }  // namespace ZV

@@ -50,6 +50,17 @@ TEST_F(WaitClock, TakesADivisorOfZeroAsOne) {
     EXPECT_EQ(GetRealWaitMs(7), 7u);
 }
 
+TEST_F(WaitClock, RunsOnFasterByItsDivisor) {
+    SetWaitClockDivisor(1000);
+    const std::uint64_t before = GetMonotonicMicroseconds();
+    const std::uint64_t start = GetWaitClockMs();
+    while (GetWaitClockMs() < start + 2000) continue;
+
+    EXPECT_GE(GetMonotonicMicroseconds() - before, 1999u);
+    SetWaitClockDivisor(1);
+    EXPECT_LE(GetWaitClockMs(), GetMonotonicMicroseconds() / 1000);
+}
+
 TEST_F(WaitClock, HoldsLimitsBeyond32Bits) {
     SetWaitClockDivisor(10);
 
