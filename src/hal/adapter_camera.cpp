@@ -73,7 +73,7 @@ std::uint32_t ReadPacketsPerRequest() {
     SettingsStore* const store = OpenSettingsStore();
     if (store != nullptr) (void)ReadStoredNumber(store, "MaxPacketsPerRequest", &packets);
     CloseSettingsStore(store);
-    return packets;
+    return std::min(packets, AdapterPacketsPerRequestMax);
 }
 
 bool MakeRing(AdapterContext& context) {

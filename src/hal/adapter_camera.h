@@ -26,6 +26,8 @@ inline constexpr std::uint32_t AdapterRequestCount = 10;
 inline constexpr std::uint32_t AdapterPacketBytesMin = 9;
 inline constexpr std::uint32_t AdapterPacketBytesMax = 9200;
 inline constexpr std::uint32_t AdapterPacketsPerRequestDefault = 100;
+/// An eighth of a second of the bus; a stored number above it counts as this one.
+inline constexpr std::uint32_t AdapterPacketsPerRequestMax = 1000;
 /// Length of the wait for a silent source before `timedOut` is called, in milliseconds of the wait
 /// clock.
 inline constexpr std::uint64_t AdapterSilenceMs = 1000;

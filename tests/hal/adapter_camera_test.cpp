@@ -17,6 +17,8 @@
 #include "hal/open_camera_table.h"
 #include "hal/stream_format.h"
 #include "hal/table_lock.h"
+#include "support/scoped_variable.h"
+#include "support/temporary_folder.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
@@ -65,6 +67,22 @@ struct AdapterCamera : testing::Test {
             record, payloadBytes, getFrame, getFrame,
             [](void* context) { ++static_cast<AdapterCamera*>(context)->images; }, nullptr,
             [](void* context) { ++static_cast<AdapterCamera*>(context)->silences; }, this);
+    }
+
+    /// Bytes that a request offers to the source while `stored` packets are stored.
+    std::uint32_t GetCapacityWith(const char* stored) {
+        const TemporaryFolder folder;
+        const auto path = folder.GetPath("settings");
+        std::ofstream(path) << "MaxPacketsPerRequest = " << stored << "\n";
+        const ScopedVariable config("ZENTARA_CONFIG", path.c_str());
+        OnePacket source;
+        source.isSent = true;
+        SetAdapterPacketSource({OnePacket::Get, &source});
+        EXPECT_EQ(HALOk, Connect(&camera));
+        EXPECT_EQ(HALOk, HAL_CameraStartStreaming(&camera, 0, 1, nullptr));
+        EXPECT_TRUE(WaitUntil([&] { return source.capacity != 0; }));
+        EXPECT_EQ(HALOk, HAL_CameraDisconnect(&camera));
+        return source.capacity;
     }
 
     TableLock lock;
@@ -184,21 +202,20 @@ TEST_F(AdapterCamera, ABufferHoldsTheStoredNumberOfPacketsOrAHundred) {
     EXPECT_EQ(112ull * 100 + 32, GetAdapterRequestBytes(100, AdapterPacketsPerRequestDefault));
     EXPECT_EQ(116ull * 7 + 32, GetAdapterRequestBytes(101, 7));
 
-    const auto path = std::filesystem::temp_directory_path() /
-                      ("zentara-" + std::to_string(reinterpret_cast<std::uintptr_t>(this)));
-    std::ofstream(path) << "MaxPacketsPerRequest = 1\n";
-    setenv("ZENTARA_CONFIG", path.c_str(), 1);
-    OnePacket source;
-    SetAdapterPacketSource({OnePacket::Get, &source});
-    ASSERT_EQ(HALOk, Connect(&camera));
+    EXPECT_EQ(112u + 32, GetCapacityWith("1"));
+    EXPECT_EQ(112u * 7 + 32, GetCapacityWith("7"));
+}
 
-    ASSERT_EQ(HALOk, HAL_CameraStartStreaming(&camera, 0, 1, nullptr));
-    EXPECT_TRUE(WaitUntil([&] { return images == 1; }));
-    EXPECT_EQ(HALOk, HAL_CameraStopStreaming(&camera, 0));
+TEST_F(AdapterCamera, AStoredNumberOfPacketsIsLimitedSoThatNoBufferTakesAllMemory) {
+    for (const char* stored : {"1001", "4294967295"}) {
+        EXPECT_EQ(AdapterPacketBytesMax, GetCapacityWith(stored));
+    }
+    EXPECT_EQ(1000u, AdapterPacketsPerRequestMax);
+    EXPECT_LE(GetAdapterRequestBytes(0xFFFF, AdapterPacketsPerRequestMax), 66'000'000u);
+}
 
-    EXPECT_EQ(112u + 32, source.capacity);
-    unsetenv("ZENTARA_CONFIG");
-    std::filesystem::remove(path);
+TEST_F(AdapterCamera, WithNoPacketStoredABufferHasItsSpareBytesAlone) {
+    EXPECT_EQ(32u, GetCapacityWith("0"));
 }
 
 TEST_F(AdapterCamera, TheWaitForAFrameEndsAtTheDisconnect) {
