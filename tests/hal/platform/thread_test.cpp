@@ -111,6 +111,20 @@ TEST_F(GatedThread, HasAnIdentifierThatTellsItFromOthers) {
     CloseThread(thread);
 }
 
+TEST_F(GatedThread, ThatStaysElsewhereIsNotEndedAfterASecondAndStaysTheCallers) {
+    PlatformThread* thread = StartThread(Run, this);
+    const std::uint64_t start = GetMonotonicMicroseconds();
+
+    EXPECT_FALSE(EndThread(thread));
+
+    EXPECT_GE(GetMonotonicMicroseconds() - start, 1'000'000u);
+    EXPECT_FALSE(hasReturned.load());
+    (void)SignalEvent(gate);
+    EXPECT_EQ(WaitForThread(thread, WaitForEver), WaitOutcome::Signalled);
+    EXPECT_TRUE(EndThread(thread));
+    CloseThread(thread);
+}
+
 TEST(EndedThread, IsEndedAtOnceAndKeepsItsHandle) {
     PlatformThread* thread = StartThread([](void*) {}, nullptr);
     (void)WaitForThread(thread, WaitForEver);

@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <atomic>
+#include <chrono>
 #include <condition_variable>
 #include <mutex>
 #include <new>
@@ -39,6 +40,8 @@ struct PlatformThread {
 namespace {
 
 constexpr int RoundRobinPriority = 1;
+/// Real time: a thread that is on its way out needs it however fast the waits run.
+constexpr std::chrono::seconds Grace{1};
 
 thread_local PlatformThread* ownThread = nullptr;
 
@@ -116,7 +119,13 @@ bool EndThread(PlatformThread* thread) {
         return false;
     }
     thread->end.Request();
-    return WaitForThread(thread, WaitForEver) == WaitOutcome::Signalled;
+    std::unique_lock lock(thread->mutex);
+    if (!thread->changed.wait_for(lock, Grace, [thread] { return thread->hasEnded; })) {
+        SetLastPlatformError(PlatformErrorBusy);
+        return false;
+    }
+    JoinOnce(thread);
+    return true;
 }
 
 void CloseThread(PlatformThread* thread) {
