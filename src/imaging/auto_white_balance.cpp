@@ -22,19 +22,28 @@ void BuildLevels(float scale, std::span<std::int32_t> levels) {
     }
 }
 
-void BuildTable(float scale, ZAutoWhiteBalance::ScaleTable& table) {
-    table.scale.store(scale, std::memory_order_relaxed);
-    BuildLevels(scale, table.levels8);
-    BuildLevels(scale, table.levels16);
-}
-
 }  // namespace
 
-ZAutoWhiteBalance::ZAutoWhiteBalance(bool calculate) : calculateValuesOnAllFrames(calculate) {
-    BuildTable(StartRedScale, red);
-    BuildTable(StartGreenScale, green);
-    BuildTable(StartBlueScale, blue);
+std::shared_ptr<const ZAutoWhiteBalance::ScaleTable> ZAutoWhiteBalance::ColourScale::GetTable()
+    const {
+    const std::lock_guard hold(leafMutex);
+    return table;
 }
+
+void ZAutoWhiteBalance::ColourScale::Set(float newScale) {
+    const auto built = std::make_shared<ScaleTable>();
+    BuildLevels(newScale, built->levels8);
+    BuildLevels(newScale, built->levels16);
+    const std::lock_guard hold(leafMutex);
+    scale.store(newScale, std::memory_order_relaxed);
+    table = built;
+}
+
+ZAutoWhiteBalance::ZAutoWhiteBalance(bool calculate)
+    : calculateValuesOnAllFrames(calculate),
+      red(StartRedScale),
+      green(StartGreenScale),
+      blue(StartBlueScale) {}
 
 ZAutoWhiteBalance::~ZAutoWhiteBalance() = default;
 
@@ -51,27 +60,27 @@ FilterResult ZAutoWhiteBalance::SetOutputFormat(std::uint32_t) {
 }
 
 float ZAutoWhiteBalance::GetRedScale() const {
-    return red.scale.load(std::memory_order_relaxed);
+    return red.GetScale();
 }
 
 float ZAutoWhiteBalance::GetGreenScale() const {
-    return green.scale.load(std::memory_order_relaxed);
+    return green.GetScale();
 }
 
 float ZAutoWhiteBalance::GetBlueScale() const {
-    return blue.scale.load(std::memory_order_relaxed);
+    return blue.GetScale();
 }
 
 void ZAutoWhiteBalance::SetRedScale(float scale) {
-    BuildTable(scale, red);
+    red.Set(scale);
 }
 
 void ZAutoWhiteBalance::SetGreenScale(float scale) {
-    BuildTable(scale, green);
+    green.Set(scale);
 }
 
 void ZAutoWhiteBalance::SetBlueScale(float scale) {
-    BuildTable(scale, blue);
+    blue.Set(scale);
 }
 
 void ZAutoWhiteBalance::SetCalculateValuesOnAllFrames(bool on) {

@@ -2,10 +2,12 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <bit>
 #include <cmath>
 #include <limits>
 #include <memory>
+#include <thread>
 
 #include "imaging/auto_exposure.h"
 #include "imaging/auto_white_balance.h"
@@ -102,7 +104,7 @@ TEST(RGBFilterWheel, MayBeDisabledEnabledAndResetInAnyOrder) {
 std::int32_t Level8(float scale, std::size_t level) {
     const auto filter = std::make_unique<ZAutoWhiteBalance>(false);
     filter->SetGreenScale(scale);
-    return filter->GetGreenTable().levels8[level];
+    return filter->GetGreenTable()->levels8[level];
 }
 
 TEST(AutoWhiteBalance, StartsWithTheScalesOfItsMakers) {
@@ -135,7 +137,8 @@ TEST(AutoWhiteBalance, AProductThatIsNoNumberGivesTheTopLevel) {
 
 TEST(AutoWhiteBalance, AScaleOf1IsTheIdentityOf16Bits) {
     const auto filter = std::make_unique<ZAutoWhiteBalance>(false);
-    const auto& levels = filter->GetGreenTable().levels16;
+    const auto table = filter->GetGreenTable();
+    const auto& levels = table->levels16;
     for (std::size_t level = 0; level < levels.size(); ++level) {
         ASSERT_EQ(levels[level], static_cast<std::int32_t>(level));
     }
@@ -148,14 +151,38 @@ TEST(AutoWhiteBalance, EachScaleBuildsTheTablesOfItsColourAlone) {
     filter->SetBlueScale(0.25F);
     filter->SetCalculateValuesOnAllFrames(false);
 
-    EXPECT_EQ(filter->GetRedTable().levels8[100], 200);
-    EXPECT_EQ(filter->GetRedTable().levels16[40000], 65535);
-    EXPECT_EQ(filter->GetGreenTable().levels16[40000], 40000);
-    EXPECT_EQ(filter->GetBlueTable().levels16[40000], 10000);
+    EXPECT_EQ(filter->GetRedTable()->levels8[100], 200);
+    EXPECT_EQ(filter->GetRedTable()->levels16[40000], 65535);
+    EXPECT_EQ(filter->GetGreenTable()->levels16[40000], 40000);
+    EXPECT_EQ(filter->GetBlueTable()->levels16[40000], 10000);
     EXPECT_EQ(filter->GetRedScale(), 2.0F);
     EXPECT_EQ(filter->GetBlueScale(), 0.25F);
     EXPECT_EQ(filter->Init(1, 1), FilterDone);
     EXPECT_EQ(filter->SetOutputFormat(99), FilterDone);
+}
+
+TEST(AutoWhiteBalance, TablesThatAreHeldStayWholeWhileTheScaleIsSetAnew) {
+    const auto filter = std::make_unique<ZAutoWhiteBalance>(false);
+    filter->SetRedScale(0.25F);
+    const auto held = filter->GetRedTable();
+    std::atomic<bool> mayEnd{false};
+    std::thread setter([&] {
+        while (!mayEnd) {
+            filter->SetRedScale(0.5F);
+            filter->SetRedScale(0.25F);
+        }
+    });
+
+    for (int round = 0; round < 200; ++round) {
+        const auto table = filter->GetRedTable();
+        const std::int32_t top = table->levels8.back();
+        EXPECT_EQ(table->levels16[1000], top == 127 ? 500 : 250) << "of one and the same scale";
+        EXPECT_EQ(table->levels16.back(), top == 127 ? 32767 : 16383);
+    }
+    mayEnd = true;
+    setter.join();
+
+    EXPECT_EQ(held->levels8[100], 25);
 }
 
 TEST(AutoExposure, MeasuresTheWholeSensorFromInitOn) {
