@@ -5,10 +5,12 @@
 // has the bus thread of the HAL besides, which asks for frames (frame_supply.cpp). CloseCamera
 // stops the stream, takes the two threads' reasons to run away, wakes them and waits: for the run
 // loop without limit, since it may sit in a client's callback, for the expose thread five seconds.
-// Each thread counts itself out as the last thing it does; a camera is deleted only when none is
-// left.
+// An expose thread that outlasts them ends by itself when its callback returns, also if the camera
+// has been opened again and has another one by then. Each thread counts itself out as the last
+// thing it does; a camera is deleted only when none is left.
 
 #include <cstdio>
+#include <mutex>
 
 #include "camera/morvane_fw_camera.h"
 #include "hal/fw_camera.h"
@@ -104,7 +106,9 @@ HALStatus MorvaneFWCamera::WaitForCloseOfRunLoop() {
     return HAL_SemaphoreWait(streaming.closeLock);
 }
 
+/// Beside an exposure callback that lasts: what it has begun to start or stop is done first.
 HALStatus MorvaneFWCamera::Disconnect() {
+    const std::lock_guard hold(streaming.switchMutex);
     HALCamera record = GetHALCamera();
     const HALStatus status = HAL_CameraDisconnect(&record);
     SetHALCamera(record);
@@ -136,16 +140,19 @@ HALStatus MorvaneFWCamera::StartRunLoop() {
 void MorvaneFWCamera::StartExposeDoneThread() {
     (void)HAL_ThreadCleanup(streaming.exposeDoneThread, ThreadEndMs);  // as above
     streaming.exposeDoneThread = nullptr;
+    streaming.exposeThreadsMade.fetch_add(1);
     streaming.exposeDoneActive = true;
     streaming.exposeThreadsAlive.fetch_add(1);
     const auto entry = [](void* argument) -> void* {
         MorvaneFWCamera& camera = GetCamera(argument);
-        camera.PrivateRunExposeDoneCB();
+        camera.RunExposeThread(camera.streaming.exposeThreadsBegun.fetch_add(1) + 1);
         camera.streaming.exposeThreadsAlive.fetch_sub(1, std::memory_order_release);
         return nullptr;
     };
     (void)HAL_ThreadCreate(entry, this, &streaming.exposeDoneThread);  // kept: not looked at
-    if (!IsHALThreadStarted(streaming.exposeDoneThread)) streaming.exposeThreadsAlive.fetch_sub(1);
+    if (IsHALThreadStarted(streaming.exposeDoneThread)) return;
+    streaming.exposeThreadsMade.fetch_sub(1);
+    streaming.exposeThreadsAlive.fetch_sub(1);
 }
 
 void MorvaneFWCamera::EndThreads() {

@@ -170,12 +170,25 @@ void MorvaneFWCamera::DeliverImage(ZExImage* image) {
 }
 
 void MorvaneFWCamera::PrivateRunExposeDoneCB() {
-    while (streaming.exposeDoneActive) RunShielded(&MorvaneFWCamera::ServeExposeDone);
+    RunExposeThread(streaming.exposeThreadsMade);
+}
+
+/// `number` tells the threads of one camera apart, in the order in which they begin: only as many
+/// as have been made begin, so that the last number is always somebody's.
+void MorvaneFWCamera::RunExposeThread(std::uint32_t number) {
+    const auto isLast = [&] { return number == streaming.exposeThreadsMade.load(); };
+    while (streaming.exposeDoneActive && isLast()) {
+        (void)HAL_ConditionWait(streaming.exposeDoneCondition);  // kept: not looked at
+        if (!isLast()) {
+            (void)HAL_ConditionSignal(streaming.exposeDoneCondition);  // it is for the last one
+            return;
+        }
+        (void)HAL_ConditionReset(streaming.exposeDoneCondition);  // cannot fail
+        RunShielded(&MorvaneFWCamera::ServeExposeDone);
+    }
 }
 
 void MorvaneFWCamera::ServeExposeDone() {
-    (void)HAL_ConditionWait(streaming.exposeDoneCondition);   // kept: not looked at
-    (void)HAL_ConditionReset(streaming.exposeDoneCondition);  // cannot fail
     const StreamCallbacks callbacks = streaming.callbacks.Get();
     if (callbacks.exposeDone == nullptr) return;
     (void)callbacks.exposeDone(callbacks.refCon);  // its result has no reader

@@ -396,6 +396,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     /// Takes or gives a lock; a failure prints HAL_ErrorMessage and is translated.
     static CameraResult TakeLock(HALSemaphore* lock);
     static CameraResult GiveLock(HALSemaphore* lock);
+    /// What GetOneImage hands to its limited wait: five seconds and the exposures, in nanoseconds.
+    std::uint64_t CalculateOneImageWait();
     /// Marks every frame of the queue, so that the run loop discards it. Under frameLock.
     void IgnoreFrameInfoVector();
 
@@ -476,13 +478,13 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     ZExImage* MakeImage(tStFrameInfo& frame);
     std::uint32_t ChooseImageFormat();
     void DeliverImage(ZExImage* image);
+    void RunExposeThread(std::uint32_t number);
     void ServeExposeDone();
     void RunShielded(void (MorvaneFWCamera::*step)());
 
     HALStatus ForgetOneImage();
     ZExImage* ClaimOneImage();
     CameraResult AwaitOneImage();
-    std::uint64_t CalculateOneImageWait();
     static void* TakeOneImage(ZImageReceivedCallbackStruct* record);
 
     mutable std::mutex recordMutex;

@@ -70,6 +70,9 @@ struct StreamingState {
     /// release there, acquire where its end is waited for.
     std::atomic<int> runLoopsAlive{0};
     std::atomic<int> exposeThreadsAlive{0};
+    /// Expose threads made and begun since the camera was. One that outlives its close, in a
+    /// client's callback, is not the last one made any more and serves nothing after it.
+    std::atomic<std::uint32_t> exposeThreadsMade{0}, exposeThreadsBegun{0};
     std::atomic<std::uint32_t> arrivals{0};  ///< Raised before each signal to the run loop.
     std::uint32_t seenArrivals = 0;          ///< Bound to the run loop.
     std::uint32_t lastImageFormat = 0;       ///< Bound to the run loop; 0 before the first frame.

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "camera/test_camera.h"
+#include "hal/platform/clock.h"
 #include "imaging/ex_image.h"
 
 namespace ZV::Test {
@@ -126,6 +127,82 @@ TEST_F(OneClosedCamera, WaitsAtItsCloseForAClientInItsCallback) {
     closer.join();
 
     EXPECT_TRUE(isClosed);
+}
+
+/// A client whose first exposure callback stays inside until the test lets it go.
+struct SlowClient {
+    std::atomic<std::uint32_t> begun{0}, ended{0};
+    std::atomic<bool> mayLeave{false};
+
+    static void* ExposeDone(void* refCon) {
+        auto& client = *static_cast<SlowClient*>(refCon);
+        if (client.begun.fetch_add(1) == 0) {
+            EXPECT_TRUE(WaitUntil([&] { return client.mayLeave.load(); }));
+        }
+        ++client.ended;
+        return nullptr;
+    }
+};
+
+class OneSlowClient : public OneClosedCamera {
+  protected:
+    void SetUp() override {
+        OneClosedCamera::SetUp();
+        ASSERT_EQ(CameraOk, camera->OpenCamera());
+        EndExposure();
+        ASSERT_TRUE(WaitUntil([&] { return client.begun == 1; }));
+        SetWaitClockDivisor(1000);
+        EXPECT_EQ(CameraOk, camera->CloseCamera()) << "waits five seconds, and not for ever";
+        SetWaitClockDivisor(1);
+    }
+    void EndExposure() {
+        camera->streaming.callbacks.Set({nullptr, SlowClient::ExposeDone, &client});
+        ASSERT_EQ(HALOk, HAL_ConditionSignal(camera->streaming.exposeDoneCondition));
+    }
+
+    SlowClient client;
+};
+
+TEST_F(OneSlowClient, ACameraIsClosedUnderAnExposureCallbackThatLasts) {
+    EXPECT_FALSE(camera->IsCameraOpen());
+    EXPECT_EQ(0u, world.GetState().openHandles);
+    EXPECT_EQ(0u, client.ended);
+    EXPECT_TRUE(camera->HasLivingThreads());
+
+    client.mayLeave = true;
+
+    EXPECT_TRUE(WaitUntil([&] { return !camera->HasLivingThreads(); }));
+    EXPECT_EQ(1u, client.ended);
+}
+
+TEST_F(OneSlowClient, ACameraOpenedAgainHasOneExposeThreadWhenTheOldCallbackReturns) {
+    ASSERT_EQ(CameraOk, camera->OpenCamera());
+    EndExposure();
+    EXPECT_TRUE(WaitUntil([&] { return client.ended == 1; })) << "beside the old one";
+    EXPECT_EQ(2, camera->streaming.exposeThreadsAlive);
+
+    client.mayLeave = true;
+
+    EXPECT_TRUE(WaitUntil([&] { return camera->streaming.exposeThreadsAlive == 1; }));
+    EndExposure();
+    EXPECT_TRUE(WaitUntil([&] { return client.ended == 3; }));
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
+    EXPECT_FALSE(camera->HasLivingThreads());
+}
+
+TEST_F(OneSlowClient, ACameraDeletedUnderAnExposureCallbackWaitsForIt) {
+    ASSERT_EQ(CameraOk, camera->OpenCamera());
+    std::atomic<bool> isDeleted{false};
+    std::thread deleting([&] {
+        camera.reset();
+        isDeleted = true;
+    });
+    EXPECT_FALSE(WaitUntil([&] { return isDeleted.load(); }, std::chrono::milliseconds(50)));
+
+    client.mayLeave = true;
+    deleting.join();
+
+    EXPECT_EQ(1u, client.ended);
 }
 
 TEST(CameraTakenByAnother, ReadsAsOpenAndIsRefused) {
