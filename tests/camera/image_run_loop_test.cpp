@@ -102,6 +102,27 @@ TEST_F(CameraWithARunLoop, DropsAFrameOfAFormerSizeWithoutAWord) {
     EXPECT_EQ(32u, client.GetDeliveries()[0].width);
 }
 
+TEST_F(CameraWithARunLoop, DropsAFrameWhoseRecordDoesNotDescribeItsOwnBuffer) {
+    using Change = void (*)(tStFrameInfo&);
+    const Change changes[] = {[](tStFrameInfo& frame) { frame.width = 128; },
+                              [](tStFrameInfo& frame) { frame.height = 1; },
+                              [](tStFrameInfo& frame) { frame.bitDepth = 16; },
+                              [](tStFrameInfo& frame) { frame.width = frame.height = 0xFFFFFFFF; }};
+    for (const Change change : changes) {
+        tStFrameInfo* frame = camera->PrivatePeekNewFrame();
+        ASSERT_NE(nullptr, frame);
+        change(*frame);
+        frame->isHeld.store(false, std::memory_order_release);
+        camera->PrivateImageHasArrived();
+        ASSERT_TRUE(AwaitEmptyQueue());
+    }
+
+    Bring();
+
+    ASSERT_TRUE(AwaitImages(1));
+    EXPECT_EQ(64u, client.GetDeliveries()[0].width);
+}
+
 TEST_F(CameraWithARunLoop, NeverServesAFrameThatIsBeingFilled) {
     tStFrameInfo* held = camera->PrivatePeekNewFrame();
     ASSERT_NE(nullptr, held);
