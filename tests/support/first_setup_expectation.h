@@ -1,34 +1,15 @@
 #pragma once
 
 #include <cstdint>
-#include <string>
-#include <string_view>
 #include <vector>
+
+#include "support/expected_registers.h"
 
 namespace ZV::Test {
 
-/// A camera before it is listed, as the first setup finds it.
-struct CameraContents {
-    std::string_view className;  ///< Of the model, such as "SolvaneG2".
-    std::uint32_t configurationVersion = 0, controlVersion = 0;  ///< Version words.
-    std::vector<std::uint32_t> configuration;  ///< At least as long as the version's block.
-    /// What the camera reports once the first take-over has happened; empty: the same.
-    std::vector<std::uint32_t> configurationAfterTakeOver;
-    std::uint32_t position = 0;  ///< Among the devices that the bus lists.
-};
-
-enum class SetupBlock { Control, Command };
-
-/// A quadlet write of the first setup.
-struct ExpectedWrite {
-    std::string step;  ///< The call that causes it, such as "SetROIX(1)".
-    SetupBlock block = SetupBlock::Control;
-    std::uint32_t quadlet = 0;
-    std::uint32_t value = 0;
-};
-
 struct ExpectedSetup {
     std::vector<ExpectedWrite> writes;  ///< In bus order.
+    std::vector<std::uint32_t> shadow;  ///< Of the control block, afterwards.
     bool isRefused = false;             ///< A step failed, and the setup ended with it.
 };
 
