@@ -6,6 +6,7 @@
 
 #include "support/expect_zerr.h"
 #include "support/first_setup_expectation.h"
+#include "support/peeked_camera.h"
 #include "support/simulation_world.h"
 #include "zentara/zentara.h"
 
@@ -13,9 +14,6 @@
 // calculated from the camera's configuration without the library.
 namespace ZV::Test {
 namespace {
-
-constexpr std::uint32_t DirectoryAddress = 0xD0000000;
-constexpr std::uint32_t ConfigurationQuadlets = 256;
 
 struct SetupCase {
     const char* name;
@@ -35,14 +33,11 @@ std::string NameCase(const testing::TestParamInfo<SetupCase>& info) {
 class UnlistedCamera {
   public:
     explicit UnlistedCamera(const SetupCase& setup, std::uint32_t position = 0)
-        : world(setup.scenario), isLoaded(Zentara_LoadDriver() == zerrNone) {
-        isStarted = world.Start();
-        contents.className = setup.className;
-        contents.position = position;
-        contents.configurationVersion = Peek(FindBlock(2));
-        contents.controlVersion = Peek(FindBlock(4));
-        contents.configuration = ReadConfiguration();
-    }
+        : world(setup.scenario),
+          isLoaded(Zentara_LoadDriver() == zerrNone),
+          isStarted(world.Start()),
+          registers(world, setup.className, position),
+          contents(registers.ReadContents()) {}
     ~UnlistedCamera() {
         if (isLoaded) Zentara_ReleaseDriver();
     }
@@ -50,6 +45,7 @@ class UnlistedCamera {
     UnlistedCamera& operator=(const UnlistedCamera&) = delete;
 
     bool IsReady() const { return isLoaded && isStarted; }
+    const PeekedCamera& GetRegisters() const { return registers; }
 
     /// Number of cameras in the list.
     std::uint32_t List(ZentaraResult expected = zerrNone) const {
@@ -61,85 +57,23 @@ class UnlistedCamera {
 
     ExpectedSetup CalculateSetup() const {
         CameraContents calculated = contents;
-        calculated.configurationAfterTakeOver = ReadConfiguration();
+        calculated.configurationAfterTakeOver = registers.ReadConfiguration();
         return CalculateFirstSetup(calculated);
     }
-    std::vector<RegisterWrite> ReadWrites() const {
-        return world.ReadRegisterWrites(contents.position);
-    }
-    std::uint32_t GetAddress(const ExpectedWrite& write) const {
-        return FindBlock(write.block == SetupBlock::Control ? 4 : 6) + 4 * write.quadlet;
-    }
-    std::uint32_t Peek(std::uint32_t address) const {
-        return world.Peek(address, contents.position);
-    }
-    /// An address as "control[3]".
-    std::string DescribeAddress(std::uint32_t address) const;
 
   private:
-    std::uint32_t FindBlock(std::uint32_t directoryQuadlet) const {
-        return Peek(DirectoryAddress + 4 * directoryQuadlet);
-    }
-    std::vector<std::uint32_t> ReadConfiguration() const {
-        std::vector<std::uint32_t> quadlets;
-        const std::uint32_t address = FindBlock(2);
-        for (std::uint32_t i = 0; i < ConfigurationQuadlets; ++i) {
-            quadlets.push_back(Peek(address + 4 * i));
-        }
-        return quadlets;
-    }
-
     SimulationWorld world;
-    bool isLoaded = false, isStarted = false;
+    bool isLoaded, isStarted;
+    PeekedCamera registers;
     CameraContents contents;
 };
 
-std::string FormatHex(std::uint32_t value) {
-    char text[16];
-    std::snprintf(text, sizeof text, "0x%08X", static_cast<unsigned>(value));
-    return text;
-}
-
-std::string UnlistedCamera::DescribeAddress(std::uint32_t address) const {
-    constexpr std::pair<const char*, std::uint32_t> Blocks[] = {
-        {"configuration", 2}, {"control", 4}, {"command", 6}, {"status", 8}, {"stream", 10}};
-    for (const auto& [name, quadlet] : Blocks) {
-        const std::uint32_t start = FindBlock(quadlet);
-        if (address < start || address >= start + 4 * ConfigurationQuadlets) continue;
-        return std::string(name) + "[" + std::to_string((address - start) / 4) + "]";
-    }
-    return FormatHex(address);
-}
-
-std::string DescribeWrite(const UnlistedCamera& camera, const RegisterWrite& write) {
-    std::string text = camera.DescribeAddress(write.address) + " =";
-    for (const std::uint32_t value : write.values) text += " " + FormatHex(value);
-    return write.error == 0 ? text : text + ", error " + std::to_string(write.error);
-}
-
-std::string DescribeExpected(const UnlistedCamera& camera, const ExpectedWrite& write) {
-    return write.step + ": " + camera.DescribeAddress(camera.GetAddress(write)) + " = " +
-           FormatHex(write.value);
-}
-
-/// The writes of `times` setups, one after the other. A failure tells the first difference.
+/// The writes of `times` setups, one after the other.
 testing::AssertionResult AreAsExpected(const UnlistedCamera& camera, std::size_t times = 1) {
-    const std::vector<ExpectedWrite> expected = camera.CalculateSetup().writes;
-    const std::vector<RegisterWrite> got = camera.ReadWrites();
-    const std::size_t count = expected.size() * times;
-    for (std::size_t i = 0; i < std::max(count, got.size()); ++i) {
-        const std::string wanted =
-            i < count ? DescribeExpected(camera, expected[i % expected.size()]) : "nothing";
-        if (i < count && i < got.size()) {
-            const ExpectedWrite& write = expected[i % expected.size()];
-            if (got[i] == RegisterWrite{camera.GetAddress(write), {write.value}, 0}) continue;
-        }
-        return testing::AssertionFailure()
-               << "write " << i << " of " << got.size() << " (expected " << count << ")\n"
-               << "  expected " << wanted << "\n  got      "
-               << (i < got.size() ? DescribeWrite(camera, got[i]) : "nothing");
-    }
-    return testing::AssertionSuccess() << count << " writes";
+    const std::vector<ExpectedWrite> once = camera.CalculateSetup().writes;
+    std::vector<ExpectedWrite> expected;
+    for (; times > 0; --times) expected.insert(expected.end(), once.begin(), once.end());
+    return camera.GetRegisters().HasWritten(expected);
 }
 
 class FirstSetup : public testing::TestWithParam<SetupCase> {};
@@ -185,10 +119,12 @@ TEST_P(FirstSetup, LeavesTheCameraAtTheLastValueOfEachRegister) {
 
     std::map<std::uint32_t, std::uint32_t> last;
     for (const ExpectedWrite& write : camera.CalculateSetup().writes) {
-        if (write.block == SetupBlock::Control) last[camera.GetAddress(write)] = write.value;
+        if (write.block != SetupBlock::Control) continue;
+        last[camera.GetRegisters().GetAddress(write)] = write.value;
     }
     for (const auto& [address, value] : last) {
-        EXPECT_EQ(value, camera.Peek(address)) << camera.DescribeAddress(address);
+        EXPECT_EQ(value, camera.GetRegisters().Peek(address))
+            << camera.GetRegisters().DescribeAddress(address);
     }
 }
 
