@@ -9,9 +9,12 @@ namespace {
 
 constexpr WORD GreyOnBlack = 7;
 
+/// Whether the standard output goes to something that is no console: a file, a pipe, another
+/// device.
 bool IsRedirected(HANDLE output) {
-    const DWORD type = GetFileType(output);
-    return type == FILE_TYPE_DISK || type == FILE_TYPE_PIPE;
+    if (output == nullptr || output == INVALID_HANDLE_VALUE) return false;
+    DWORD mode = 0;
+    return GetFileType(output) != FILE_TYPE_UNKNOWN && !GetConsoleMode(output, &mode);
 }
 
 bool HasConsole() {
@@ -28,8 +31,8 @@ bool HasConsole() {
 void PrepareLogConsole(const char* title) {
     if (!HasConsole()) return;
     if (!IsRedirected(GetStdHandle(STD_OUTPUT_HANDLE))) {
-        (void)std::freopen("CONOUT$", "wt",
-                           stdout);  // a refusal is ignored: records go elsewhere then
+        // A refusal is ignored: the log goes elsewhere.
+        (void)std::freopen("CONOUT$", "wt", stdout);
     }
     SetConsoleTitleA(title);
     SetConsoleTextAttribute(GetStdHandle(STD_OUTPUT_HANDLE), GreyOnBlack);
