@@ -1,0 +1,56 @@
+// The file of the log. Any thread writes, one thread opens and closes. Writers take no lock: each
+// counts itself in before it looks at `logFile` and out when it is done. Who closes takes the file
+// out of `logFile` first and then waits until nobody is counted in. Both sides go by sequentially
+// consistent operations, so one of the two sees the other.
+
+#include <atomic>
+
+#include "diagnostics/log_state.h"
+#include "hal/platform/append_file.h"
+#include "hal/platform/clock.h"
+
+namespace ZV {
+
+namespace {
+
+std::atomic<AppendFile*> logFile{nullptr};
+std::atomic<std::uint32_t> writerCount{0};
+
+constexpr std::uint64_t WriterMicrosecondsMax = 1000000;
+
+[[nodiscard]] bool AreWritersDone() {
+    const std::uint64_t deadline = GetMonotonicMicroseconds() + WriterMicrosecondsMax;
+    while (writerCount.load() != 0) {
+        if (GetMonotonicMicroseconds() > deadline) return false;
+    }
+    return true;
+}
+
+}  // namespace
+
+bool OpenLogFile(const char* path) {
+    CloseLogFile();
+    AppendFile* const file = OpenAppendFile(path);
+    logFile.store(file);
+    return file != nullptr;
+}
+
+void CloseLogFile() {
+    AppendFile* const former = logFile.exchange(nullptr);
+    if (former == nullptr) return;
+    // A write that hangs in the system keeps its file: closed, its number could become another's.
+    if (AreWritersDone()) CloseAppendFile(former);
+}
+
+bool IsLogFileOpen() {
+    return logFile.load(std::memory_order_relaxed) != nullptr;
+}
+
+void WriteToLogFile(const char* bytes, std::size_t count) {
+    writerCount.fetch_add(1);
+    AppendFile* const file = logFile.load();
+    if (file != nullptr) AppendToFile(file, bytes, count);
+    writerCount.fetch_sub(1);
+}
+
+}  // namespace ZV

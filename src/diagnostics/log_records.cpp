@@ -1,0 +1,58 @@
+#include "diagnostics/log_records.h"
+
+#include <algorithm>
+#include <cstdarg>
+#include <cstdio>
+
+#include "diagnostics/log.h"
+#include "diagnostics/log_state.h"
+#include "hal/platform/debug_output.h"
+
+namespace ZV {
+
+namespace {
+
+/// Length of a text that was formatted into `capacity` bytes: `wanted` is what it would have had.
+std::size_t GetFormattedLength(int wanted, std::size_t capacity) {
+    if (wanted < 0) return 0;
+    return std::min(static_cast<std::size_t>(wanted), capacity - 1);
+}
+
+}  // namespace
+
+std::int32_t CalculateLogElapsed(std::uint64_t start, std::uint64_t now) {
+    return static_cast<std::int32_t>(static_cast<std::uint32_t>(now - start));
+}
+
+// Kept: the seconds are not what is left beside the minutes but all of them.
+std::size_t FormatLogPrefix(std::int32_t elapsedMicroseconds, std::span<char> text) {
+    const std::int32_t milliseconds = elapsedMicroseconds / 1000;
+    const std::int32_t seconds = milliseconds / 1000;
+    const int wanted = std::snprintf(text.data(), text.size(), "%02d:%02d.%03d ", seconds / 60,
+                                     seconds, milliseconds % 1000);
+    return GetFormattedLength(wanted, text.size());
+}
+
+void ZLogWrite(const char* format, ...) {
+    const bool isForFile = logState.outputToFile != 0;
+    if (isForFile && !IsLogFileOpen()) return;
+
+    char record[LogRecordCapacity];
+    const std::int32_t elapsed =
+        CalculateLogElapsed(logState.startMicroseconds, GetLogMicroseconds());
+    const std::size_t start = FormatLogPrefix(elapsed, record);
+    const std::size_t room = sizeof record - start;
+    std::va_list arguments;
+    va_start(arguments, format);
+    const int wanted = std::vsnprintf(record + start, room, format, arguments);
+    va_end(arguments);
+
+    if (!isForFile) {
+        WriteDebuggerOutput(record);
+        return;
+    }
+    // Kept: each record in a file ends with a zero byte.
+    WriteToLogFile(record, start + GetFormattedLength(wanted, room) + 1);
+}
+
+}  // namespace ZV
