@@ -4,9 +4,11 @@
 
 #include <cstdint>
 #include <cstring>
+#include <memory>
 #include <mutex>
 #include <string_view>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "support/expect_zerr.h"
@@ -23,41 +25,74 @@ inline constexpr std::string_view SmallMono =
 inline constexpr std::string_view SmallColour =
     R"({"base": "colour", "cameras": [{"sensor": {"width": 64, "height": 48}}]})";
 
+/// Keeps what the library was given until LoadedLibrary has released it: a test may end, also at a
+/// failed assertion, while a stream still serves its entries.
+class ClientMemory {
+  public:
+    static void Keep(std::shared_ptr<void> memory) {
+        const std::lock_guard hold(GetAll().mutex);
+        GetAll().kept.push_back(std::move(memory));
+    }
+    static void LetGo() {
+        const std::lock_guard hold(GetAll().mutex);
+        GetAll().kept.clear();
+    }
+
+  private:
+    static ClientMemory& GetAll() {
+        static ClientMemory all;
+        return all;
+    }
+
+    std::mutex mutex;
+    std::vector<std::shared_ptr<void>> kept;
+};
+
 /// A client's frame with its buffer, followed by guard bytes that nobody may touch.
 class ClientFrame {
   public:
     static constexpr std::uint8_t Untouched = 0xA5;
 
-    explicit ClientFrame(std::uint32_t bytes) : pixels(bytes + GuardBytes, Untouched) {
-        record.pBuffer = pixels.data();
-        record.bufferSize = bytes;
+    explicit ClientFrame(std::uint32_t bytes) : state(std::make_shared<State>()) {
+        state->pixels.assign(bytes + GuardBytes, Untouched);
+        state->record.pBuffer = state->pixels.data();
+        state->record.bufferSize = bytes;
+        ClientMemory::Keep(state);
     }
     ClientFrame(const ClientFrame&) = delete;
     ClientFrame& operator=(const ClientFrame&) = delete;
 
-    Zentara_Frame* Get() { return &record; }
-    Zentara_Frame* operator->() { return &record; }
-    const std::uint8_t* GetPixels() const { return pixels.data(); }
-    bool IsGuardIntact() const { return AreUntouched(pixels.size() - GuardBytes); }
+    Zentara_Frame* Get() { return &state->record; }
+    Zentara_Frame* operator->() { return &state->record; }
+    const std::uint8_t* GetPixels() const { return state->pixels.data(); }
+    bool IsGuardIntact() const { return AreUntouched(state->pixels.size() - GuardBytes); }
     bool IsUntouched() const { return AreUntouched(0); }
 
   private:
     static constexpr std::size_t GuardBytes = 64;
 
+    struct State {
+        Zentara_Frame record{};
+        std::vector<std::uint8_t> pixels;
+    };
+
     bool AreUntouched(std::size_t from) const {
-        for (std::size_t i = from; i < pixels.size(); ++i) {
-            if (pixels[i] != Untouched) return false;
+        for (std::size_t i = from; i < state->pixels.size(); ++i) {
+            if (state->pixels[i] != Untouched) return false;
         }
         return true;
     }
 
-    Zentara_Frame record{};
-    std::vector<std::uint8_t> pixels;
+    std::shared_ptr<State> state;
 };
 
-/// What callbacks were told, in order. Its address is the `userPrivate` of the calls that it hears.
+/// What callbacks were told, in order; GetPrivate is the `userPrivate` of the calls that it hears.
 class CallbackLog {
   public:
+    CallbackLog() : state(std::make_shared<State>()) { ClientMemory::Keep(state); }
+    CallbackLog(const CallbackLog&) = delete;
+    CallbackLog& operator=(const CallbackLog&) = delete;
+
     struct Call {
         std::uint32_t userData;
         std::uint32_t errorCode;
@@ -65,29 +100,33 @@ class CallbackLog {
         std::thread::id thread;
     };
 
-    std::uint64_t GetPrivate() { return reinterpret_cast<std::uintptr_t>(this); }
+    std::uint64_t GetPrivate() { return reinterpret_cast<std::uintptr_t>(state.get()); }
     static void Record(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
                        std::uint32_t flags) {
-        auto* const log = reinterpret_cast<CallbackLog*>(static_cast<std::uintptr_t>(userPrivate));
+        auto* const log = reinterpret_cast<State*>(static_cast<std::uintptr_t>(userPrivate));
         const std::lock_guard hold(log->mutex);
         log->calls.push_back({userData, errorCode, flags, std::this_thread::get_id()});
     }
 
     std::vector<Call> GetCalls() const {
-        const std::lock_guard hold(mutex);
-        return calls;
+        const std::lock_guard hold(state->mutex);
+        return state->calls;
     }
     std::size_t CountCalls() const {
-        const std::lock_guard hold(mutex);
-        return calls.size();
+        const std::lock_guard hold(state->mutex);
+        return state->calls.size();
     }
     [[nodiscard]] bool WaitForCalls(std::size_t count) const {
         return WaitUntil([&] { return CountCalls() >= count; }, std::chrono::seconds(20));
     }
 
   private:
-    mutable std::mutex mutex;
-    std::vector<Call> calls;
+    struct State {
+        std::mutex mutex;
+        std::vector<Call> calls;
+    };
+
+    std::shared_ptr<State> state;
 };
 
 /// A loaded library over a simulated world.
@@ -96,7 +135,10 @@ class LoadedLibrary : public testing::Test {
     explicit LoadedLibrary(std::string_view scenario = SmallMono) : world(scenario) {}
 
     void SetUp() override { ASSERT_ZERR(zerrNone, Zentara_LoadDriver()); }
-    void TearDown() override { Zentara_ReleaseDriver(); }
+    void TearDown() override {
+        Zentara_ReleaseDriver();
+        ClientMemory::LetGo();
+    }
 
     std::vector<Zentara_CamListItem> ListCameras() {
         std::vector<Zentara_CamListItem> items(16);

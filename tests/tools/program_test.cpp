@@ -474,11 +474,12 @@ TEST(Program, ACameraThatAnotherProcessTakesAfterTheListingEndsWithCode4) {
 }
 
 TEST(Program, ACameraThatIsUnpluggedDuringAGrabEndsWithCode5) {
-    const TracedScenario scenario(R"({"faults": [{"kind": "unplug", "frame": 1, "packet": 100}]})");
+    const TracedScenario scenario(R"({"sensor": {"width": 64, "height": 48},
+                                                     "faults": [{"kind": "unplug", "frame": 1, "packet": 0}]})");
     const std::string path = scenario.folder.GetPath("a.fits");
 
     const ProgramResult result =
-        RunProgram({"grab", "0", "--simulation", scenario.GetName(), "-o", path, "--timeout", "1"});
+        RunProgram({"grab", "0", "--simulation", scenario.GetName(), "-o", path, "--timeout", "3"});
 
     EXPECT_EQ(5, result.exitCode);
     EXPECT_THAT(result.errors, HasSubstr("gone"));
