@@ -189,6 +189,22 @@ TEST_P(PacketFault, FramesOfAnotherParameterSetAreNotDelivered) {
     EXPECT_EQ(0U, GetNumbers(frames).count(2));
 }
 
+TEST_P(PacketFault, ARequestThatIsFilledTwiceCostsItsPacketsAndNoDamageIsHidden) {
+    CameraSession session(
+        MakeScenario(R"({"kind": "overwriteRequest", "frame": 3, "packet": 1})", GetParam()));
+    ASSERT_TRUE(session.IsOpen());
+
+    const auto frames = session.Stream(6);
+
+    ASSERT_EQ(6U, frames.size());
+    for (const DeliveredFrame& delivered : frames) {
+        if (delivered.frame.errorCode == zerrMissingData) continue;
+        ExpectWhole(session, delivered);
+        EXPECT_NE(3U, delivered.frame.frameNumber) << "its packets were overwritten";
+    }
+    ExpectWhole(session, frames.back());
+}
+
 TEST_P(PacketFault, ABusResetEndsAFrameAndTheStreamGoesOn) {
     CameraSession session(
         MakeScenario(R"({"kind": "busReset", "frame": 2, "packet": 2})", GetParam()));
