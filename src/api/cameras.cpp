@@ -35,6 +35,18 @@ ZentaraResult ListCameras(const char* function, Zentara_CamListItem* items, std:
     return result;
 }
 
+/// A camera whose opening broke off when it was connected already, for want of memory, is closed
+/// again. One that another process holds stays as it is.
+CameraResult ConnectCamera(ZCamera& camera) {
+    CameraResult result = CameraHalFault;
+    (void)Guarded([&] {
+        result = camera.OpenCamera();
+        return ZentaraResult{zerrNone};
+    });
+    if (result != CameraOk && camera.DoWeHaveExclusiveAccess()) (void)camera.CloseCamera();
+    return result;
+}
+
 ZentaraResult MakeAndAttachContext(ZCamera& camera) {
     const ZentaraResult result = Guarded([&] {
         const bool isAttached = CameraStore::Get().AttachContext(camera);
@@ -57,7 +69,7 @@ ZentaraResult OpenCamera(const char* function, std::uint32_t cameraId, ZentaraHa
         ZLogMessage(function, "Camera is already open");
         return zerrBadCameraId;
     }
-    const CameraResult opened = camera.OpenCamera();
+    const CameraResult opened = ConnectCamera(camera);
     if (opened != CameraOk) return TranslateCameraResult(opened);
     ZLogMessage(function, "Opened %s camera", camera.GetModelName());
     const ZentaraResult result = MakeAndAttachContext(camera);

@@ -59,9 +59,9 @@ CameraResult MorvaneFWCamera::OpenCamera() {
             &record, m_asyncWriteAddressLow, m_asyncWriteAddressLength, CameraAsyncWriteCallback);
     }
     if (status != HALOk) return ReportHalStatus(status);
-    AddToConnectedCameras();
     isOpen = true;
     exclusiveAccess = true;
+    AddToConnectedCameras();
     StartExposeDoneThread();
     status = StartRunLoop();
     return status == HALOk ? CameraOk : ReportHalStatus(status);
