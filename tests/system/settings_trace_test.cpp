@@ -1,0 +1,314 @@
+#include <gtest/gtest.h>
+
+#include <array>
+#include <cstdlib>
+#include <memory>
+#include <random>
+#include <string>
+
+#include "support/sending_camera.h"
+
+// The registers that a send writes, in their order, against a list that is calculated from the
+// camera's configuration and the block without the library.
+namespace ZV::Test {
+namespace {
+
+struct TraceCase {
+    const char* name;
+    const char* className;
+    std::string scenario;
+};
+
+void PrintTo(const TraceCase& traced, std::ostream* stream) {
+    *stream << traced.name;
+}
+
+std::string NameCase(const testing::TestParamInfo<TraceCase>& info) {
+    return info.param.name;
+}
+
+TraceCase MakeModelCase(const char* className) {
+    return {className, className, std::string("model:") + className};
+}
+
+TraceCase MakeCase(const char* name, const char* className, const std::string& camera) {
+    return {name, className,
+            std::string(R"({"base": "model:)") + className + R"(", "cameras": [)" + camera + "]}"};
+}
+
+TraceCase MakeConfigurationCase(const char* name, const std::string& version) {
+    return MakeCase(name, "SolvaneA1", R"({"versions": {"configuration": ")" + version + R"("}})");
+}
+
+TraceCase MakeControlCase(const char* name, const char* className, const std::string& version) {
+    return MakeCase(name, className, R"({"versions": {"control": ")" + version + R"("}})");
+}
+
+constexpr int Rounds = 24;
+
+std::uint32_t GetSeed() {
+    const char* text = std::getenv("ZENTARA_TEST_SEED");
+    return text == nullptr ? 20240611u : static_cast<std::uint32_t>(std::strtoul(text, nullptr, 0));
+}
+
+class SettingsTrace : public testing::TestWithParam<TraceCase> {
+  protected:
+    void SetUp() override {
+        client = std::make_unique<SendingCamera>(GetParam().scenario, GetParam().className);
+        ASSERT_TRUE(client->IsOpen());
+    }
+
+    std::unique_ptr<SendingCamera> client;
+};
+
+TEST_P(SettingsTrace, TheDefaultsWriteTheseRegistersAndAreTakenOver) {
+    Zentara_Settings block = client->ReadDefaults();
+
+    EXPECT_TRUE(client->Send(block));
+
+    EXPECT_TRUE(client->WasCommitted());
+}
+
+TEST_P(SettingsTrace, TheSameBlockOnceMoreIsNotTakenOver) {
+    Zentara_Settings block = client->ReadDefaults();
+    ASSERT_TRUE(client->Send(block));
+
+    EXPECT_TRUE(client->Send(block));
+
+    EXPECT_FALSE(client->WasCommitted());
+}
+
+/// A block that differs from the camera in every setting that any model has.
+void ChangeEverything(Zentara_Settings& block, bool isMetrona) {
+    SetWord(block, zprmImageFormat, 3);
+    SetWord(block, zprmBinning, 2);
+    SetWord(block, zprmVerticalBinning, 2);
+    SetWord(block, zprmHorizontalBinning, isMetrona ? 3 : 1);
+    SetWord(block, zprmRoiX, 20);
+    SetWord(block, zprmRoiY, 10);
+    SetWord(block, zprmRoiWidth, 200);
+    SetWord(block, zprmRoiHeight, 16);
+    SetWord(block, zprmReadoutSpeed, zspeed10MHz);
+    SetWord(block, zprmTriggerType, 2);
+    SetWord(block, zprmColorWheel, 3);
+    SetWord(block, zprmCoolerActive, 0);
+    SetWord(block, zprmDoubleShot, 1);
+    SetWord(block, zprmSyncb, 0);
+    SetWord(block, zprmMetronaShutterDelay, 1234);
+    SetSigned(block, zprmS32NormalizedGaindB, 6'020'000);
+    SetSigned(block, zprmS32AbsoluteOffset, -3);
+    SetSigned(block, zprmS32RegulatedCoolingTemp, -17);
+    SetWide(block, zprm64Exposure, 5'000'123'456);
+    SetWide(block, zprm64ExposureRed, 6'000'000'000);
+    SetWide(block, zprm64ExposureBlue, 7'000'000'000);
+    SetWide(block, zprm64NormIntensGain, 100'000'000);
+    SetWord(block, zprmFan, 2);
+    SetWord(block, zprmBlackoutMode, 1);
+    SetWord(block, zprmHighSensitivityMode, 1);
+    SetWord(block, zprmEMGain, 100);
+    SetWord(block, zprmCloseDelay, 1000);
+    SetWord(block, zprmDither, 1);
+    SetWord(block, zprmHighGainMode, 1);
+    SetWord(block, zprmVClockPeriod, 5000);
+}
+
+TEST_P(SettingsTrace, ABlockThatChangesEverythingWritesTheseRegisters) {
+    Zentara_Settings block = client->ReadDefaults();
+    ASSERT_TRUE(client->Send(block));
+    ChangeEverything(block, GetParam().className == std::string_view("Metrona"));
+
+    EXPECT_TRUE(client->Send(block));
+
+    EXPECT_TRUE(client->WasCommitted());
+}
+
+TEST_P(SettingsTrace, AColourFormatTurnsTheWheelOfAMonochromeCameraAndAnotherStopsIt) {
+    Zentara_Settings block = client->ReadDefaults();
+    for (const std::uint32_t format : {6u, 10u, 2u, 12u, 1u, 13u}) {
+        SetWord(block, zprmImageFormat, format);
+
+        EXPECT_TRUE(client->Send(block)) << "format " << format;
+    }
+}
+
+TEST_P(SettingsTrace, EachTriggerModeIsWrittenOnlyWhenItIsNew) {
+    Zentara_Settings block = client->ReadDefaults();
+    for (const std::uint32_t mode : {1u, 1u, 2u, 3u, 4u, 5u, 6u, 7u, 8u, 0u, 0u}) {
+        SetWord(block, zprmTriggerType, mode);
+
+        EXPECT_TRUE(client->Send(block)) << "mode " << mode;
+    }
+}
+
+TEST_P(SettingsTrace, EachBinningFitsTheRegion) {
+    Zentara_Settings block = client->ReadDefaults();
+    for (const std::uint32_t mode : {2u, 1u, 3u, 4u, 8u, 64u, 2u, 5u, 0u, 1u}) {
+        for (const std::uint32_t key : {zprmBinning, zprmVerticalBinning, zprmHorizontalBinning}) {
+            SetWord(block, key, mode);
+        }
+
+        EXPECT_TRUE(client->Send(block)) << "mode " << mode;
+    }
+}
+
+TEST_P(SettingsTrace, EachSpeedIsWrittenOnlyWhenItIsNewAndKnown) {
+    Zentara_Settings block = client->ReadDefaults();
+    for (const std::uint32_t index : {1u, 1u, 2u, 3u, 7u, 8u, 4u, 9u, 0u}) {
+        SetWord(block, zprmReadoutSpeed, index);
+
+        EXPECT_TRUE(client->Send(block)) << "index " << index;
+    }
+}
+
+TEST_P(SettingsTrace, EachSelectorOfTheRegisterTweakWritesItsRegister) {
+    Zentara_Settings block = client->ReadDefaults();
+    ASSERT_TRUE(client->Send(block));
+    for (std::uint32_t selector = 0; selector < 16; ++selector) {
+        SetWord(block, zprmRegisterTweak, selector << 28 | 0x0FFF0000 | (selector + 100));
+        // Something else must change for the tweak to be taken over.
+        SetWord(block, zprmReserved17, selector);
+
+        EXPECT_TRUE(client->Send(block)) << "selector " << selector;
+    }
+}
+
+// ---- Random blocks ----
+
+class RandomBlocks {
+  public:
+    explicit RandomBlocks(std::uint32_t seed) : random(seed) {}
+
+    /// Changes some settings of a block to values that a client might choose, or nearly.
+    void Change(Zentara_Settings& block) {
+        for (std::uint32_t i = Pick(12) + 1; i > 0; --i) ChangeOne(block);
+    }
+
+  private:
+    std::uint32_t Pick(std::uint32_t below) {
+        return std::uniform_int_distribution<std::uint32_t>(0, below - 1)(random);
+    }
+    std::uint32_t PickWord() { return static_cast<std::uint32_t>(random()); }
+
+    void ChangeOne(Zentara_Settings& block) {
+        switch (Pick(4)) {
+            case 0:
+                return ChangeSigned(block);
+            case 1:
+                return ChangeWide(block);
+            default:
+                return ChangeWord(block);
+        }
+    }
+    void ChangeWord(Zentara_Settings& block) {
+        const std::uint32_t key = Pick(46);
+        SetWord(block, key, PickValue(key));
+    }
+    std::uint32_t PickValue(std::uint32_t key) {
+        constexpr std::array Speeds{0u, 1u, 2u, 3u, 7u, 8u, 4u, 0xFFFFFFFFu};
+        constexpr std::array Modes{1u, 2u, 3u, 4u, 8u, 5u, 0u, 64u};
+        if (key >= zprmBinning && key <= zprmVerticalBinning) return Modes[Pick(Modes.size())];
+        if (key == zprmReadoutSpeed) return Speeds[Pick(Speeds.size())];
+        if (key == zprmImageFormat) return Pick(14);
+        if (key >= zprmRoiX && key <= zprmRoiHeight) return Pick(8) == 0 ? PickWord() : Pick(2600);
+        if (key == zprmCameraMode) return Pick(3);
+        if (key == zprmEMGain) return Pick(1100);
+        if (key == zprmMetronaShutterDelay || key == zprmVClockPeriod || key == zprmCloseDelay) {
+            return Pick(8) == 0 ? PickWord() >> 1 : Pick(30000);
+        }
+        return Pick(10);
+    }
+    void ChangeSigned(Zentara_Settings& block) {
+        const std::uint32_t key = Pick(3);
+        const auto any = static_cast<std::int32_t>(PickWord());
+        const std::array values{static_cast<std::int32_t>(Pick(60'000'000)) - 20'000'000,
+                                static_cast<std::int32_t>(Pick(5000)) - 100,
+                                static_cast<std::int32_t>(Pick(110)) - 57};
+        SetSigned(block, key, key < 2 && Pick(8) == 0 ? any : values[key]);
+    }
+    void ChangeWide(Zentara_Settings& block) {
+        const std::uint64_t any = random() >> Pick(40);
+        // The greatest intensifier gains would overflow on their way to the nearest step.
+        SetWide(block, Pick(4), any >> 1);
+    }
+
+    std::mt19937_64 random;
+};
+
+TEST_P(SettingsTrace, RandomBlocksWriteWhatIsExpectedAndComeBackAsExpected) {
+    const std::uint32_t seed = GetSeed();
+    SCOPED_TRACE("ZENTARA_TEST_SEED=" + std::to_string(seed));
+    RandomBlocks blocks(seed);
+    Zentara_Settings block = client->ReadDefaults();
+    const Zentara_Settings defaults = block;
+    for (int round = 0; round < Rounds; ++round) {
+        const bool isFresh = round % 8 == 0 || client->GetResult() != zerrNone;
+        if (isFresh) block = defaults;
+        blocks.Change(block);
+        Zentara_Settings preflighted = block;
+
+        ASSERT_TRUE(client->Preflight(preflighted)) << "round " << round;
+        ASSERT_TRUE(client->Send(block)) << "round " << round;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, SettingsTrace,
+                         testing::Values(MakeModelCase("SolvaneA1"), MakeModelCase("SolvaneA2"),
+                                         MakeModelCase("DorixB1"), MakeModelCase("Folary"),
+                                         MakeModelCase("SolvaneK1"), MakeModelCase("DorixR1"),
+                                         MakeModelCase("SolvaneC1"), MakeModelCase("SolvaneB1"),
+                                         MakeModelCase("PellanA1"), MakeModelCase("SolvaneD1"),
+                                         MakeModelCase("SolvaneF1"), MakeModelCase("SolvaneC2"),
+                                         MakeModelCase("SolvaneB2"), MakeModelCase("PellanB1"),
+                                         MakeModelCase("SolvaneE1"), MakeModelCase("PellanA2"),
+                                         MakeModelCase("SolvaneD2"), MakeModelCase("SolvaneG2"),
+                                         MakeModelCase("SolvaneG1"), MakeModelCase("TirelM2"),
+                                         MakeModelCase("TirelM1"), MakeModelCase("SolvaneH1"),
+                                         MakeModelCase("SolvaneJ1"), MakeModelCase("Metrona"),
+                                         MakeModelCase("Unknown")),
+                         NameCase);
+
+INSTANTIATE_TEST_SUITE_P(
+    WithConfiguration, SettingsTrace,
+    testing::Values(MakeConfigurationCase("V1_1", "1.1"), MakeConfigurationCase("V2_1", "2.1"),
+                    MakeConfigurationCase("V2_4", "2.4"), MakeConfigurationCase("V2_7", "2.7"),
+                    MakeConfigurationCase("V2_9", "2.9"), MakeConfigurationCase("V2_11", "2.11")),
+    NameCase);
+
+INSTANTIATE_TEST_SUITE_P(
+    WithControl, SettingsTrace,
+    testing::Values(TraceCase{"OfTheFirstGeneration", "SolvaneA1", "old"},
+                    MakeControlCase("V1_1", "SolvaneA1", "1.1"),
+                    MakeControlCase("V2_2AndItsFrequencyGuard", "PellanB1", "2.2"),
+                    MakeControlCase("TooShortForTheRatioBoard", "PellanB1", "2.6"),
+                    MakeControlCase("TooShortForTheCloseDelay", "SolvaneF1", "2.5"),
+                    MakeControlCase("TooShortForTheFan", "SolvaneA1", "2.4"),
+                    MakeControlCase("TooShortForTheTweaks", "TirelM1", "2.7"),
+                    MakeControlCase("TooShortForTheIntensifier", "SolvaneK1", "1.2")),
+    NameCase);
+
+INSTANTIATE_TEST_SUITE_P(
+    When, SettingsTrace,
+    testing::Values(
+        MakeCase("ItsFeaturesAreAllThere", "SolvaneG1",
+                 R"({"configuration": {"169": "0x1F5E", "29": 1}})"),
+        MakeCase("TheTweaksMeetAllFeatures", "TirelM1",
+                 R"({"configuration": {"169": "0x1F5E", "29": 1}})"),
+        MakeCase("PellanB1HasNoHardwareProfile", "PellanB1", R"({"configuration": {"201": 0}})"),
+        MakeCase("PellanB1HasAnOldAnalogBoard", "PellanB1",
+                 R"({"configuration": {"201": 0}, "firmwareVersion": 99})"),
+        MakeCase("TheAnalogBoardIsOld", "SolvaneC1", R"({"firmwareVersion": 99})"),
+        MakeCase("AWheelModelHasAMosaic", "SolvaneG1", R"({"sensor": {"colour": "bayer"}})"),
+        MakeCase("TheSensorIsOdd", "PellanA1", R"({"sensor": {"width": 641, "height": 481}})"),
+        MakeCase("TheSensorOfFolaryIsOdd", "Folary",
+                 R"({"sensor": {"width": 641, "height": 481}})"),
+        MakeCase("TheSensorOfFolaryIs2048Wide", "Folary",
+                 R"({"sensor": {"width": 2048, "height": 1536}})"),
+        MakeCase("SolvaneD1SendsTheOldPackets", "SolvaneD1", R"({"streamingVersion": 1})"),
+        MakeCase("PacketsAreOfVersion0", "SolvaneG2", R"({"streamingVersion": 0})"),
+        MakeCase("TheDepthIs15Bits", "SolvaneG2", R"({"sensor": {"maxBitDepth": 15}})"),
+        TraceCase{"SolvaneA1IsASolvaneB1", "SolvaneB1",
+                  R"({"base": "mono", "cameras": [{"sensor": {"id": 46}}]})"}),
+    NameCase);
+
+}  // namespace
+}  // namespace ZV::Test
