@@ -1,0 +1,42 @@
+#include "support/log_text.h"
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <regex>
+
+namespace ZV::Test {
+namespace {
+
+std::string ReadText(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+}  // namespace
+
+std::string DescribeLog(std::string_view bytes) {
+    std::string text;
+    for (const char byte : bytes) {
+        if (byte == '\0') {
+            text += "|\n";
+        } else if (byte == '\n') {
+            text += "\\n";
+        } else {
+            text += byte;
+        }
+    }
+    text = std::regex_replace(text, std::regex(R"((^|\n)-?\d+:-?\d+\.-?\d+ )"), "$1<time> ");
+    return std::regex_replace(text, std::regex("pBuffer: [0-9a-f]+"), "pBuffer: <address>");
+}
+
+testing::AssertionResult MatchesGolden(std::string_view name, const std::string& text) {
+    const auto golden = std::filesystem::path(ZENTARA_SOURCE_DIR) / "tests" / name;
+    const auto written = std::filesystem::path(ZENTARA_BINARY_DIR) / "golden" / name;
+    std::filesystem::create_directories(written.parent_path());
+    std::ofstream(written, std::ios::binary) << text;
+    if (ReadText(golden) == text) return testing::AssertionSuccess();
+    return testing::AssertionFailure() << "diff " << golden << " " << written << "\n" << text;
+}
+
+}  // namespace ZV::Test
