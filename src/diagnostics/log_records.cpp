@@ -25,11 +25,11 @@ std::int32_t CalculateLogElapsed(std::uint64_t start, std::uint64_t now) {
 }
 
 // Kept: the seconds are not what is left beside the minutes but all of them.
-std::size_t FormatLogPrefix(std::int32_t elapsedMicroseconds, std::span<char> text) {
-    const std::int32_t milliseconds = elapsedMicroseconds / 1000;
-    const std::int32_t seconds = milliseconds / 1000;
+std::size_t FormatLogPrefix(std::int64_t elapsedMicroseconds, std::span<char> text) {
+    const auto seconds = static_cast<std::int32_t>(elapsedMicroseconds / 1000000);
+    const auto milliseconds = static_cast<std::int32_t>(elapsedMicroseconds / 1000 % 1000);
     const int wanted = std::snprintf(text.data(), text.size(), "%02d:%02d.%03d ", seconds / 60,
-                                     seconds, milliseconds % 1000);
+                                     seconds, milliseconds);
     return GetFormattedLength(wanted, text.size());
 }
 

@@ -13,8 +13,8 @@ inline constexpr std::size_t LogRecordCapacity = 1024;
 /// and round again after twice that.
 [[nodiscard]] std::int32_t CalculateLogElapsed(std::uint64_t start, std::uint64_t now);
 
-/// Writes what stands before a record's text: minutes, whole seconds and milliseconds. Returns its
-/// length; `text` is terminated.
-std::size_t FormatLogPrefix(std::int32_t elapsedMicroseconds, std::span<char> text);
+/// Writes what stands before a record's text: minutes, whole seconds and milliseconds. Takes any
+/// time of up to 68 years. Returns the length; `text` is terminated.
+std::size_t FormatLogPrefix(std::int64_t elapsedMicroseconds, std::span<char> text);
 
 }  // namespace ZV
