@@ -79,10 +79,10 @@ class StarScene final : public Scene {
   private:
     void AddStar(const Star& star, std::uint32_t y, std::uint32_t colour, double* levels) const {
         const double inRow = star.peak[colour] * CalculateProfile(y - star.y, star.sigma);
-        const double left = std::max(std::ceil(star.x - Reach), 0.0);
+        const auto left = static_cast<std::size_t>(std::max(std::ceil(star.x - Reach), 0.0));
         const double right = std::min(std::floor(star.x + Reach), GetWidth() - 1.0);
-        for (double x = left; x <= right; ++x) {
-            levels[static_cast<std::size_t>(x)] += inRow * CalculateProfile(x - star.x, star.sigma);
+        for (std::size_t x = left; static_cast<double>(x) <= right; ++x) {
+            levels[x] += inRow * CalculateProfile(static_cast<double>(x) - star.x, star.sigma);
         }
     }
 
