@@ -1,4 +1,5 @@
 #include <cstddef>
+#include <memory>
 #include <mutex>
 #include <utility>
 
@@ -66,13 +67,13 @@ CameraResult ZCamera::GetCameraList(std::vector<ZCamera*>& cameras) {
     const HALStatus status = records.Read();
     if (status != HALOk) return ReportHalStatus(status);
     while (HALCamera* record = records.TakeNextFree()) {
-        ZCamera* listed = nullptr;
-        const CameraResult result = ListCamera(*record, &listed);
-        if (result != CameraOk) {
-            KeepLostCamera(listed);
-            return result;
-        }
-        cameras.push_back(listed);
+        ZCamera* made = nullptr;
+        // Also for what the standard library throws.
+        const auto keep = [&made](void*) { KeepLostCamera(made); };
+        const std::unique_ptr<void, decltype(keep)> unlisted(&made, keep);
+        const CameraResult result = ListCamera(*record, &made);
+        if (result != CameraOk) return result;
+        cameras.push_back(std::exchange(made, nullptr));
     }
     return CameraOk;
 }

@@ -88,7 +88,7 @@ void* ExternalBufferQueue::TakeFirst() {
     const std::lock_guard hold(leafMutex);
     if (buffers.empty()) return nullptr;
     void* first = buffers.front();
-    buffers.pop_front();
+    buffers.erase(buffers.begin());
     return first;
 }
 

@@ -3,8 +3,8 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <deque>
 #include <mutex>
+#include <vector>
 
 #include "hal/frame_info.h"
 
@@ -54,7 +54,7 @@ class ExternalBufferQueue {
 
   private:
     mutable std::mutex leafMutex;
-    std::deque<void*> buffers;  // guarded by leafMutex
+    std::vector<void*> buffers;  // guarded by leafMutex; takes no memory before the first
 };
 
 }  // namespace ZV

@@ -97,10 +97,10 @@ void MorvaneFWCamera::ServeFrame(tStFrameInfo* frame) {
         DiscardFrame(frame);
         return;
     }
+    const std::unique_ptr<tStFrameInfo, void (*)(tStFrameInfo*)> served(frame, FreeFrame);
     // Nothing has been written to a refused frame: it must not show what its buffer held.
     if (frame->frameStatus == FrameRefused) std::memset(frame->buffer, 0, frame->bufferSize);
     ZExImage* image = MakeImage(*frame);
-    FreeFrame(frame);
     if (image != nullptr) DeliverImage(image);
 }
 
