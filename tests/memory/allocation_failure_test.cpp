@@ -1,0 +1,144 @@
+// Every allocation fails once. The world is real but for the allocator: number n is refused, for n
+// from 1 until a run comes to its end without it. A leak check at the end of the process tells what
+// a refusal has lost.
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <thread>
+
+#include "hal/platform/clock.h"
+#include "memory/failing_allocator.h"
+#include "support/flat_camera.h"
+
+namespace ZV::Test {
+namespace {
+
+constexpr std::int64_t AllocationsMax = 20'000;  ///< Far above what any run takes.
+constexpr ZentaraResult GreatestCode = 32;
+
+bool IsKnown(ZentaraResult result) {
+    return result <= GreatestCode;
+}
+
+/// Ends a grab for which no image comes: a camera whose run loop could not be made has none.
+class GrabEnder {
+  public:
+    GrabEnder() : thread([this] { Run(); }) {}
+    ~GrabEnder() {
+        isDone = true;
+        thread.join();
+    }
+    GrabEnder(const GrabEnder&) = delete;
+    GrabEnder& operator=(const GrabEnder&) = delete;
+
+    void SetCamera(ZentaraHandle opened) { handle = opened; }
+    /// True when the grab went on for so long without reason that the test has failed.
+    bool HasGivenUp() const { return hasGivenUp; }
+
+  private:
+    void Run() {
+        const auto isOver = [this] { return isDone.load(); };
+        if (WaitUntil(isOver, std::chrono::milliseconds(200))) return;
+        if (WaitUntil([&] { return isOver() || HasRefusedAllocation(); },
+                      std::chrono::seconds(30))) {
+            if (WaitUntil(isOver, std::chrono::milliseconds(200))) return;
+        } else {
+            hasGivenUp = true;
+        }
+        // An abort before the grab waits does not count, so it is repeated.
+        while (!isDone) {
+            if (handle != 0) (void)Zentara_Abort(handle);
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
+    }
+
+    std::atomic<ZentaraHandle> handle{0};
+    std::atomic<bool> isDone{false};
+    std::atomic<bool> hasGivenUp{false};
+    std::thread thread;
+};
+
+class FailingAllocation : public testing::Test {
+  protected:
+    FailingAllocation() { SetWaitClockDivisor(1000); }
+    ~FailingAllocation() override { SetWaitClockDivisor(1); }
+
+    void ExpectNothingHeld() const {
+        EXPECT_EQ(0u, world.GetState().openHandles);
+        EXPECT_EQ(0u, world.GetState().reservedBandwidths);
+        EXPECT_EQ(0u, world.GetState().pendedRequests);
+    }
+
+    SimulationWorld world{SmallMono};
+    Zentara_CamListItem items[4] = {};
+};
+
+TEST_F(FailingAllocation, OfOpenGrabAndCloseGivesACodeAndTheNextRunIsClean) {
+    bool hasRefused = true;
+    for (std::int64_t failing = 1; hasRefused && failing < AllocationsMax; ++failing) {
+        SCOPED_TRACE(failing);
+        ASSERT_ZERR(zerrNone, Zentara_LoadDriver());
+        std::uint32_t length = 4;
+        ASSERT_ZERR(zerrNone, Zentara_ListCameras(items, &length));
+        ASSERT_EQ(1u, length);
+        ClientFrame frame(64 * 48);
+        ZentaraHandle handle = 0;
+        ZentaraResult opened = zerrNone;
+        ZentaraResult grabbed = zerrNone;
+        ZentaraResult closed = zerrNone;
+        {
+            GrabEnder ender;
+            BeginAllocations(failing);
+            opened = Zentara_OpenCamera(items[0].cameraId, &handle);
+            if (opened == zerrNone) {
+                ender.SetCamera(handle);
+                grabbed = Zentara_GrabFrame(handle, frame.Get());
+                closed = Zentara_CloseCamera(handle);
+            }
+            hasRefused = EndAllocations();
+            EXPECT_FALSE(ender.HasGivenUp());
+        }
+        EXPECT_PRED1(IsKnown, opened);
+        EXPECT_PRED1(IsKnown, grabbed);
+        EXPECT_PRED1(IsKnown, closed);
+        EXPECT_TRUE(frame.IsGuardIntact());
+        if (!hasRefused) {
+            EXPECT_ZERR(zerrNone, opened);
+            EXPECT_ZERR(zerrNone, grabbed);
+            EXPECT_ZERR(zerrNone, closed);
+        }
+        Zentara_ReleaseDriver();
+        ExpectNothingHeld();
+        if (HasFailure()) break;
+    }
+    EXPECT_FALSE(hasRefused);
+}
+
+TEST_F(FailingAllocation, OfLoadListAndReleaseGivesACodeAndTheNextRunIsClean) {
+    bool hasRefused = true;
+    for (std::int64_t failing = 1; hasRefused && failing < AllocationsMax; ++failing) {
+        SCOPED_TRACE(failing);
+        std::uint32_t length = 4;
+
+        BeginAllocations(failing);
+        const ZentaraResult loaded = Zentara_LoadDriver();
+        ZentaraResult listed = zerrNone;
+        if (loaded == zerrNone) listed = Zentara_ListCameras(items, &length);
+        Zentara_ReleaseDriver();
+        hasRefused = EndAllocations();
+
+        EXPECT_PRED1(IsKnown, loaded);
+        EXPECT_PRED1(IsKnown, listed);
+        if (!hasRefused) {
+            EXPECT_ZERR(zerrNone, loaded);
+            EXPECT_ZERR(zerrNone, listed);
+        }
+        ExpectNothingHeld();
+        if (HasFailure()) break;
+    }
+    EXPECT_FALSE(hasRefused);
+}
+
+}  // namespace
+}  // namespace ZV::Test

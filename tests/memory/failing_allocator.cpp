@@ -1,0 +1,80 @@
+#include "memory/failing_allocator.h"
+
+#include <atomic>
+#include <cstddef>
+#include <new>
+
+// The linker's --wrap option sends the suite's references to an allocator here, those of the
+// library among them, and gives the allocator itself the name that begins with __real.
+
+namespace ZV::Test {
+namespace {
+
+std::atomic<bool> isCounting{false};
+std::atomic<std::int64_t> allocationsLeft{0};  // 0 from the refused one on
+
+bool MayAllocate() {
+    return !isCounting.load() || allocationsLeft.fetch_sub(1) != 1;
+}
+
+}  // namespace
+
+void BeginAllocations(std::int64_t failing) {
+    allocationsLeft = failing;
+    isCounting = true;
+}
+
+bool EndAllocations() {
+    isCounting = false;
+    return HasRefusedAllocation();
+}
+
+bool HasRefusedAllocation() {
+    return allocationsLeft.load() <= 0;
+}
+
+}  // namespace ZV::Test
+
+using ZV::Test::MayAllocate;
+
+extern "C" {
+
+void* __real_malloc(std::size_t bytes);
+void* __real_calloc(std::size_t count, std::size_t bytes);
+void* __real_realloc(void* memory, std::size_t bytes);
+void* __real__Znwm(std::size_t bytes);
+void* __real__ZnwmRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept;
+void* __real__Znam(std::size_t bytes);
+void* __real__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept;
+
+void* __wrap_malloc(std::size_t bytes) {
+    return MayAllocate() ? __real_malloc(bytes) : nullptr;
+}
+
+void* __wrap_calloc(std::size_t count, std::size_t bytes) {
+    return MayAllocate() ? __real_calloc(count, bytes) : nullptr;
+}
+
+void* __wrap_realloc(void* memory, std::size_t bytes) {
+    return MayAllocate() ? __real_realloc(memory, bytes) : nullptr;
+}
+
+void* __wrap__Znwm(std::size_t bytes) {
+    if (!MayAllocate()) throw std::bad_alloc();
+    return __real__Znwm(bytes);
+}
+
+void* __wrap__ZnwmRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept {
+    return MayAllocate() ? __real__ZnwmRKSt9nothrow_t(bytes, tag) : nullptr;
+}
+
+void* __wrap__Znam(std::size_t bytes) {
+    if (!MayAllocate()) throw std::bad_alloc();
+    return __real__Znam(bytes);
+}
+
+void* __wrap__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept {
+    return MayAllocate() ? __real__ZnamRKSt9nothrow_t(bytes, tag) : nullptr;
+}
+
+}  // extern "C"
