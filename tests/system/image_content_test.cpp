@@ -1,11 +1,14 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <iterator>
+#include <map>
 #include <string>
 #include <tuple>
 #include <utility>
 
 #include "support/reference_renderer.h"
+#include "support/wait_until.h"
 #include "system/camera_session.h"
 
 // What a client gets is what the camera saw: the trace tells what was sent, an independent renderer
@@ -144,10 +147,8 @@ ReferenceExposure GetExposure(ZCamera& camera) {
     return exposure;
 }
 
-void ExpectAsComputed(CameraSession& session, const SmallCamera& small,
-                      const ReferenceExposure& exposure) {
-    const DeliveredFrame delivered = session.Grab();
-
+void ExpectAsComputed(const CameraSession& session, const SmallCamera& small,
+                      const ReferenceExposure& exposure, const DeliveredFrame& delivered) {
     ExpectAsSent(session, delivered);
     EXPECT_EQ(exposure.bitDepth, delivered.frame.bits);
     const auto expected = ReferenceRenderer(small.GetReference()).Render(exposure);
@@ -158,6 +159,11 @@ void ExpectAsComputed(CameraSession& session, const SmallCamera& small,
     ASSERT_EQ(expected.size(), position)
         << "sample " << position % exposure.width << ", " << position / exposure.width << ": "
         << *difference.second << " for " << *difference.first;
+}
+
+void ExpectAsComputed(CameraSession& session, const SmallCamera& small,
+                      const ReferenceExposure& exposure) {
+    ExpectAsComputed(session, small, exposure, session.Grab());
 }
 
 void ExpectAsComputed(CameraSession& session, const SmallCamera& small) {
@@ -297,6 +303,114 @@ TEST(ImageContentTest, TwoFieldsAreWovenIntoOneImage) {
     }
 }
 
+TEST(ImageContentTest, EveryImageOfAStreamOfTwoFieldsIsWovenAnew) {
+    for (const std::uint32_t version : {0U, 1U, 2U}) {
+        SmallCamera small{.model = "Folary",
+                          .streamingVersion = version,
+                          .hasMosaic = true,
+                          .binsWithinMosaic = true};
+        CameraSession session(small.GetScenario());
+        ASSERT_TRUE(session.IsOpen());
+
+        const auto frames = session.Stream(5);
+
+        ASSERT_EQ(5U, frames.size());
+        const ReferenceExposure exposure = GetExposure(session.GetCamera());
+        for (const DeliveredFrame& delivered : frames) {
+            ExpectAsComputed(session, small, exposure, delivered);
+        }
+    }
+}
+
+/// A camera of two fields whose real-time video takes 640 by 480 pixels of its sensor.
+const SmallCamera VideoCamera{
+    .model = "Folary", .width = 2560, .height = 1920, .hasMosaic = true, .binsWithinMosaic = true};
+
+void ExpectVideo(CameraSession& session) {
+    ReferenceExposure exposure = GetExposure(session.GetCamera());
+    EXPECT_EQ(640U, exposure.width);
+    EXPECT_EQ(480U, exposure.height);
+
+    const auto frames = session.Stream(3);
+
+    ASSERT_EQ(3U, frames.size());
+    for (const DeliveredFrame& delivered : frames) {
+        ExpectAsComputed(session, VideoCamera, exposure, delivered);
+    }
+}
+
+TEST(ImageContentTest, RealTimeVideoSendsItsWindowInOneField) {
+    CameraSession session(VideoCamera.GetScenario());
+    ASSERT_TRUE(session.IsOpen());
+    ASSERT_EQ(CameraOk, session.GetCamera().SetRTVMode(true));
+    ASSERT_EQ(CameraOk, session.GetCamera().UpdateSettingsOnCamera());
+
+    ExpectVideo(session);
+
+    ASSERT_EQ(CameraOk, session.GetCamera().SetRTVMode(false));
+    ASSERT_EQ(CameraOk, session.GetCamera().UpdateSettingsOnCamera());
+    EXPECT_EQ(2560U, session.GetCamera().GetImageWidth());
+    ExpectAsSent(session, session.Grab());
+}
+
+TEST(ImageContentTest, ASettingsBlockTurnsRealTimeVideoOn) {
+    CameraSession session(VideoCamera.GetScenario());
+    ASSERT_TRUE(session.IsOpen());
+    Zentara_Settings settings{};
+    ASSERT_EQ(zerrNone, Zentara_ReadSettingsFromCam(session.GetHandle(), &settings));
+    ASSERT_EQ(zerrNone, Zentara_SetParam(&settings, zprmCameraMode, zmodeRealTimeVideo));
+
+    ASSERT_EQ(zerrNone, Zentara_SendSettingsToCam(session.GetHandle(), &settings));
+
+    EXPECT_TRUE(session.GetCamera().GetRTVMode());
+    ExpectVideo(session);
+}
+
+/// Where the wheel's colours stand in its turn.
+std::size_t GetTurnPlace(std::uint32_t colour) {
+    constexpr std::uint32_t Turn[] = {0, 1, 3};
+    return static_cast<std::size_t>(std::find(std::begin(Turn), std::end(Turn), colour) - Turn);
+}
+
+class WheelOnTheWire : public testing::TestWithParam<std::uint32_t> {};
+
+TEST_P(WheelOnTheWire, SendsTheColoursInTurnFromItsStartEachWithItsLightAndExposure) {
+    SmallCamera small{.scene = "chart"};
+    std::string scenario = small.GetScenario();
+    scenario.insert(1, R"("base": "wheel", )");
+    CameraSession session(scenario);
+    ASSERT_TRUE(session.IsOpen());
+    ZCamera& camera = session.GetCamera();
+    ASSERT_EQ(CameraOk, camera.SetRGBFilterRedExposure(9'000'000));
+    ASSERT_EQ(CameraOk, camera.SetExposure(6'000'000));
+    ASSERT_EQ(CameraOk, camera.SetRGBFilterBlueExposure(12'000'000));
+    ASSERT_EQ(CameraOk, camera.SetRGBFilterStartColour(GetParam()));
+    ASSERT_EQ(CameraOk, camera.SetRGBFilterCycle(true));
+    ASSERT_EQ(CameraOk, camera.UpdateSettingsOnCamera());
+
+    ASSERT_EQ(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
+    EXPECT_TRUE(WaitUntil([&] { return session.world.ReadFrames().size() >= 7; }));
+    ASSERT_EQ(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
+
+    std::size_t place = GetTurnPlace(GetParam());
+    constexpr std::uint32_t Turn[] = {0, 1, 3};
+    const std::vector<TraceRecord> sent = session.world.ReadFrames();
+    ASSERT_GE(sent.size(), 7U);
+    for (std::size_t i = 0; i < 7; ++i, place = (place + 1) % 3) {
+        ASSERT_EQ(Turn[place], sent[i].plane) << "frame " << i;
+        ReferenceExposure exposure = GetExposure(camera);
+        exposure.wheelColour = static_cast<int>(Turn[place]);
+        constexpr double Seconds[] = {0.009, 0.006, 0.012};
+        exposure.seconds = Seconds[place];
+        const auto samples = ReferenceRenderer(small.GetReference()).Render(exposure);
+        const std::vector<std::uint8_t> pixels(samples.begin(), samples.end());
+        EXPECT_EQ(CalculateChecksum(pixels.data(), pixels.size()), sent[i].checksum)
+            << "frame " << i;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(StartColours, WheelOnTheWire, testing::Values(0U, 1U, 3U));
+
 TEST(ImageContentTest, TwoBinnedFieldsKeepTheirMosaic) {
     SmallCamera small{
         .model = "Folary", .scene = "chart", .hasMosaic = true, .binsWithinMosaic = true};
@@ -369,17 +483,31 @@ TEST(ImageContentTest, AnImageAbove16MebibytesArrivesWhole) {
     ExpectAsComputed(session, small);
 }
 
-TEST(ImageContentTest, TheSameSeedGivesTheSameNoisyBytes) {
-    const auto grab = [](const char* seed) {
-        CameraSession session(std::string(R"({"cameras": [{"model": "SolvaneA1", "seed": )") +
-                              seed + R"(, "sensor": {"noise": true, "darkCurrent": 0}}]})");
-        return session.IsOpen() ? session.Grab().pixels : std::vector<std::uint8_t>{};
-    };
-    const auto first = grab("5");
+/// Checksums of the first frames that a camera of this seed sent, and the first image delivered.
+/// Which frame that is depends on the client's speed: the noise goes by the frame's number.
+std::map<std::uint32_t, std::uint64_t> GrabNoise(const char* seed) {
+    CameraSession session(std::string(R"({"cameras": [{"model": "SolvaneA1", "seed": )") + seed +
+                          R"(, "sensor": {"noise": true, "darkCurrent": 0}}]})");
+    if (!session.IsOpen()) return {};
+    ExpectAsSent(session, session.Grab());
+    std::map<std::uint32_t, std::uint64_t> checksums;
+    for (const TraceRecord& sent : session.world.ReadFrames()) {
+        checksums[sent.rollingFrameNumber] = sent.checksum;
+    }
+    return checksums;
+}
 
-    EXPECT_FALSE(first.empty());
-    EXPECT_EQ(first, grab("5"));
-    EXPECT_NE(first, grab("6"));
+TEST(ImageContentTest, TheSameSeedGivesTheSameNoisyBytesInEachFrame) {
+    const auto first = GrabNoise("5");
+    const auto second = GrabNoise("5");
+    const auto other = GrabNoise("6");
+
+    ASSERT_TRUE(first.contains(1) && second.contains(1) && other.contains(1));
+    for (const auto& [number, checksum] : first) {
+        if (!second.contains(number)) continue;
+        EXPECT_EQ(checksum, second.at(number)) << "frame " << number;
+    }
+    EXPECT_NE(first.at(1), other.at(1));
 }
 
 }  // namespace
