@@ -125,7 +125,7 @@ constexpr std::array Words{
     WordParameter{.key = zprmColorWheel,
                   .text = {.name = "zprmColorWheel",
                            .unit = "",
-                           .range = "0, 1, 3",
+                           .range = "0, 1, 3, not checked",
                            .meaning = "Colour with which the filter wheel starts",
                            .values = WheelNames},
                   .log = {.label = "Color Wheel", .form = LogForm::Named},
@@ -259,10 +259,11 @@ constexpr std::array Words{
     WordParameter{
         .key = zprmMetronaShutterDelay,
         .text = {.name = "zprmMetronaShutterDelay",
-                 .unit = "us",
+                 .unit = "camera units",
                  .range = "0 to 1000000",
-                 .meaning = "Shutter delay of the OEM model"},
-        .log = {.label = "Metrona Shutter Delay", .form = LogForm::WithUnit, .isNamed = false},
+                 .meaning = "Shutter delay of the OEM model, which rounds it up to a multiple of "
+                            "50"},
+        .log = {.label = "Metrona Shutter Delay", .isNamed = false},
         .read = ReadWord<&ZCamera::GetMetronaShutterDelay>,
         .initial = Initially<1000>,
         .isSupported = Has<&ZCamera::IsMetronaShutterDelaySupported>,

@@ -124,7 +124,15 @@ constexpr const char* DocumentHead =
     "`Zentara_GetParamSparseTable` tell them. The column of tables says which of\n"
     "`Zentara_IsRangeTable` (range) and `Zentara_IsSparseTable` (list) answer yes on a camera "
     "that\n"
-    "has the parameter.\n";
+    "has the parameter.\n"
+    "\n"
+    "A value that is not in a key's list is refused. A value beyond a key's range is stored, and "
+    "the\n"
+    "camera's own answer shows when the block is sent. The exceptions: a cooling target beyond "
+    "its\n"
+    "limits is refused; an exposure beyond its limits is refused and stored all the same, and the "
+    "send\n"
+    "brings it to the nearest limit; \"not checked\" stands where any value is stored.\n";
 
 constexpr const char* NamesHead =
     "// Written by scripts/generate-parameters from the library's own tables; do not edit.\n"
