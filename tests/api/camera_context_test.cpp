@@ -71,11 +71,13 @@ TEST_F(Context, PostProcessingRunsRatioThenBayerThenWhiteBalance) {
 struct LastingCallback {
     std::atomic<bool> isInside{false};
     std::atomic<bool> mayLeave{false};
+    std::atomic<bool> hasLeft{false};
 
     static void Stay(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t) {
         auto& self = *reinterpret_cast<LastingCallback*>(static_cast<std::uintptr_t>(userPrivate));
         self.isInside = true;
         EXPECT_TRUE(ZV::Test::WaitUntil([&] { return self.mayLeave.load(); }));
+        self.hasLeft = true;
     }
 };
 
@@ -86,29 +88,51 @@ class EndlessFrame : public Context {
     EndlessFrame()
         : Context(R"({"base": "mono", "cameras": [{"faults":
               [{"kind": "losePacket", "packet": 1, "count": 0}]}]})") {}
+
+    /// Closes while the exposure thread sits in the callback of a frame.
+    void CloseUnderTheCallback() {
+        ASSERT_ZERR(zerrNone,
+                    Zentara_QueueFrame(handle, frame.Get(), LastingCallback::Stay, zcbExposeDone,
+                                       reinterpret_cast<std::uintptr_t>(&callback), 0));
+        ASSERT_EQ(CameraOk, GetCamera().SetTriggerMode(ztrigSoftware));
+        ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+        ASSERT_ZERR(zerrNone, Zentara_Trigger(handle));
+        ASSERT_TRUE(ZV::Test::WaitUntil([&] { return callback.isInside.load(); }));
+        SetWaitClockDivisor(1000);
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+        SetWaitClockDivisor(1);
+    }
+
+    LastingCallback callback;
+    ZV::Test::ClientFrame frame{1392 * 1040};
 };
 
 TEST_F(EndlessFrame, AnExposureCallbackThatOutlastsTheCloseLeavesNoWheelInThePipeline) {
-    LastingCallback callback;
-    ZV::Test::ClientFrame frame(GetImageBytes());
     ZCamera& camera = GetCamera();
     ZRGBFilterWheel* const wheel = GetContext().rgbWheel.get();
-    ASSERT_ZERR(zerrNone,
-                Zentara_QueueFrame(handle, frame.Get(), LastingCallback::Stay, zcbExposeDone,
-                                   reinterpret_cast<std::uintptr_t>(&callback), 0));
-    ASSERT_EQ(CameraOk, camera.SetTriggerMode(ztrigSoftware));
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
-    ASSERT_ZERR(zerrNone, Zentara_Trigger(handle));
-    ASSERT_TRUE(ZV::Test::WaitUntil([&] { return callback.isInside.load(); }));
 
-    SetWaitClockDivisor(1000);
-    EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
-    SetWaitClockDivisor(1);
+    CloseUnderTheCallback();
 
     EXPECT_FALSE(camera.GetImagePipeline()->RemoveFilter(wheel));
     callback.mayLeave = true;
     Zentara_ReleaseDriver();
     EXPECT_ZERR(zerrNone, Zentara_LoadDriver());
+}
+
+TEST_F(EndlessFrame, ACameraOpenedAgainIsServedWhileAFormerExposureCallbackLasts) {
+    ZV::Test::CallbackLog calls;
+    CloseUnderTheCallback();
+
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, zcbExposeDone));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_ZERR(zerrNone, Zentara_Trigger(handle));
+
+    EXPECT_TRUE(calls.WaitForCalls(1));
+    callback.mayLeave = true;
+    EXPECT_TRUE(ZV::Test::WaitUntil([&] { return callback.hasLeft.load(); }));
+    EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    EXPECT_EQ(1u, calls.CountCalls());
 }
 
 TEST_F(Context, LastSettingsAreExchangedWhole) {
