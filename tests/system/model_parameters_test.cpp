@@ -11,15 +11,17 @@
 #include "support/flat_camera.h"
 #include "support/settings_words.h"
 
-// What every model tells of every parameter, by the version of its configuration block, against
-// tables that are checked in: tests/system/golden/MODEL.txt. Each names, for the first version, all
-// keys with
+// What every model tells of every parameter and information key, by the version of its
+// configuration block, against tables that are checked in: tests/system/golden/MODEL.txt. Each
+// names, for the first version, all keys with
 //
 //     word 12 zprmImageFormat: yes, read 2, default 2, limits 0 to 5, list 0 1 2 3 4 5
 //
 // and for each later version the keys that changed. "no" stands for a parameter that the camera
 // does not have, "range" and "list" for the tables that the key has, "get" for what an accessor
-// gives where it is not the word that was read.
+// gives where it is not the word that was read. Information keys follow as
+//
+//     info 5 zinfBitDepth: 12
 namespace ZV::Test {
 namespace {
 
@@ -46,11 +48,7 @@ std::vector<KnownKey> GetKnownKeys() {
 #include "tools/parameter_names.inc"
     };
     std::vector<KnownKey> keys;
-    for (const Row& row : rows) {
-        if (row.family != ParameterFamily::Information) {
-            keys.push_back({row.family, row.key, row.name});
-        }
-    }
+    for (const Row& row : rows) keys.push_back({row.family, row.key, row.name});
     return keys;
 }
 
@@ -147,9 +145,21 @@ std::string DescribeKey(OpenedBlocks& blocks, const KnownKey& known) {
            (has ? DescribeOffer<Functions>(blocks, known.key, read) : "");
 }
 
+std::string DescribeInformation(ZentaraHandle handle, const KnownKey& known) {
+    constexpr std::uint32_t Untouched = 77;
+    std::uint32_t value = Untouched;
+    const ZentaraResult result = Zentara_GetInfo(handle, known.key, &value);
+    std::string text = "info " + std::to_string(known.key) + " " + known.name + ": ";
+    if (result != zerrNone) text += "refused " + std::to_string(result) + ", ";
+    return text + (value == Untouched ? "untouched" : std::to_string(value));
+}
+
 std::string DescribeKnown(OpenedBlocks& blocks, const KnownKey& known) {
     if (known.family == ParameterFamily::Word) return DescribeKey<WordFunctions>(blocks, known);
     if (known.family == ParameterFamily::Signed) return DescribeKey<SignedFunctions>(blocks, known);
+    if (known.family == ParameterFamily::Information) {
+        return DescribeInformation(blocks.handle, known);
+    }
     return DescribeKey<WideFunctions>(blocks, known);
 }
 
@@ -182,7 +192,7 @@ std::vector<std::string> DescribeCamera(const std::string& model, const std::str
 
 class ModelParameters : public testing::TestWithParam<const char*> {
   protected:
-    // The model that is unknown says so at each question.
+    // The model that is unknown says so at each question, and so do keys without an answer.
     void SetUp() override { testing::internal::CaptureStdout(); }
     void TearDown() override { (void)testing::internal::GetCapturedStdout(); }
 
