@@ -12,6 +12,7 @@ namespace ZentaraProgram {
 namespace {
 
 constexpr double NanosecondsPerSecond = 1e9;
+constexpr double MillionthsPerDecibel = 1e6;
 constexpr double NanometresPerMicrometre = 1000;
 
 std::string GetSoftwareName() {
@@ -19,6 +20,13 @@ std::string GetSoftwareName() {
     (void)Zentara_LibVersion(&major, &minor,
                              &build);  // The library is loaded, so this cannot fail.
     return fmt::format("Zentara {}.{}.{}", major, minor, build);
+}
+
+/// Post-processing may make more bytes of an image, and the buffer must hold either.
+std::size_t GetImageBytes(const Camera& camera, bool isPostProcessed) {
+    const std::uint32_t plain = camera.GetInfo(zinfImageSize).value_or(0);
+    if (!isPostProcessed) return plain;
+    return std::max(plain, camera.GetInfo(zinfPostProcessImageSize).value_or(0));
 }
 
 }  // namespace
@@ -30,26 +38,39 @@ void FrameBuffer::Prepare(std::size_t bytes) {
     frame.bufferSize = static_cast<std::uint32_t>(bytes);
 }
 
-ZentaraResult ReadCaptureFacts(const Camera& camera, CaptureFacts* facts) {
-    const ZentaraResult result = ReadSettings(camera, &facts->settings);
-    if (result != zerrNone) return result;
-    const CameraSettings& settings = facts->settings;
+CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings) {
+    const auto read = [&](ParameterFamily family, std::uint32_t key) {
+        return settings.Get(GetSetting(family, key)).value_or(0);
+    };
+    const auto readWord = [&](std::uint32_t key) {
+        return static_cast<std::uint32_t>(read(ParameterFamily::Word, key));
+    };
+    CaptureFacts facts;
+    facts.imageBytes = GetImageBytes(camera, readWord(zprmDoPostProcessing) != 0);
+    facts.exposureNs = static_cast<std::uint64_t>(read(ParameterFamily::Wide, zprm64Exposure));
     const bool isSplit = camera.GetInfo(zinfAsymmetricalBinning).value_or(0) != 0;
-    facts->imageBytes = camera.GetInfo(zinfImageSize).value_or(0);
-    Image& image = facts->prototype;
+    Image& image = facts.prototype;
     image.model = camera.GetModelName();
     image.serialNumber = camera.GetSerialNumber();
     image.software = GetSoftwareName();
-    image.exposureSeconds = static_cast<double>(settings.exposureNs) / NanosecondsPerSecond;
-    image.binningX = std::max(1U, isSplit ? settings.binningX : settings.binning);
-    image.binningY = std::max(1U, isSplit ? settings.binningY : settings.binning);
-    image.originX = settings.roiX;
-    image.originY = settings.roiY;
-    image.gain = settings.gain;
-    image.offset = settings.offset;
+    image.exposureSeconds = static_cast<double>(facts.exposureNs) / NanosecondsPerSecond;
+    image.binningX = std::max(1U, readWord(isSplit ? zprmHorizontalBinning : zprmBinning));
+    image.binningY = std::max(1U, readWord(isSplit ? zprmVerticalBinning : zprmBinning));
+    image.originX = readWord(zprmRoiX);
+    image.originY = readWord(zprmRoiY);
+    image.gain = readWord(zprmGain);
+    image.offset = readWord(zprmOffset);
+    image.gainDecibels =
+        static_cast<double>(read(ParameterFamily::Signed, zprmS32NormalizedGaindB)) /
+        MillionthsPerDecibel;
+    image.readoutMode = FormatValue(GetSetting(ParameterFamily::Word, zprmReadoutSpeed),
+                                    read(ParameterFamily::Word, zprmReadoutSpeed));
+    image.coolingTargetCelsius =
+        settings.Get(GetSetting(ParameterFamily::Signed, zprmS32RegulatedCoolingTemp));
+    image.isPostProcessed = readWord(zprmDoPostProcessing) != 0;
     image.pixelSizeMicrometres =
         ZV::GetSensorPixelSize(camera.GetInfo(zinfCcd).value_or(0)) / NanometresPerMicrometre;
-    return zerrNone;
+    return facts;
 }
 
 bool IsWritable(const Zentara_Frame& frame) {
@@ -67,6 +88,7 @@ Image MakeImage(const CaptureFacts& facts, const FrameBuffer& buffer,
     image.bytesPerSample = frame.size >= 2 * pixels ? 2 : 1;
     image.pixels = buffer.pixels;
     image.pixels.resize(pixels * image.bytesPerSample);
+    image.format = FormatValue(GetSetting(ParameterFamily::Word, zprmImageFormat), frame.format);
     image.isBayer = Zentara_isBayer(frame.format) != 0;
     image.bayerPattern = frame.bayerPattern;
     image.frameNumber = frame.frameNumber;

@@ -6,6 +6,7 @@
 
 #include "driver.h"
 #include "image_file.h"
+#include "settings_block.h"
 
 namespace ZentaraProgram {
 
@@ -18,13 +19,14 @@ struct FrameBuffer {
     void Prepare(std::size_t bytes);
 };
 
-/// What all images of one capture share, read from an open camera.
+/// What all images of one capture share.
 struct CaptureFacts {
-    std::uint32_t imageBytes = 0;
+    std::size_t imageBytes = 0;
+    std::uint64_t exposureNs = 0;
     Image prototype;
-    CameraSettings settings;
 };
-ZentaraResult ReadCaptureFacts(const Camera& camera, CaptureFacts* facts);
+/// From an open camera and the block of the settings in force.
+CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings);
 
 /// True for a format with one sample a pixel, which the writers take.
 bool IsWritable(const Zentara_Frame& frame);

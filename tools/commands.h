@@ -2,8 +2,10 @@
 
 #include <cstdint>
 #include <string>
+#include <vector>
 
 #include "exit_codes.h"
+#include "settings_options.h"
 
 namespace ZentaraProgram {
 
@@ -16,12 +18,14 @@ struct CommonOptions {
 
 struct GrabOptions {
     std::string output;
+    SettingsOptions settings;
     double timeoutSeconds = 60;
     bool mayOverwrite = false;
 };
 
 struct StreamOptions {
-    std::string output;          ///< Name of numbered files, or empty for none.
+    std::string output;  ///< Name of numbered files, or empty for none.
+    SettingsOptions settings;
     std::uint64_t count = 0;     ///< 0: no limit of frames.
     double durationSeconds = 0;  ///< 0: no limit of time.
     double timeoutSeconds = 60;  ///< Longest wait for one frame.
@@ -30,7 +34,17 @@ struct StreamOptions {
 };
 
 ExitCode RunList(const CommonOptions& common);
-ExitCode RunInfo(const CommonOptions& common);
+/// Without keys: all that there is.
+ExitCode RunInfo(const CommonOptions& common, const std::vector<std::string>& keys);
+ExitCode RunGet(const CommonOptions& common, const std::vector<std::string>& keys);
+ExitCode RunLimits(const CommonOptions& common, const std::vector<std::string>& keys);
+/// Sends the settings and shows what they changed.
+ExitCode RunSet(const CommonOptions& common, const SettingsOptions& options);
+/// Shows what a send would change.
+ExitCode RunPreflight(const CommonOptions& common, const SettingsOptions& options);
+/// Writes the settings in force to a file, after those of `options` were sent.
+ExitCode RunSave(const CommonOptions& common, const std::string& file,
+                 const SettingsOptions& options);
 ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options);
 ExitCode RunStream(const CommonOptions& common, const StreamOptions& options);
 

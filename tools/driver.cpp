@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <array>
-#include <cstring>
 
 #include "output.h"
 
@@ -35,19 +34,6 @@ constexpr std::array ResultTexts{
     ResultText{zerrUnplugged, "the camera was unplugged or turned off"},
     ResultText{zerrCameraBusy, "the camera or its bus is busy"},
 };
-
-// Places of a settings block, in bytes: 32-bit words from 4, signed words from 192, 64-bit words
-// from 204.
-template <typename Value>
-Value ReadWord(const Zentara_Settings& settings, std::size_t offset) {
-    Value value{};
-    std::memcpy(&value, reinterpret_cast<const unsigned char*>(&settings) + offset, sizeof value);
-    return value;
-}
-
-std::uint32_t ReadWord32(const Zentara_Settings& settings, std::uint32_t key) {
-    return ReadWord<std::uint32_t>(settings, 4 + std::size_t{4} * key);
-}
 
 using TextFunction = ZentaraResult (*)(ZentaraHandle, char*, std::uint32_t);
 
@@ -117,24 +103,6 @@ std::string Camera::GetSerialNumber() const {
     return ReadText(handle, &Zentara_GetSerialString);
 }
 
-ZentaraResult ReadSettings(const Camera& camera, CameraSettings* settings) {
-    Zentara_Settings block{};
-    const ZentaraResult result = Zentara_ReadSettingsFromCam(camera.GetHandle(), &block);
-    if (result != zerrNone) return result;
-    settings->exposureNs = ReadWord<std::uint64_t>(block, 204);
-    settings->gain = ReadWord32(block, zprmGain);
-    settings->offset = ReadWord32(block, zprmOffset);
-    settings->binning = ReadWord32(block, zprmBinning);
-    settings->binningX = ReadWord32(block, zprmHorizontalBinning);
-    settings->binningY = ReadWord32(block, zprmVerticalBinning);
-    settings->roiX = ReadWord32(block, zprmRoiX);
-    settings->roiY = ReadWord32(block, zprmRoiY);
-    settings->roiWidth = ReadWord32(block, zprmRoiWidth);
-    settings->roiHeight = ReadWord32(block, zprmRoiHeight);
-    settings->coolingTargetCelsius = ReadWord<std::int32_t>(block, 200);
-    return zerrNone;
-}
-
 ExitCode OpenListedCamera(Driver& driver, std::uint32_t cameraId, Camera* camera,
                           std::uint32_t* uniqueId) {
     if (driver.GetLoadResult() != zerrNone) {
@@ -170,6 +138,14 @@ ExitCode JudgeFailure(Driver& driver, Camera& camera, std::uint32_t uniqueId,
     if (isThere) return GetExitCode(result);
     PrintError("the camera is gone from the bus");
     return ExitCameraGone;
+}
+
+ExitCode Session::Open(std::uint32_t cameraId) {
+    return OpenListedCamera(driver, cameraId, &camera, &uniqueId);
+}
+
+ExitCode Session::Judge(ZentaraResult result) {
+    return JudgeFailure(driver, camera, uniqueId, result);
 }
 
 }  // namespace ZentaraProgram

@@ -54,16 +54,6 @@ class Camera {
     ZentaraHandle handle = 0;
 };
 
-/// Settings in force, read from the words of a block that Zentara_ReadSettingsFromCam has filled.
-struct CameraSettings {
-    std::uint64_t exposureNs = 0;
-    std::uint32_t gain = 0, offset = 0;
-    std::uint32_t binning = 1, binningX = 1, binningY = 1;
-    std::uint32_t roiX = 0, roiY = 0, roiWidth = 0, roiHeight = 0;
-    std::int32_t coolingTargetCelsius = 0;
-};
-ZentaraResult ReadSettings(const Camera& camera, CameraSettings* settings);
-
 /// Finds the camera `cameraId` in a new list and opens it; says on standard error why it cannot.
 /// `uniqueId` receives the low half of its unique id.
 ExitCode OpenListedCamera(Driver& driver, std::uint32_t cameraId, Camera* camera,
@@ -71,5 +61,22 @@ ExitCode OpenListedCamera(Driver& driver, std::uint32_t cameraId, Camera* camera
 
 /// The exit code after a failed capture: the camera is closed and looked for in a new list.
 ExitCode JudgeFailure(Driver& driver, Camera& camera, std::uint32_t uniqueId, ZentaraResult result);
+
+/// The loaded library with one open camera.
+class Session {
+  public:
+    /// As OpenListedCamera.
+    ExitCode Open(std::uint32_t cameraId);
+    /// As JudgeFailure.
+    ExitCode Judge(ZentaraResult result);
+
+    [[nodiscard]] const Camera& GetCamera() const { return camera; }
+    void Close() { camera.Close(); }
+
+  private:
+    Driver driver;
+    Camera camera;  // behind the driver, so that it is closed first
+    std::uint32_t uniqueId = 0;
+};
 
 }  // namespace ZentaraProgram

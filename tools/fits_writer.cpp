@@ -28,6 +28,12 @@ class HeaderWriter {
     void Number(const char* key, std::uint64_t value, const char* comment) {
         fits_write_key_lng(file, key, static_cast<LONGLONG>(value), comment, status);
     }
+    void Signed(const char* key, std::int64_t value, const char* comment) {
+        fits_write_key_lng(file, key, value, comment, status);
+    }
+    void Truth(const char* key, bool value, const char* comment) {
+        fits_write_key_log(file, key, value ? 1 : 0, comment, status);
+    }
     void Decimal(const char* key, double value, int digits, const char* comment) {
         fits_write_key_dbl(file, key, value, digits, comment, status);
     }
@@ -54,6 +60,12 @@ void WriteHeader(fitsfile* file, const Image& image, int* status) {
     }
     header.Number("GAIN", image.gain, "Gain, camera units");
     header.Number("OFFSET", image.offset, "Offset, camera units");
+    header.Decimal("GAINDB", image.gainDecibels, -15, "[dB] Gain");
+    header.Text("READOUTM", image.readoutMode, "Readout speed");
+    if (image.coolingTargetCelsius)
+        header.Signed("SET-TEMP", *image.coolingTargetCelsius, "[degC] Target of the cooling");
+    header.Text("IMGFORM", image.format, "Format of the samples");
+    header.Truth("POSTPROC", image.isPostProcessed, "Post-processed by the library");
     if (image.isBayer)
         header.Text("BAYERPAT", BayerNames[image.bayerPattern & 3U], "Mosaic of the first pixel");
     header.Text("ROWORDER", "TOP-DOWN", "The first row is the top of the image");

@@ -102,28 +102,34 @@ ExitCode CheckOutput(const GrabOptions& options) {
     return ExitDone;
 }
 
+/// One image into `buffer`; `hasTimedOut` tells why none came.
+ZentaraResult Grab(const Camera& camera, double timeoutSeconds, FrameBuffer* buffer,
+                   bool* hasTimedOut) {
+    GrabWatch watch(camera.GetHandle(), timeoutSeconds);
+    const ZentaraResult result = Zentara_GrabFrame(camera.GetHandle(), &buffer->frame);
+    watch.Finish();
+    *hasTimedOut = watch.HasAborted();
+    return result;
+}
+
 }  // namespace
 
 ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options) {
     if (const ExitCode checked = CheckOutput(options); checked != ExitDone) return checked;
-    Driver driver;
-    Camera camera;
-    std::uint32_t uniqueId = 0;
-    const ExitCode opened = OpenListedCamera(driver, common.camera, &camera, &uniqueId);
-    if (opened != ExitDone) return opened;
+    Session session;
+    SentSettings settings;
+    const ExitCode prepared =
+        OpenWithSettings(common.camera, options.settings, &session, &settings);
+    if (prepared != ExitDone) return prepared;
 
-    CaptureFacts facts;
+    TellMended(settings, settings.sent);
+    const CaptureFacts facts = GetCaptureFacts(session.GetCamera(), settings.sent);
     FrameBuffer buffer;
-    ZentaraResult result = ReadCaptureFacts(camera, &facts);
     buffer.Prepare(facts.imageBytes);
     const auto begin = std::chrono::system_clock::now();
-    bool hasAborted = false;
-    if (result == zerrNone) {
-        GrabWatch watch(camera.GetHandle(), options.timeoutSeconds);
-        result = Zentara_GrabFrame(camera.GetHandle(), &buffer.frame);
-        watch.Finish();
-        hasAborted = watch.HasAborted();
-    }
+    bool hasTimedOut = false;
+    const ZentaraResult result =
+        Grab(session.GetCamera(), options.timeoutSeconds, &buffer, &hasTimedOut);
     if (result == zerrNone) {
         if (IsWritable(buffer.frame))
             return SaveImage(common, options, MakeImage(facts, buffer, begin));
@@ -131,9 +137,9 @@ ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options) {
         return ExitFailed;
     }
     if (IsInterrupted()) return ExitInterrupted;
-    PrintError(hasAborted ? fmt::format("no image came within {:g} s", options.timeoutSeconds)
-                          : "no image: " + DescribeResult(result));
-    return JudgeFailure(driver, camera, uniqueId, result);
+    PrintError(hasTimedOut ? fmt::format("no image came within {:g} s", options.timeoutSeconds)
+                           : "no image: " + DescribeResult(result));
+    return session.Judge(result);
 }
 
 }  // namespace ZentaraProgram

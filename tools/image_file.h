@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -21,6 +22,11 @@ struct Image {
     std::uint32_t binningX = 1, binningY = 1, originX = 0, originY = 0;
     double pixelSizeMicrometres = 0;  ///< Unbinned; 0 when it is not known.
     std::uint32_t gain = 0, offset = 0;
+    double gainDecibels = 0;
+    std::string format;       ///< "Mono 16-Bit"
+    std::string readoutMode;  ///< "20 MHz"
+    std::optional<std::int64_t> coolingTargetCelsius;
+    bool isPostProcessed = false;
     std::uint32_t frameNumber = 0, frameError = 0;
 };
 

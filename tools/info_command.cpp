@@ -1,94 +1,208 @@
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <array>
+#include <cctype>
 #include <nlohmann/json.hpp>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "commands.h"
 #include "driver.h"
 #include "output.h"
+#include "setting_names.h"
+#include "setting_values.h"
 
 namespace ZentaraProgram {
 namespace {
 
-struct InfoRow {
+/// Answers without a meaning; the serial number is a text.
+constexpr std::array<std::uint32_t, 5> LeftOut{zinfSerialNumber, zinfReserved7, zinfReserved27,
+                                               zinfReserved28, zinfReserved35};
+
+constexpr std::array<std::uint32_t, 14> YesOrNo{zinfCooled,
+                                                zinfIsModelB,
+                                                zinfRegulatedCooling,
+                                                zinfRegulatedCoolingLock,
+                                                zinfFanControl,
+                                                zinfHighSensitivityMode,
+                                                zinfBlackoutMode,
+                                                zinfAsymmetricalBinning,
+                                                zinfEMGain,
+                                                zinfCloseDelay,
+                                                zinfColorWheelSupported,
+                                                zinfReserved2,
+                                                zinfReserved3,
+                                                zinfReserved4};
+
+/// Names that do not follow from the key. The last three keys keep reserved names in the header.
+struct SpecialName {
     std::uint32_t key;
-    const char* name;
-    const char* label;
+    const char* name;  ///< Null for that of the key.
+    const char* jsonName;
+};
+constexpr std::array SpecialNames{
+    SpecialName{zinfExposureRes, nullptr, "exposureResolution"},
+    SpecialName{zinfTriggerDelayRes, nullptr, "triggerDelayResolution"},
+    SpecialName{zinfNormGaindBRes, nullptr, "normGaindBResolution"},
+    SpecialName{zinfNormITGainSigFigs, nullptr, "normIntensifierGainSigFigs"},
+    SpecialName{zinfNormITGaindBRes, nullptr, "normIntensifierGaindBResolution"},
+    SpecialName{zinfEMGain, nullptr, "emGain"},
+    SpecialName{zinfColorWheelSupported, nullptr, "colorWheel"},
+    SpecialName{zinfReserved2, "dither-control", "ditherControl"},
+    SpecialName{zinfReserved3, "high-gain-mode", "highGainMode"},
+    SpecialName{zinfReserved4, "v-clock-control", "vClockControl"},
 };
 
-// In the order of the keys; those without a meaning are left out.
-constexpr std::array InfoRows{
-    InfoRow{zinfCameraType, "cameraType", "Camera type"},
-    InfoRow{zinfHardwareVersion, "hardwareVersion", "Hardware version"},
-    InfoRow{zinfFirmwareVersion, "firmwareVersion", "Firmware version"},
-    InfoRow{zinfCcd, "ccd", "Sensor id"},
-    InfoRow{zinfBitDepth, "bitDepth", "Maximum bit depth"},
-    InfoRow{zinfCooled, "cooled", "Cooled"},
-    InfoRow{zinfImageWidth, "imageWidth", "Image width, pixels"},
-    InfoRow{zinfImageHeight, "imageHeight", "Image height, pixels"},
-    InfoRow{zinfImageSize, "imageSize", "Image size, bytes"},
-    InfoRow{zinfCcdType, "ccdType", "Sensor kind (0 mono, 1 Bayer)"},
-    InfoRow{zinfCcdWidth, "ccdWidth", "Sensor width, pixels"},
-    InfoRow{zinfCcdHeight, "ccdHeight", "Sensor height, pixels"},
-    InfoRow{zinfFirmwareBuild, "firmwareBuild", "Firmware build"},
-    InfoRow{zinfUniqueId, "uniqueId", "Unique id, low half"},
-    InfoRow{zinfIsModelB, "isModelB", "Model B"},
-    InfoRow{zinfIntensifierModel, "intensifierModel", "Intensifier model"},
-    InfoRow{zinfExposureRes, "exposureResolution", "Exposure resolution, ns"},
-    InfoRow{zinfTriggerDelayRes, "triggerDelayResolution", "Trigger delay resolution, ns"},
-    InfoRow{zinfStreamVersion, "streamVersion", "Streaming version"},
-    InfoRow{zinfNormGainSigFigs, "normGainSigFigs", "Gain, significant figures"},
-    InfoRow{zinfNormGaindBRes, "normGaindBResolution", "Gain resolution, millionths of a dB"},
-    InfoRow{zinfNormITGainSigFigs, "normIntensifierGainSigFigs",
-            "Intensifier gain, significant figures"},
-    InfoRow{zinfNormITGaindBRes, "normIntensifierGaindBResolution",
-            "Intensifier gain resolution, millionths of a dB"},
-    InfoRow{zinfRegulatedCooling, "regulatedCooling", "Regulated cooling"},
-    InfoRow{zinfRegulatedCoolingLock, "regulatedCoolingLock", "Cooling has reached its target"},
-    InfoRow{zinfFanControl, "fanControl", "Fan control"},
-    InfoRow{zinfHighSensitivityMode, "highSensitivityMode", "High sensitivity mode"},
-    InfoRow{zinfBlackoutMode, "blackoutMode", "Blackout mode"},
-    InfoRow{zinfPostProcessImageSize, "postProcessImageSize",
-            "Size of a post-processed image, bytes"},
-    InfoRow{zinfAsymmetricalBinning, "asymmetricalBinning", "Separate binning of the axes"},
-    InfoRow{zinfEMGain, "emGain", "Electron-multiplying gain"},
-    InfoRow{zinfCloseDelay, "closeDelay", "Shutter close delay"},
-    InfoRow{zinfColorWheelSupported, "colorWheel", "Colour wheel"},
+/// A question to the camera by its names.
+struct InfoRow {
+    const ParameterName* parameter;
+    std::string name, jsonName;
 };
 
-void PrintInfo(const Camera& camera) {
-    Print(fmt::format("{:<40} {}\n", "Model", camera.GetModelName()));
-    Print(fmt::format("{:<40} {}\n", "Serial number", camera.GetSerialNumber()));
-    for (const InfoRow& row : InfoRows) {
-        const auto value = camera.GetInfo(row.key);
-        Print(fmt::format("{:<40} {}\n", row.label, value ? std::to_string(*value) : "-"));
-    }
+/// "zinfCcdWidth" becomes "ccdWidth".
+std::string MakeJsonName(std::string_view keyName) {
+    constexpr std::string_view Prefix = "zinf";
+    std::string name(keyName.substr(Prefix.size()));
+    name.front() = static_cast<char>(std::tolower(static_cast<unsigned char>(name.front())));
+    return name;
 }
 
-nlohmann::json GetInfoAsJson(const Camera& camera) {
-    nlohmann::json info{{"model", camera.GetModelName()},
-                        {"serialNumber", camera.GetSerialNumber()}};
-    for (const InfoRow& row : InfoRows) {
-        const auto value = camera.GetInfo(row.key);
-        info[row.name] = value ? nlohmann::json(*value) : nlohmann::json(nullptr);
+InfoRow MakeRow(const ParameterName& parameter) {
+    InfoRow row{&parameter, MakeName(parameter.name), MakeJsonName(parameter.name)};
+    for (const SpecialName& special : SpecialNames) {
+        if (special.key != parameter.key) continue;
+        row.jsonName = special.jsonName;
+        if (special.name != nullptr) row.name = special.name;
     }
-    return info;
+    return row;
+}
+
+template <typename List>
+bool Holds(const List& list, std::uint32_t key) {
+    return std::find(list.begin(), list.end(), key) != list.end();
+}
+
+std::vector<InfoRow> GetRows() {
+    std::vector<InfoRow> rows;
+    for (const ParameterName& parameter : GetParameterNames()) {
+        const bool isInformation = parameter.family == ParameterFamily::Information;
+        if (isInformation && !Holds(LeftOut, parameter.key)) rows.push_back(MakeRow(parameter));
+    }
+    return rows;
+}
+
+/// A line of the answer: what there is to tell, as text and as JSON.
+struct InfoAnswer {
+    std::string name, jsonName, meaning, text;
+    nlohmann::json json;
+};
+
+std::string FormatInfo(const InfoRow& row, std::uint32_t value) {
+    const std::uint32_t key = row.parameter->key;
+    if (Holds(YesOrNo, key)) return value != 0 ? "yes" : "no";
+    if (key == zinfCcdType) return value != 0 ? "colour mosaic" : "monochrome";
+    const bool isNamed = row.parameter->values[0].name != nullptr;
+    return FormatValue({.parameter = row.parameter,
+                        .name = row.name,
+                        .ruleName = row.name,
+                        .kind = isNamed ? ValueKind::Choice : ValueKind::Number,
+                        .isStored = false},
+                       value);
+}
+
+/// What stands behind a semicolon is for programmers.
+std::string GetMeaning(const ParameterName& parameter) {
+    const std::string_view meaning = parameter.meaning;
+    return std::string(meaning.substr(0, meaning.find(';')));
+}
+
+InfoAnswer MakeAnswer(const Camera& camera, const InfoRow& row) {
+    const auto value = camera.GetInfo(row.parameter->key);
+    return {row.name, row.jsonName, GetMeaning(*row.parameter),
+            value ? FormatInfo(row, *value) : "-",
+            value ? nlohmann::json(*value) : nlohmann::json(nullptr)};
+}
+
+std::vector<InfoAnswer> GetAnswers(const Camera& camera) {
+    const std::string model = camera.GetModelName(), serial = camera.GetSerialNumber();
+    std::vector<InfoAnswer> answers{
+        {"model", "model", "Model", model, model},
+        {"serial-number", "serialNumber", "Serial number", serial, serial}};
+    for (const InfoRow& row : GetRows()) answers.push_back(MakeAnswer(camera, row));
+    return answers;
+}
+
+std::vector<std::string> GetInfoNames() {
+    std::vector<std::string> names{"model", "serial-number"};
+    for (const InfoRow& row : GetRows()) names.push_back(row.name);
+    return names;
+}
+
+/// The name of a row by what a user wrote: its name, that of the header or that in JSON.
+std::string FindInfoName(const std::string& written) {
+    const std::string simple = Simplify(written);
+    for (const std::string& name : GetInfoNames()) {
+        if (Simplify(name) == simple) return name;
+    }
+    for (const InfoRow& row : GetRows()) {
+        if (Simplify(row.jsonName) == simple || row.parameter->name == written) return row.name;
+    }
+    return {};
+}
+
+ExitCode FindNames(const std::vector<std::string>& keys, std::vector<std::string>* names) {
+    ExitCode code = ExitDone;
+    for (const std::string& key : keys) {
+        names->push_back(FindInfoName(key));
+        if (!names->back().empty()) continue;
+        PrintError(DescribeUnknown("information", key, GetInfoNames()));
+        code = ExitWrongUse;
+    }
+    return code;
+}
+
+std::vector<InfoAnswer> Choose(const std::vector<InfoAnswer>& answers,
+                               const std::vector<std::string>& names) {
+    if (names.empty()) return answers;
+    std::vector<InfoAnswer> chosen;
+    for (const std::string& name : names) {
+        const auto found = std::find_if(answers.begin(), answers.end(),
+                                        [&](const InfoAnswer& row) { return row.name == name; });
+        if (found != answers.end()) chosen.push_back(*found);
+    }
+    return chosen;
+}
+
+void PrintAnswers(const std::vector<InfoAnswer>& answers) {
+    std::size_t nameWidth = 0, textWidth = 0;
+    for (const InfoAnswer& answer : answers) {
+        nameWidth = std::max(nameWidth, answer.name.size());
+        textWidth = std::max(textWidth, answer.text.size());
+    }
+    for (const InfoAnswer& answer : answers) {
+        Print(fmt::format("{:<{}}  {:<{}}  {}\n", answer.name, nameWidth, answer.text, textWidth,
+                          answer.meaning));
+    }
 }
 
 }  // namespace
 
-ExitCode RunInfo(const CommonOptions& common) {
-    Driver driver;
-    Camera camera;
-    std::uint32_t uniqueId = 0;
-    const ExitCode opened = OpenListedCamera(driver, common.camera, &camera, &uniqueId);
+ExitCode RunInfo(const CommonOptions& common, const std::vector<std::string>& keys) {
+    std::vector<std::string> names;
+    if (const ExitCode found = FindNames(keys, &names); found != ExitDone) return found;
+    Session session;
+    const ExitCode opened = session.Open(common.camera);
     if (opened != ExitDone) return opened;
-    if (common.asJson) {
-        PrintJson(GetInfoAsJson(camera));
-    } else {
-        PrintInfo(camera);
+    const std::vector<InfoAnswer> answers = Choose(GetAnswers(session.GetCamera()), names);
+    if (!common.asJson) {
+        PrintAnswers(answers);
+        return ExitDone;
     }
+    nlohmann::json info = nlohmann::json::object();
+    for (const InfoAnswer& answer : answers) info[answer.jsonName] = answer.json;
+    PrintJson(info);
     return ExitDone;
 }
 

@@ -1,7 +1,12 @@
+#include <fmt/format.h>
+
 #include <CLI/CLI.hpp>
+#include <algorithm>
+#include <charconv>
 #include <cstdio>
 #include <exception>
 #include <string>
+#include <vector>
 
 #include "commands.h"
 #include "interrupt.h"
@@ -11,10 +16,27 @@
 namespace ZentaraProgram {
 namespace {
 
+constexpr const char* SettingsNote =
+    "Values carry their units (exposure=250ms, gain-db=3.5, cooling=-10C) or names "
+    "(image-format=mono16,\n"
+    "trigger-type=software, cooler-active=on). `zentara limits` shows what a camera allows.";
+constexpr const char* SetNote =
+    "A camera is set up anew whenever cameras are listed, by this program too: what is set lasts "
+    "until\n"
+    "then. For images with other settings use `zentara grab --set` or `zentara stream --set`.";
+constexpr const char* PreflightNote =
+    "Shows what a send would make of the settings, and sends nothing. But a camera in real-time "
+    "video\n"
+    "leaves that mode and enters it again to be asked for the limits of the standard mode: that\n"
+    "stops a stream.";
+
 struct Arguments {
     CommonOptions common;
     GrabOptions grab;
     StreamOptions stream;
+    SettingsOptions settings;
+    std::string file;
+    std::vector<std::string> words;  ///< Keys or assignments, with the camera's number before them.
 };
 
 /// Options that may stand before or behind the name of the command.
@@ -26,8 +48,57 @@ void AddCommon(CLI::App* command, CommonOptions* common) {
 
 void AddCamera(CLI::App* command, CommonOptions* common) {
     AddCommon(command, common);
-    command->add_option("camera", common->camera, "Number of the camera in the list")
+    command->add_option("camera,--camera", common->camera, "Number of the camera in the list")
         ->default_val(0);
+}
+
+/// The camera's number may stand before words that are none.
+void AddWords(CLI::App* command, Arguments* arguments, const char* name, const char* meaning) {
+    AddCommon(command, &arguments->common);
+    command->add_option("--camera", arguments->common.camera, "Number of the camera in the list")
+        ->default_val(0);
+    command->add_option(name, arguments->words, meaning);
+}
+
+void AddSettings(CLI::App* command, SettingsOptions* settings) {
+    command->add_option("--load", settings->file, "File of settings to send first");
+    command->add_option("--set", settings->assignments, "KEY=VALUE, as often as needed")
+        ->allow_extra_args(false);
+}
+
+void AddQuestions(CLI::App& app, Arguments* arguments) {
+    constexpr const char* Words = "Number of the camera, then names; without names all";
+    AddWords(app.add_subcommand("info", "Tell what a camera is and can do"), arguments, "keys",
+             Words);
+    AddWords(app.add_subcommand("get", "Show the settings in force"), arguments, "keys", Words);
+    AddWords(app.add_subcommand("limits", "Show what a camera allows for its settings"), arguments,
+             "keys", Words);
+}
+
+void AddSet(CLI::App& app, Arguments* arguments) {
+    CLI::App* set = app.add_subcommand("set", "Send settings and show what they changed");
+    AddWords(set, arguments, "assignments", "Number of the camera, then KEY=VALUE ...");
+    set->get_option("assignments")->required();
+    set->footer(fmt::format("{}\n\n{}", SettingsNote, SetNote));
+    CLI::App* preflight =
+        app.add_subcommand("preflight", "Show what settings would change, and change nothing");
+    AddCamera(preflight, &arguments->common);
+    AddSettings(preflight, &arguments->settings);
+    preflight->footer(fmt::format("{}\n\n{}", PreflightNote, SettingsNote));
+}
+
+void AddSettingsFiles(CLI::App& app, Arguments* arguments) {
+    CLI::App* settings = app.add_subcommand("settings", "Keep settings in files");
+    AddCommon(settings, &arguments->common);
+    settings->require_subcommand(1);
+    CLI::App* save = settings->add_subcommand("save", "Write the settings in force to a file");
+    CLI::App* load = settings->add_subcommand("load", "Send the settings of a file");
+    for (CLI::App* command : {save, load}) {
+        command->add_option("file", arguments->file, "File of settings, JSON")->required();
+        AddCamera(command, &arguments->common);
+    }
+    AddSettings(save, &arguments->settings);
+    load->footer(SetNote);
 }
 
 void AddGrab(CLI::App& app, Arguments* arguments) {
@@ -39,6 +110,8 @@ void AddGrab(CLI::App& app, Arguments* arguments) {
                      "Longest wait for the image, seconds")
         ->default_val(60)
         ->check(CLI::Range(0.001, 1e6));
+    AddSettings(grab, &arguments->grab.settings);
+    grab->footer(SettingsNote);
 }
 
 void AddStream(CLI::App& app, Arguments* arguments) {
@@ -58,9 +131,69 @@ void AddStream(CLI::App& app, Arguments* arguments) {
         ->default_val(8)
         ->check(CLI::Range(1, 100));
     stream->add_flag("-q,--quiet", options->isQuiet, "No progress");
+    AddSettings(stream, &options->settings);
+    stream->footer(SettingsNote);
 }
 
-ExitCode RunCommand(const CLI::App& app, const Arguments& arguments) {
+bool IsNumber(const std::string& text) {
+    return !text.empty() &&
+           std::all_of(text.begin(), text.end(), [](char c) { return c >= '0' && c <= '9'; });
+}
+
+/// Takes the camera's number out of the words. False when it is too large for one.
+bool TakeCamera(Arguments* arguments) {
+    std::vector<std::string>& words = arguments->words;
+    if (words.empty() || !IsNumber(words.front())) return true;
+    const std::string& text = words.front();
+    const auto [end, problem] =
+        std::from_chars(text.data(), text.data() + text.size(), arguments->common.camera);
+    if (problem != std::errc{}) return false;
+    words.erase(words.begin());
+    return true;
+}
+
+ExitCode RunSetOfWords(const Arguments& arguments) {
+    if (!arguments.words.empty()) return RunSet(arguments.common, {{}, arguments.words});
+    PrintError("there is nothing to set; KEY=VALUE is wanted");
+    return ExitWrongUse;
+}
+
+/// A command and what runs it, by the names on the command line.
+struct CommandRow {
+    std::vector<const char*> names;
+    ExitCode (*run)(const Arguments&);
+};
+
+const std::vector<CommandRow>& GetCommands() {
+    static const std::vector<CommandRow> commands{
+        {{"list"}, [](const Arguments& a) { return RunList(a.common); }},
+        {{"info"}, [](const Arguments& a) { return RunInfo(a.common, a.words); }},
+        {{"get"}, [](const Arguments& a) { return RunGet(a.common, a.words); }},
+        {{"limits"}, [](const Arguments& a) { return RunLimits(a.common, a.words); }},
+        {{"set"}, RunSetOfWords},
+        {{"preflight"}, [](const Arguments& a) { return RunPreflight(a.common, a.settings); }},
+        {{"settings", "save"},
+         [](const Arguments& a) { return RunSave(a.common, a.file, a.settings); }},
+        {{"settings", "load"},
+         [](const Arguments& a) {
+             return RunSet(a.common, {a.file, {}});
+         }},
+        {{"grab"}, [](const Arguments& a) { return RunGrab(a.common, a.grab); }},
+        {{"stream"}, [](const Arguments& a) { return RunStream(a.common, a.stream); }},
+    };
+    return commands;
+}
+
+bool IsChosen(const CLI::App& app, const CommandRow& command) {
+    const CLI::App* place = &app;
+    for (const char* name : command.names) {
+        if (!place->got_subcommand(name)) return false;
+        place = place->get_subcommand(name);
+    }
+    return true;
+}
+
+ExitCode RunCommand(const CLI::App& app, Arguments arguments) {
     if (!arguments.common.simulation.empty()) {
         std::string message;
         if (!CheckScenario(arguments.common.simulation, &message)) {
@@ -69,10 +202,14 @@ ExitCode RunCommand(const CLI::App& app, const Arguments& arguments) {
         }
         SetVariable("ZENTARA_SIMULATION", arguments.common.simulation);
     }
-    if (app.got_subcommand("list")) return RunList(arguments.common);
-    if (app.got_subcommand("info")) return RunInfo(arguments.common);
-    if (app.got_subcommand("grab")) return RunGrab(arguments.common, arguments.grab);
-    return RunStream(arguments.common, arguments.stream);
+    if (!TakeCamera(&arguments)) {
+        PrintError(fmt::format("there is no camera {}", arguments.words.front()));
+        return ExitNoCamera;
+    }
+    for (const CommandRow& command : GetCommands()) {
+        if (IsChosen(app, command)) return command.run(arguments);
+    }
+    return ExitWrongUse;
 }
 
 ExitCode Run(int count, char** values) {
@@ -87,7 +224,9 @@ ExitCode Run(int count, char** values) {
     AddCommon(&app, &arguments.common);
     AddCommon(app.add_subcommand("list", "List the cameras that nobody else holds"),
               &arguments.common);
-    AddCamera(app.add_subcommand("info", "Tell what a camera is and can do"), &arguments.common);
+    AddQuestions(app, &arguments);
+    AddSet(app, &arguments);
+    AddSettingsFiles(app, &arguments);
     AddGrab(app, &arguments);
     AddStream(app, &arguments);
     try {

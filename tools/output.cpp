@@ -21,6 +21,10 @@ void PrintJson(const nlohmann::json& value) {
     Print(value.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
 }
 
+void PrintJson(const nlohmann::ordered_json& value) {
+    Print(value.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace) + "\n");
+}
+
 void PrintError(const std::string& text) {
     (void)std::fputs(("zentara: " + text + "\n").c_str(), stderr);  // There is no one else to tell.
 }

@@ -11,6 +11,8 @@ void SetOutput(std::FILE* stream);
 void Print(const std::string& text);
 /// A serial number or a file name need not be UTF-8: bytes that are not become U+FFFD.
 void PrintJson(const nlohmann::json& value);
+/// The same, in the order in which the members were added.
+void PrintJson(const nlohmann::ordered_json& value);
 void PrintError(const std::string& text);
 
 /// False when something that was printed could not be written (a full disk, a closed pipe).

@@ -219,7 +219,7 @@ class Stream {
             return ExitFailed;
         }
         const std::chrono::nanoseconds begin(slot.exposureEndNs.load() -
-                                             static_cast<std::int64_t>(facts.settings.exposureNs));
+                                             static_cast<std::int64_t>(facts.exposureNs));
         const std::string name = GetNumberedName(options.output, sums.frames);
         const std::string reason = WriteImage(
             name, MakeImage(facts, slot.buffer,
@@ -287,26 +287,22 @@ ExitCode CheckOptions(const StreamOptions& options) {
 
 ExitCode RunStream(const CommonOptions& common, const StreamOptions& options) {
     if (const ExitCode checked = CheckOptions(options); checked != ExitDone) return checked;
-    Driver driver;
-    Camera camera;
-    std::uint32_t uniqueId = 0;
-    const ExitCode opened = OpenListedCamera(driver, common.camera, &camera, &uniqueId);
-    if (opened != ExitDone) return opened;
+    Session session;
+    SentSettings settings;
+    const ExitCode prepared =
+        OpenWithSettings(common.camera, options.settings, &session, &settings);
+    if (prepared != ExitDone) return prepared;
 
-    CaptureFacts facts;
-    ZentaraResult result = ReadCaptureFacts(camera, &facts);
-    if (result != zerrNone) {
-        PrintError("the camera cannot be read: " + DescribeResult(result));
-        return JudgeFailure(driver, camera, uniqueId, result);
-    }
-    Stream stream(camera, facts, options);
+    TellMended(settings, settings.sent);
+    const CaptureFacts facts = GetCaptureFacts(session.GetCamera(), settings.sent);
+    Stream stream(session.GetCamera(), facts, options);
+    ZentaraResult result = zerrNone;
     const ExitCode code = stream.Run(&result);
-    camera.Close();  // No callback can come any more, so the stream's buffers may go.
+    session.Close();  // No callback can come any more, so the stream's buffers may go.
     Report(common, stream.GetSums());
     if (code == ExitFailed) {
         if (result != zerrNone) PrintError("the stream ended: " + DescribeResult(result));
-        return JudgeFailure(driver, camera, uniqueId,
-                            result == zerrNone ? ZentaraResult{zerrDriverFault} : result);
+        return session.Judge(result == zerrNone ? ZentaraResult{zerrDriverFault} : result);
     }
     if (code != ExitDone) return code;
     return stream.GetSums().damaged > 0 || stream.GetSums().drops > 0 ? ExitDamaged : ExitDone;
