@@ -48,6 +48,7 @@ CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings
     CaptureFacts facts;
     facts.imageBytes = GetImageBytes(camera, readWord(zprmDoPostProcessing) != 0);
     facts.exposureNs = static_cast<std::uint64_t>(read(ParameterFamily::Wide, zprm64Exposure));
+    facts.isSoftwareTriggered = readWord(zprmTriggerType) == ztrigSoftware;
     const bool isSplit = camera.GetInfo(zinfAsymmetricalBinning).value_or(0) != 0;
     Image& image = facts.prototype;
     image.model = camera.GetModelName();

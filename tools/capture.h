@@ -23,6 +23,7 @@ struct FrameBuffer {
 struct CaptureFacts {
     std::size_t imageBytes = 0;
     std::uint64_t exposureNs = 0;
+    bool isSoftwareTriggered = false;  ///< Each frame waits for a Zentara_Trigger.
     Image prototype;
 };
 /// From an open camera and the block of the settings in force.

@@ -19,13 +19,17 @@ namespace {
 using Clock = std::chrono::steady_clock;
 constexpr std::chrono::milliseconds Poll{50};
 
-/// Ends a grab that gets no image, from a thread of its own: after the time-out or an interrupt it
-/// aborts again and again until the grab has come back, since an abort that comes before the wait
-/// is lost.
+/// Looks after a grab from a thread of its own. It gives the trigger that a camera in the mode of
+/// the software trigger waits for. A grab that gets no image it ends: after the time-out or an
+/// interrupt it aborts again and again until the grab has come back, since an abort that comes
+/// before the wait is lost.
 class GrabWatch {
   public:
-    GrabWatch(ZentaraHandle handle, double timeoutSeconds)
-        : camera(handle), limit(timeoutSeconds), thread([this] { Watch(); }) {}
+    GrabWatch(ZentaraHandle handle, double timeoutSeconds, bool mustTrigger)
+        : camera(handle),
+          limit(timeoutSeconds),
+          awaitsTrigger(mustTrigger),
+          thread([this] { Watch(); }) {}
     ~GrabWatch() { Finish(); }
     GrabWatch(const GrabWatch&) = delete;
     GrabWatch& operator=(const GrabWatch&) = delete;
@@ -46,16 +50,22 @@ class GrabWatch {
             Clock::now() + std::chrono::duration_cast<Clock::duration>(limit);
         std::unique_lock lock(mutex);
         while (!changed.wait_for(lock, Poll, [this] { return isFinished; })) {
-            if (Clock::now() < end && !IsInterrupted()) continue;
-            hasAborted = true;
+            const bool isOver = Clock::now() >= end || IsInterrupted();
             lock.unlock();
-            (void)Zentara_Abort(camera);  // The grab's own result tells how it ended.
+            if (isOver) {
+                hasAborted = true;
+                (void)Zentara_Abort(camera);  // The grab's own result tells how it ended.
+            } else if (awaitsTrigger) {
+                // Refused until the grab has begun to wait.
+                awaitsTrigger = Zentara_Trigger(camera) != zerrNone;
+            }
             lock.lock();
         }
     }
 
     ZentaraHandle camera;
     std::chrono::duration<double> limit;
+    bool awaitsTrigger;  // the watch's thread alone
     std::mutex mutex;
     std::condition_variable changed;
     bool isFinished = false;
@@ -103,9 +113,9 @@ ExitCode CheckOutput(const GrabOptions& options) {
 }
 
 /// One image into `buffer`; `hasTimedOut` tells why none came.
-ZentaraResult Grab(const Camera& camera, double timeoutSeconds, FrameBuffer* buffer,
-                   bool* hasTimedOut) {
-    GrabWatch watch(camera.GetHandle(), timeoutSeconds);
+ZentaraResult Grab(const Camera& camera, const GrabOptions& options, const CaptureFacts& facts,
+                   FrameBuffer* buffer, bool* hasTimedOut) {
+    GrabWatch watch(camera.GetHandle(), options.timeoutSeconds, facts.isSoftwareTriggered);
     const ZentaraResult result = Zentara_GrabFrame(camera.GetHandle(), &buffer->frame);
     watch.Finish();
     *hasTimedOut = watch.HasAborted();
@@ -128,8 +138,7 @@ ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options) {
     buffer.Prepare(facts.imageBytes);
     const auto begin = std::chrono::system_clock::now();
     bool hasTimedOut = false;
-    const ZentaraResult result =
-        Grab(session.GetCamera(), options.timeoutSeconds, &buffer, &hasTimedOut);
+    const ZentaraResult result = Grab(session.GetCamera(), options, facts, &buffer, &hasTimedOut);
     if (result == zerrNone) {
         if (IsWritable(buffer.frame))
             return SaveImage(common, options, MakeImage(facts, buffer, begin));

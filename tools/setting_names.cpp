@@ -40,6 +40,7 @@ struct Alias {
     const char* setting;
 };
 constexpr std::array Aliases{
+    Alias{"gain-units", "gain"},
     Alias{"format", "image-format"},
     Alias{"width", "roi-width"},
     Alias{"height", "roi-height"},

@@ -171,6 +171,7 @@ class Stream {
             if (*result == zerrNone) *result = ring.Queue(camera, slot.get());
         }
         if (*result == zerrNone) *result = Zentara_SetStreaming(camera, 1);
+        if (*result == zerrNone) *result = TriggerNext();
         const Clock::time_point begin = Clock::now();
         ExitCode code = *result == zerrNone ? ExitDone : ExitFailed;
         Clock::time_point lastFrame = begin;
@@ -202,6 +203,11 @@ class Stream {
                (options.durationSeconds > 0 && sums.seconds >= options.durationSeconds);
     }
 
+    /// A camera in the mode of the software trigger waits for one before each frame.
+    ZentaraResult TriggerNext() {
+        return facts.isSoftwareTriggered ? Zentara_Trigger(camera) : ZentaraResult{zerrNone};
+    }
+
     ExitCode Serve(Slot* slot, ZentaraResult* result) {
         sums.Count(slot->buffer.frame);
         if (!options.output.empty()) {
@@ -209,6 +215,7 @@ class Stream {
             if (written != ExitDone) return written;
         }
         *result = ring.Queue(camera, slot);
+        if (*result == zerrNone && !IsFinished()) *result = TriggerNext();
         return *result == zerrNone ? ExitDone : ExitFailed;
     }
 

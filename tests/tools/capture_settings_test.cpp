@@ -108,6 +108,18 @@ TEST_F(CaptureSettings, AStreamTakesSettingsToo) {
     EXPECT_EQ(64, ReadFitsNumber(file.Get(), "NAXIS1"));
 }
 
+TEST_F(CaptureSettings, InTheModeOfTheSoftwareTriggerEachImageIsTriggered) {
+    const std::vector<std::string> trigger{"--set", "trigger-type=software", "--timeout", "30"};
+    std::vector<std::string> stream{"stream", "0", "-n", "3"};
+    stream.insert(stream.end(), trigger.begin(), trigger.end());
+
+    Grab("a.fits", trigger);
+
+    const ProgramResult result = Run(stream);
+    EXPECT_EQ(0, result.exitCode) << result.errors;
+    EXPECT_THAT(result.output, testing::StartsWith("3 frames"));
+}
+
 TEST_F(CaptureSettings, AValueThatTheCameraMendsIsToldAndTheImageIsTaken) {
     const std::string path = folder.GetPath("a.fits");
 
