@@ -1,11 +1,9 @@
 #include <gtest/gtest.h>
 
-#include <array>
-#include <cstdlib>
 #include <memory>
-#include <random>
 #include <string>
 
+#include "support/random_blocks.h"
 #include "support/sending_camera.h"
 
 // The registers that a send writes, in their order, against a list that is calculated from the
@@ -45,11 +43,6 @@ TraceCase MakeControlCase(const char* name, const char* className, const std::st
 }
 
 constexpr int Rounds = 24;
-
-std::uint32_t GetSeed() {
-    const char* text = std::getenv("ZENTARA_TEST_SEED");
-    return text == nullptr ? 20240611u : static_cast<std::uint32_t>(std::strtoul(text, nullptr, 0));
-}
 
 class SettingsTrace : public testing::TestWithParam<TraceCase> {
   protected:
@@ -172,72 +165,9 @@ TEST_P(SettingsTrace, EachSelectorOfTheRegisterTweakWritesItsRegister) {
     }
 }
 
-// ---- Random blocks ----
-
-class RandomBlocks {
-  public:
-    explicit RandomBlocks(std::uint32_t seed) : random(seed) {}
-
-    /// Changes some settings of a block to values that a client might choose, or nearly.
-    void Change(Zentara_Settings& block) {
-        for (std::uint32_t i = Pick(12) + 1; i > 0; --i) ChangeOne(block);
-    }
-
-  private:
-    std::uint32_t Pick(std::uint32_t below) {
-        return std::uniform_int_distribution<std::uint32_t>(0, below - 1)(random);
-    }
-    std::uint32_t PickWord() { return static_cast<std::uint32_t>(random()); }
-
-    void ChangeOne(Zentara_Settings& block) {
-        switch (Pick(4)) {
-            case 0:
-                return ChangeSigned(block);
-            case 1:
-                return ChangeWide(block);
-            default:
-                return ChangeWord(block);
-        }
-    }
-    void ChangeWord(Zentara_Settings& block) {
-        const std::uint32_t key = Pick(46);
-        SetWord(block, key, PickValue(key));
-    }
-    std::uint32_t PickValue(std::uint32_t key) {
-        constexpr std::array Speeds{0u, 1u, 2u, 3u, 7u, 8u, 4u, 0xFFFFFFFFu};
-        constexpr std::array Modes{1u, 2u, 3u, 4u, 8u, 5u, 0u, 64u};
-        if (key >= zprmBinning && key <= zprmVerticalBinning) return Modes[Pick(Modes.size())];
-        if (key == zprmReadoutSpeed) return Speeds[Pick(Speeds.size())];
-        if (key == zprmImageFormat) return Pick(14);
-        if (key >= zprmRoiX && key <= zprmRoiHeight) return Pick(8) == 0 ? PickWord() : Pick(2600);
-        if (key == zprmCameraMode) return Pick(3);
-        if (key == zprmEMGain) return Pick(1100);
-        if (key == zprmMetronaShutterDelay || key == zprmVClockPeriod || key == zprmCloseDelay) {
-            return Pick(8) == 0 ? PickWord() >> 1 : Pick(30000);
-        }
-        return Pick(10);
-    }
-    void ChangeSigned(Zentara_Settings& block) {
-        const std::uint32_t key = Pick(3);
-        const auto any = static_cast<std::int32_t>(PickWord());
-        const std::array values{static_cast<std::int32_t>(Pick(60'000'000)) - 20'000'000,
-                                static_cast<std::int32_t>(Pick(5000)) - 100,
-                                static_cast<std::int32_t>(Pick(110)) - 57};
-        SetSigned(block, key, key < 2 && Pick(8) == 0 ? any : values[key]);
-    }
-    void ChangeWide(Zentara_Settings& block) {
-        const std::uint64_t any = random() >> Pick(40);
-        // The greatest intensifier gains would overflow on their way to the nearest step.
-        SetWide(block, Pick(4), any >> 1);
-    }
-
-    std::mt19937_64 random;
-};
-
 TEST_P(SettingsTrace, RandomBlocksWriteWhatIsExpectedAndComeBackAsExpected) {
-    const std::uint32_t seed = GetSeed();
-    SCOPED_TRACE("ZENTARA_TEST_SEED=" + std::to_string(seed));
-    RandomBlocks blocks(seed);
+    RandomBlocks blocks;
+    SCOPED_TRACE(blocks.DescribeSeed());
     Zentara_Settings block = client->ReadDefaults();
     const Zentara_Settings defaults = block;
     for (int round = 0; round < Rounds; ++round) {
