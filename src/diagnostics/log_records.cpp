@@ -18,6 +18,18 @@ std::size_t GetFormattedLength(int wanted, std::size_t capacity) {
     return std::min(static_cast<std::size_t>(wanted), capacity - 1);
 }
 
+/// Writes the time and the text. Returns their length; `record` is terminated.
+std::size_t FormatRecord(std::span<char> record, const char* format, std::va_list values) {
+    const std::int32_t elapsed =
+        CalculateLogElapsed(logState.startMicroseconds, GetLogMicroseconds());
+    const std::size_t start = FormatLogPrefix(elapsed, record);
+    const std::span<char> rest = record.subspan(start);
+    // The check knows va_start in the first of several files alone.
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized)
+    const int wanted = std::vsnprintf(rest.data(), rest.size(), format, values);
+    return start + GetFormattedLength(wanted, rest.size());
+}
+
 }  // namespace
 
 std::int32_t CalculateLogElapsed(std::uint64_t start, std::uint64_t now) {
@@ -38,21 +50,17 @@ void ZLogWrite(const char* format, ...) {
     if (isForFile && !IsLogFileOpen()) return;
 
     char record[LogRecordCapacity];
-    const std::int32_t elapsed =
-        CalculateLogElapsed(logState.startMicroseconds, GetLogMicroseconds());
-    const std::size_t start = FormatLogPrefix(elapsed, record);
-    const std::size_t room = sizeof record - start;
-    std::va_list arguments;
-    va_start(arguments, format);
-    const int wanted = std::vsnprintf(record + start, room, format, arguments);
-    va_end(arguments);
+    std::va_list values;
+    va_start(values, format);
+    const std::size_t length = FormatRecord(record, format, values);
+    va_end(values);
 
     if (!isForFile) {
         WriteDebuggerOutput(record);
         return;
     }
     // Kept: each record in a file ends with a zero byte.
-    WriteToLogFile(record, start + GetFormattedLength(wanted, room) + 1);
+    WriteToLogFile(record, length + 1);
 }
 
 }  // namespace ZV
