@@ -19,6 +19,13 @@ struct FrameReleaser {
     void operator()(tStFrameInfo* frame) const { FreeFrame(frame); }
 };
 
+/// Sizes have 16 bits in the registers.
+constexpr std::uint64_t PackGeometry(std::uint32_t width, std::uint32_t height,
+                                     std::uint32_t bitDepth, bool isInterlaced) {
+    return std::uint64_t{width} << 40 | std::uint64_t{height} << 16 | std::uint64_t{bitDepth} << 8 |
+           static_cast<std::uint64_t>(isInterlaced);
+}
+
 constexpr std::uint32_t CountSampleBytes(std::uint32_t bitDepth) {
     return (bitDepth + 7) / 8;
 }
@@ -60,10 +67,26 @@ std::uint64_t MorvaneFWCamera::CalculateFrameBytes() {
     return pixels * CountSampleBytes(GetBitDepth());
 }
 
+/// A frame made for an image that the camera does not send yet would come with the pixels of the
+/// former one.
+bool MorvaneFWCamera::IsGeometryInForce(const tStFrameInfo& frame) const {
+    if (!streaming.isGeometryPending) return true;
+    return PackGeometry(frame.width, frame.height, frame.bitDepth, frame.interlaced) ==
+           streaming.geometryInForce;
+}
+
+void MorvaneFWCamera::AnnounceNewGeometry() {
+    if (streaming.isGeometryPending) return;
+    streaming.geometryInForce =
+        PackGeometry(GetImageWidth(), GetImageHeight(), GetBitDepth(), IsInterlaced());
+    streaming.isGeometryPending = true;
+}
+
 bool MorvaneFWCamera::ProvideBuffer(tStFrameInfo& frame) {
     const std::uint64_t bytes = CalculateFrameBytes();
     frame.bufferSize = static_cast<std::uint32_t>(bytes);
-    frame.bytesExpected = IsInterlaced() ? frame.bufferSize / 2 : frame.bufferSize;
+    frame.interlaced = IsInterlaced();
+    frame.bytesExpected = frame.interlaced ? frame.bufferSize / 2 : frame.bufferSize;
     if (HAL_SemaphoreWait(streaming.externalLock) != HALOk) return false;
     if (streaming.usesExternalBuffers) {
         frame.buffer = static_cast<std::uint8_t*>(streaming.externalBuffers.TakeFirst());
@@ -81,7 +104,6 @@ bool MorvaneFWCamera::DescribeFrame(tStFrameInfo& frame) {
     if (HAL_SemaphoreWait(streaming.streamLock) != HALOk) return false;
     frame.psn = static_cast<std::uint8_t>(GetPSN());
     frame.fieldIndex = 0;
-    frame.interlaced = IsInterlaced();
     frame.rowBytes = static_cast<std::uint16_t>(GetImageWidth() * CountSampleBytes(GetBitDepth()));
     frame.frameStatus = FrameComplete;
     frame.binning = GetSymmetricalBinningMode();
@@ -91,7 +113,7 @@ bool MorvaneFWCamera::DescribeFrame(tStFrameInfo& frame) {
     frame.exposure = GetExposure();
     frame.gain = GetNormalizedGain();
     frame.startColour = GetRGBFilterStartColour();
-    frame.valid = true;
+    frame.valid = IsGeometryInForce(frame);
     return HAL_SemaphoreSignal(streaming.streamLock) == HALOk;
 }
 

@@ -130,7 +130,7 @@ ZExImage* MorvaneFWCamera::MakeImage(tStFrameInfo& frame) {
     auto* image = new (std::nothrow)
         ZExImage(buffer, frame.bufferSize, frame.width, frame.height,
                  static_cast<std::uint16_t>(frame.bitDepth), frame.exposure, frame.gain,
-                 static_cast<ZImageFormatEnum>(ChooseImageFormat()),
+                 static_cast<ZImageFormatEnum>(ChooseImageFormat(frame.bitDepth)),
                  static_cast<ZCameraImageFormatEnum>(GetImageFormat()),
                  static_cast<ZColourPatternEnum>(frame.colourPattern), frame.startColour,
                  streaming.bigEndian, static_cast<std::uint16_t>(GetModel()),
@@ -141,8 +141,9 @@ ZExImage* MorvaneFWCamera::MakeImage(tStFrameInfo& frame) {
     return image;
 }
 
-std::uint32_t MorvaneFWCamera::ChooseImageFormat() {
-    const bool isByte = GetBitDepth() == ByteBitDepth;
+/// By the frame's own depth: the camera's may be changing at this moment.
+std::uint32_t MorvaneFWCamera::ChooseImageFormat(std::uint32_t bitDepth) {
+    const bool isByte = bitDepth == ByteBitDepth;
     switch (GetImageFormat()) {
         case CameraMono:
         case CameraRGBFilter:

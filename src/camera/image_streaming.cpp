@@ -17,25 +17,35 @@ bool MorvaneFWCamera::IsCameraStreaming() {
 CameraResult MorvaneFWCamera::StartStreamingImages(ImageCallback imageCallback,
                                                    ExposeDoneCallback exposeDoneCallback,
                                                    bool externalBuffers, void* newRefCon) {
+    const StreamCallbacks callbacks{imageCallback, exposeDoneCallback, newRefCon};
+    bool hasStarted = false;
+    return StartStream(&callbacks, externalBuffers, &hasStarted);
+}
+
+CameraResult MorvaneFWCamera::StartStream(const StreamCallbacks* newCallbacks, bool externalBuffers,
+                                          bool* hasStarted) {
+    *hasStarted = false;
     if (streaming.isStreaming) return CameraOk;
     const std::lock_guard hold(streaming.switchMutex);
     if (streaming.isStreaming) return CameraOk;  // another start was quicker
     CameraResult result = ReallocateBandwidth(CalculateRequiredPacketSize(true));
     if (result == CameraOk) result = TakeLock(streaming.streamLock);
     if (result != CameraOk) return result;
-    result = StartUnderStreamLock({imageCallback, exposeDoneCallback, newRefCon}, externalBuffers);
+    *hasStarted = true;
+    result = StartUnderStreamLock(newCallbacks, externalBuffers);
     const CameraResult given = GiveLock(streaming.streamLock);
     return result != CameraOk ? result : given;
 }
 
-CameraResult MorvaneFWCamera::StartUnderStreamLock(const StreamCallbacks& callbacks,
+CameraResult MorvaneFWCamera::StartUnderStreamLock(const StreamCallbacks* newCallbacks,
                                                    bool externalBuffers) {
     // Frames of a former run no longer match the new number. Kept: a failure gives the lock, which
     // the end gives a second time.
     if (SetPSN(GetPSN() + 1) != CameraOk) (void)HAL_SemaphoreSignal(streaming.streamLock);
     HALStatus status = WriteCommand(CommandTakeOver, 1);
     if (status != HALOk) return ReportHalStatus(status);
-    streaming.callbacks.Set(callbacks);
+    streaming.isGeometryPending = false;
+    if (newCallbacks != nullptr) streaming.callbacks.Set(*newCallbacks);
     streaming.usesExternalBuffers = externalBuffers;
     streaming.isStreaming = true;  // kept: stays when the start below fails
     streaming.abortPending = false;

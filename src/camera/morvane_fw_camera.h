@@ -379,6 +379,9 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     /// rolled back.
     CameraResult WriteControl(std::uint32_t quadlet, std::uint32_t value);
     CameraResult WriteControlField(const RegisterField& field, std::uint32_t value);
+    /// Before a change of the image's size or fields that does not stop the stream: what arrives
+    /// until the settings are taken over is not taken for an image of the new geometry.
+    void AnnounceNewGeometry();
     /// Writes one quadlet of the command block; prints nothing.
     HALStatus WriteCommand(std::uint32_t quadlet, std::uint32_t value);
     /// Version words as last read, the major number in the upper half.
@@ -430,6 +433,7 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     CameraResult WriteExposure(std::uint32_t quadlet, std::uint32_t lowQuadlet,
                                std::uint64_t nanoseconds, std::uint32_t microseconds);
     CameraResult WriteTweak(std::uint32_t quadlet, std::uint32_t value);
+    CameraResult StopAndTakeStreamLock();
     CameraResult WriteBinning(std::uint32_t mode);
     void FitROIToBinning(std::uint32_t mode, std::uint32_t formerMode);
     /// True where the bus connection cannot carry full resolution at a fast readout.
@@ -462,7 +466,11 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void WaitForExposeDoneEnd();
     HALStatus WaitForCloseOfRunLoop();
     HALStatus Disconnect();
-    CameraResult StartUnderStreamLock(const StreamCallbacks& callbacks, bool externalBuffers);
+    /// Null callbacks stay as they are. `hasStarted` tells a start from a stream that ran already,
+    /// whose callbacks are left alone.
+    CameraResult StartStream(const StreamCallbacks* newCallbacks, bool externalBuffers,
+                             bool* hasStarted);
+    CameraResult StartUnderStreamLock(const StreamCallbacks* newCallbacks, bool externalBuffers);
     void ClearFrameInfoVector();
 
     bool DropSurplusFrame();
@@ -470,13 +478,14 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     bool DescribeFrame(tStFrameInfo& frame);
     bool PushHeldFrame(tStFrameInfo& frame);
     std::uint64_t CalculateFrameBytes();
+    bool IsGeometryInForce(const tStFrameInfo& frame) const;
 
     void ServeNextWake();
     tStFrameInfo* TakeOldestFrame();
     void ServeFrame(tStFrameInfo* frame);
     void DiscardFrame(tStFrameInfo* frame);
     ZExImage* MakeImage(tStFrameInfo& frame);
-    std::uint32_t ChooseImageFormat();
+    std::uint32_t ChooseImageFormat(std::uint32_t bitDepth);
     void DeliverImage(ZExImage* image);
     void RunExposeThread(std::uint32_t number);
     void ServeExposeDone();

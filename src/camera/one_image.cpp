@@ -13,28 +13,29 @@ constexpr std::uint64_t WaitBase = 5000000000;
 }  // namespace
 
 CameraResult MorvaneFWCamera::GetOneImage(ZExImage** image) {
-    const bool wasStreaming = streaming.isStreaming;
+    const bool isToRestart = streaming.restartAfterUpdate;
     const HALStatus status = ForgetOneImage();
     if (status != HALOk) return ReportHalStatus(status);
 
-    StreamCallbacks former;
+    StreamCallbacks former = streaming.callbacks.Get();
     auto* const self = static_cast<ZCamera*>(this);
-    CameraResult result = CameraOk;
-    if (wasStreaming) {
+    const StreamCallbacks single{TakeOneImage, former.exposeDone, self};
+    bool hasStarted = false;
+    CameraResult result = StartStream(&single, false, &hasStarted);
+    if (!hasStarted && result == CameraOk) {
         former = streaming.callbacks.ReplaceImage(TakeOneImage, self);
-    } else {
-        result =
-            StartStreamingImages(TakeOneImage, streaming.callbacks.Get().exposeDone, false, self);
     }
     // Kept: a wait that fails or runs out leaves the callback swapped, or the stream on.
     if (result == CameraOk) result = AwaitOneImage();
     if (result != CameraOk) return result;
-    if (wasStreaming) {
-        (void)streaming.callbacks.ReplaceImage(former.image, former.refCon);
-    } else {
+    if (hasStarted) {
         result = StopStreamingImages();
+        // A setter of another thread may have stopped this stream, which is not to come back.
+        if (!isToRestart) streaming.restartAfterUpdate = false;
         if (result != CameraOk) return result;
     }
+    // Also for a stream that a setter of another thread has stopped and starts again.
+    (void)streaming.callbacks.ReplaceImage(former.image, former.refCon);
     *image = ClaimOneImage();
     return *image != nullptr ? CameraOk : CameraNoImage;
 }

@@ -56,14 +56,25 @@ CameraResult MorvaneFWCamera::SetSymmetricalBinning(std::uint32_t mode) {
     if (result != CameraOk) return result;
     const std::uint32_t formerMode = GetSymmetricalBinningMode();
     if (mode == formerMode) return CameraOk;
-    TurnOffStreaming();
-
-    result = TakeLock(streaming.streamLock);
+    result = StopAndTakeStreamLock();
     if (result != CameraOk) return result;
     result = WriteBinning(mode);
     if (result != CameraBadValue) FitROIToBinning(mode, formerMode);
     (void)GiveLock(streaming.streamLock);  // Printed; the settings are made.
     return result;
+}
+
+/// A stream that another thread has started before the lock was taken is stopped as well: under the
+/// lock the stop step of a region's setter would wait for it for ever.
+CameraResult MorvaneFWCamera::StopAndTakeStreamLock() {
+    for (;;) {
+        TurnOffStreaming();
+        CameraResult result = TakeLock(streaming.streamLock);
+        if (result != CameraOk) return result;
+        if (!streaming.isStreaming || streaming.restartAfterUpdate) return CameraOk;
+        result = GiveLock(streaming.streamLock);
+        if (result != CameraOk) return result;
+    }
 }
 
 CameraResult MorvaneFWCamera::WriteBinning(std::uint32_t mode) {

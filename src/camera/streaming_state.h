@@ -82,7 +82,11 @@ struct StreamingState {
     Relaxed<bool> usesExternalBuffers{false};
     Relaxed<bool> restartAfterUpdate{false};  ///< A setter has stopped a stream that is to go on.
     Relaxed<bool> abortPending{false};        ///< The next frame request is refused.
-    Relaxed<bool> configStale{false};         ///< MiscCtrl has changed what the camera reports.
+    /// A setter has changed the image's geometry under a stream that it does not stop. Until the
+    /// take-over the camera sends images of `geometryInForce`.
+    Relaxed<bool> isGeometryPending{false};
+    Relaxed<std::uint64_t> geometryInForce{0};
+    Relaxed<bool> configStale{false};  ///< MiscCtrl has changed what the camera reports.
     HALThread* runLoopThread = nullptr;
     HALThread* exposeDoneThread = nullptr;
     HALSemaphore* streamLock = nullptr;

@@ -33,6 +33,7 @@ CameraResult MorvaneFWCamera::TakeOverSettings() {
     if (imagePipeline != nullptr) imagePipeline->ResetFilters();
     const HALStatus status = WriteCommand(CommandTakeOver, 1);
     if (status != HALOk) return ReportHalStatus(status);
+    streaming.isGeometryPending = false;
     // Frames under way were made with the old settings.
     IgnoreFrameInfoVector();
     return CameraOk;
@@ -47,10 +48,11 @@ CameraResult MorvaneFWCamera::RefreshConfiguration() {
 }
 
 void MorvaneFWCamera::RestartStreaming() {
-    const StreamCallbacks callbacks = streaming.callbacks.Get();
-    // The settings are in force; a start that fails shows in the stream that does not come.
-    (void)StartStreamingImages(callbacks.image, callbacks.exposeDone, streaming.usesExternalBuffers,
-                               callbacks.refCon);
+    // The callbacks stay those of the stream that was stopped: GetOneImage may be exchanging them
+    // on another thread. The settings are in force; a start that fails shows in the stream that
+    // does not come.
+    bool hasStarted = false;
+    (void)StartStream(nullptr, streaming.usesExternalBuffers, &hasStarted);
     streaming.restartAfterUpdate = false;
 }
 
