@@ -19,7 +19,9 @@
 //
 // Hand-overs. Each of the two stands in the context's list of services while it works: a frame
 // callback waits there for the exposure callback of its frame, and an abort for what was begun
-// before it, so that no callback comes late.
+// before it, so that no callback comes late. Changes of settings that the two take out of the queue
+// are made one after the other: ExposeDone leaves the next one in the queue while ImageReceived has
+// one in hand, and ImageReceived waits for ExposeDone.
 
 namespace ZV {
 
@@ -119,10 +121,29 @@ void CallExposeDone(CameraContext& context, QueueHold& queueHold, EventService& 
     ZLogMessage(ExposeDoneName, "Called expose done callback for frame number %d", entry.userData);
 }
 
+/// The right to make the next settings change, for the length of a block.
+class ChangeClaim {
+  public:
+    explicit ChangeClaim(EventService& claimer) : service(claimer), isHeld(claimer.ClaimChange()) {}
+    ~ChangeClaim() {
+        if (isHeld) service.EndChange();
+    }
+    ChangeClaim(const ChangeClaim&) = delete;
+    ChangeClaim& operator=(const ChangeClaim&) = delete;
+
+    explicit operator bool() const { return isHeld; }
+
+  private:
+    EventService& service;
+    const bool isHeld;
+};
+
 /// Applies the settings change behind a frame whose pixels are still on the way, so that it is in
 /// force for the next exposure.
-void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold) {
+void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold, EventService& service) {
     if (context.abortRequested != 0 || context.sendInProgress != 0) return;
+    const ChangeClaim claim(service);
+    if (!claim) return;
     const EntryHold change(context, TakeSettingsEntry(context, /*index=*/1, /*countMin=*/2));
     if (!change) return;
     ZentaraResult result = zerrNone;
@@ -145,7 +166,7 @@ void ServeExposure(CameraContext& context) {
     const EntryHold chosen(context, HoldExposedEntry(context, &index));
     if (!chosen || chosen->kind != QueueKindFrame) return;
     if ((chosen->flags & zcbExposeDone) != 0) CallExposeDone(context, queueHold, service, *chosen);
-    if (index == 0) ApplySettingsEarly(context, queueHold);
+    if (index == 0) ApplySettingsEarly(context, queueHold, service);
 }
 
 // ---- An image has arrived ----
@@ -215,13 +236,16 @@ void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
         if (!head) return;
         MakeUpForExposeDone(context, service, *head);
     }
+    service.ClaimNextChange();
     const EntryHold entry(context, TakeFirstEntry(context));
     if (!entry) return;
     // Kept: a change that is the last entry stays. At the next image it is taken out as the entry
     // itself, dropped without being sent, and that image is dropped with it.
     const EntryHold change(context, TakeSettingsEntry(context, /*index=*/0, /*countMin=*/2));
+    if (!change) service.EndChange();
     if (entry->kind == QueueKindFrame) DeliverFrame(context, *entry, image, status);
     if (!change) return;
+    service.AwaitChange();
     const ZentaraResult result = Zentara_SendSettingsToCam(change->camera, change->settings);
     if (WantsCall(*change, zcbFrameDone)) CallClient(*change, result, change->flags);
 }

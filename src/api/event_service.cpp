@@ -62,6 +62,38 @@ void EventService::AwaitExposeDone(const QueueEntry& entry) {
 }
 
 /// Under queueMutex.
+bool EventService::IsChangedByOther() const {
+    for (const EventService* service = context.services; service; service = service->next) {
+        if (service->thread != thread && service->hasChange && !service->isReleased) return true;
+    }
+    return false;
+}
+
+bool EventService::ClaimChange() {
+    const std::lock_guard hold(context.queueMutex);
+    if (IsChangedByOther()) return false;
+    hasChange = true;
+    return true;
+}
+
+void EventService::ClaimNextChange() {
+    const std::lock_guard hold(context.queueMutex);
+    hasChange = true;
+}
+
+void EventService::AwaitChange() {
+    std::unique_lock lock(context.queueMutex);
+    const auto isOver = [&] { return !IsChangedByOther(); };
+    (void)WaitForLimit(context.serviceChanged, lock, ExposureLimitMs, isOver);  // it goes on
+}
+
+void EventService::EndChange() {
+    const std::lock_guard hold(context.queueMutex);
+    hasChange = false;
+    context.serviceChanged.notify_all();
+}
+
+/// Under queueMutex.
 bool EventService::HasOthers(const CameraContext& context, Kind kind) {
     const std::thread::id self = std::this_thread::get_id();
     for (const EventService* service = context.services; service; service = service->next) {

@@ -29,18 +29,30 @@ class EventService {
     /// Waits while another thread is inside the exposure callback of `entry`.
     void AwaitExposeDone(const QueueEntry& entry);
 
+    /// Claims the next settings change of the queue for this thread. False while another thread has
+    /// one in hand: changes are made one at a time, in the order of the queue.
+    [[nodiscard]] bool ClaimChange();
+    /// Claims one although another thread has one in hand, which is to be awaited before the send.
+    void ClaimNextChange();
+    /// Waits until no other thread has an earlier change in hand.
+    void AwaitChange();
+    /// The claimed change has been made and its callback has returned, or there was none.
+    void EndChange();
+
   private:
     friend void ReleaseOwnServices(CameraContext& context);
     friend void AwaitExposures(CameraContext& context);
     friend void AwaitImages(CameraContext& context);
 
     static bool HasOthers(const CameraContext& context, Kind kind);
+    bool IsChangedByOther() const;
 
     CameraContext& context;
     const Kind kind;
     const std::thread::id thread = std::this_thread::get_id();
     // All below: guarded by queueMutex.
     const QueueEntry* calledEntry = nullptr;  ///< Its exposure callback is running.
+    bool hasChange = false;                   ///< A settings change is being made.
     bool isReleased = false;                  ///< Nobody waits for it any more.
     EventService* next = nullptr;
 };
