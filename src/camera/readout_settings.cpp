@@ -64,8 +64,8 @@ CameraResult MorvaneFWCamera::SetSymmetricalBinning(std::uint32_t mode) {
     return result;
 }
 
-/// A stream that another thread has started before the lock was taken is stopped as well: under the
-/// lock the stop step of a region's setter would wait for it for ever.
+/// A stream that another thread has started before the lock was taken is stopped as well: its
+/// frames would get the new size and the pixels of the old one.
 CameraResult MorvaneFWCamera::StopAndTakeStreamLock() {
     for (;;) {
         TurnOffStreaming();
@@ -93,8 +93,7 @@ CameraResult MorvaneFWCamera::WriteBinning(std::uint32_t mode) {
 
 // The results are dropped: the binning stands, and each step says on its own what it could not do.
 // The stop step is done, and none of these may stop a stream: they run under `streamLock`, for
-// which a stop waits. A stream that another client has started meanwhile runs on; its frames of the
-// old size are dropped.
+// which a stop waits.
 void MorvaneFWCamera::FitROIToBinning(std::uint32_t mode, std::uint32_t formerMode) {
     const auto put = [this](const RegisterField& field, std::uint32_t value,
                             std::uint32_t greatest) {
