@@ -1,6 +1,6 @@
-// The file of the log. Any thread writes, one thread opens and closes. Writers take no lock: each
-// counts itself in before it looks at `logFile` and out when it is done. Who closes takes the file
-// out of `logFile` first and then waits until nobody is counted in. Both sides go by sequentially
+// The file of the log. Any thread writes, opens and closes. Writers take no lock: each counts
+// itself in before it looks at `logFile` and out when it is done. Who closes takes the file out of
+// `logFile` first and then waits until nobody is counted in. Both sides go by sequentially
 // consistent operations, so one of the two sees the other.
 
 #include <atomic>
@@ -13,12 +13,15 @@ namespace ZV {
 
 namespace {
 
+static_assert(std::atomic<AppendFile*>::is_always_lock_free);
+static_assert(std::atomic<std::uint64_t>::is_always_lock_free);
+
 std::atomic<AppendFile*> logFile{nullptr};
 std::atomic<std::uint32_t> writerCount{0};
 
 constexpr std::uint64_t WriterMicrosecondsMax = 1000000;
 
-[[nodiscard]] bool AreWritersDone() {
+bool AreWritersDone() {
     const std::uint64_t deadline = GetMonotonicMicroseconds() + WriterMicrosecondsMax;
     while (writerCount.load() != 0) {
         if (GetMonotonicMicroseconds() > deadline) return false;
@@ -26,20 +29,24 @@ constexpr std::uint64_t WriterMicrosecondsMax = 1000000;
     return true;
 }
 
+void ExchangeFile(AppendFile* next) {
+    AppendFile* const former = logFile.exchange(next);
+    if (former == nullptr) return;
+    // A write that hangs in the system keeps its file: closed, its number could become another's.
+    if (AreWritersDone()) CloseAppendFile(former);
+}
+
 }  // namespace
 
 bool OpenLogFile(const char* path) {
     CloseLogFile();
     AppendFile* const file = OpenAppendFile(path);
-    logFile.store(file);
+    ExchangeFile(file);
     return file != nullptr;
 }
 
 void CloseLogFile() {
-    AppendFile* const former = logFile.exchange(nullptr);
-    if (former == nullptr) return;
-    // A write that hangs in the system keeps its file: closed, its number could become another's.
-    if (AreWritersDone()) CloseAppendFile(former);
+    ExchangeFile(nullptr);
 }
 
 bool IsLogFileOpen() {

@@ -40,9 +40,9 @@ extern LogState logState;
 // ---- The file of the log ----
 
 /// Makes `path` the log's file, appending to what is there; the former file is closed first. False
-/// when it cannot be opened: there is no file then. Not to be called by two threads at a time.
+/// when it cannot be opened: there is no file then. Thread-safe.
 [[nodiscard]] bool OpenLogFile(const char* path);
-/// Not to be called by two threads at a time.
+/// Waits for the writes that have begun, a second at most. Thread-safe.
 void CloseLogFile();
 [[nodiscard]] bool IsLogFileOpen();
 /// Appends with one write and without a lock; nothing when there is no file. Thread-safe, also

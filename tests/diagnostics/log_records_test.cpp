@@ -144,6 +144,9 @@ TEST_F(LogRecords, AreLostWithoutHarmWhileTheFileIsExchangedUnderTheirWriters) {
             while (!isDone) ZLogWrite("record\n");
         });
         EXPECT_TRUE(ZV::Test::WaitUntil([&] { return !ReadFile().empty(); }));
+        const TestThread opener([] {
+            for (int i = 0; i < 50; ++i) ZLogOpen();
+        });
         for (int i = 0; i < 50; ++i) {
             ZLogClose();
             ZLogOpen();
