@@ -1,10 +1,7 @@
 #include <gtest/gtest.h>
 
-#include <string>
-
-#include "camera/camera.h"
-#include "simulation/register_file.h"
 #include "support/sending_camera.h"
+#include "system/settings_sender.h"
 
 namespace ZV::Test {
 namespace {
@@ -12,53 +9,8 @@ namespace {
 constexpr std::string_view SmallGeneration0 =
     R"({"base": "mono", "cameras": [{"sensor": {"width": 64, "height": 48},
         "streamingVersion": 0}]})";
-/// All features of quadlet 169 and double shot.
-constexpr std::string_view SmallRich =
-    R"({"base": "model:SolvaneG1", "cameras": [{"sensor": {"width": 64, "height": 48},
-        "configuration": {"169": "0x1F5E", "29": 1}}]})";
 constexpr std::string_view SmallTweaked =
     R"({"base": "model:TirelM1", "cameras": [{"sensor": {"width": 64, "height": 48}}]})";
-constexpr std::string_view SmallIntensified =
-    R"({"base": "intensified", "cameras": [{"sensor": {"width": 64, "height": 48}}]})";
-
-class SettingsSend : public OpenedCamera {
-  protected:
-    explicit SettingsSend(std::string_view scenario = SmallMono) : OpenedCamera(scenario) {}
-
-    ZentaraResult Send(Zentara_Settings& block) {
-        writesBefore = world.ReadRegisterWrites().size();
-        return Zentara_SendSettingsToCam(handle, &block);
-    }
-    /// The register writes of the last send.
-    std::vector<RegisterWrite> GetWrites() const {
-        std::vector<RegisterWrite> writes = world.ReadRegisterWrites();
-        return {writes.begin() + static_cast<std::ptrdiff_t>(writesBefore), writes.end()};
-    }
-    std::size_t CountWrites(std::uint32_t address) const {
-        const std::vector<RegisterWrite> writes = GetWrites();
-        return static_cast<std::size_t>(
-            std::ranges::count(writes, address, [](const auto& write) { return write.address; }));
-    }
-    bool WasCommitted() const { return CountWrites(Simulation::CommandAddress + 4) != 0; }
-    static std::uint32_t Control(std::uint32_t quadlet) {
-        return Simulation::ControlAddress + 4 * quadlet;
-    }
-    std::uint32_t Peek(std::uint32_t quadlet) const { return world.Peek(Control(quadlet)); }
-    bool RefuseWrites(std::uint32_t address, int count = 1) {
-        return world.AddFault(
-            R"({"kind": "failRequest", "code": "FW_IOCTL_ASYNC_WRITE", "address": )" +
-            std::to_string(address) + R"(, "count": )" + std::to_string(count) + "}");
-    }
-    Zentara_Settings ReadDefaults() {
-        Zentara_Settings block{};
-        EXPECT_ZERR(zerrNone, Zentara_ReadDefaultSettings(handle, &block));
-        return block;
-    }
-    ZCamera& GetCamera() { return *reinterpret_cast<ZCamera*>(handle); }
-
-  private:
-    std::size_t writesBefore = 0;
-};
 
 // ---- The tests of the arguments ----
 
@@ -491,157 +443,12 @@ TEST_F(SettingsSend, ACameraWithoutTheRegistersIsNotTweaked) {
     EXPECT_TRUE(GetWrites().empty());
 }
 
-// ---- A refused write ----
-
-struct RefusedWrite {
-    const char* name;
-    std::string_view scenario;
-    std::uint32_t quadlet;
-    void (*change)(Zentara_Settings& block);
-    bool isChecked;
-};
-
-void PrintTo(const RefusedWrite& refused, std::ostream* stream) {
-    *stream << refused.name;
-}
-
-template <std::uint32_t Key, std::uint32_t Value>
-void ChangeWordTo(Zentara_Settings& block) {
-    SetWord(block, Key, Value);
-}
-
-template <std::uint32_t Key, std::int32_t Value>
-void ChangeSignedTo(Zentara_Settings& block) {
-    SetSigned(block, Key, Value);
-}
-
-template <std::uint32_t Key, std::uint64_t Value>
-void ChangeWideTo(Zentara_Settings& block) {
-    SetWide(block, Key, Value);
-}
-
-constexpr std::string_view SmallMetrona =
-    R"({"base": "metrona", "cameras": [{"sensor": {"width": 64, "height": 48}}]})";
-constexpr std::string_view SmallFolary =
-    R"({"base": "folary", "cameras": [{"sensor": {"width": 64, "height": 48},
-        "configuration": {"5": "0x00200018"}}]})";
-
-class RefusedSettingsWrite : public testing::WithParamInterface<RefusedWrite>, public SettingsSend {
-  protected:
-    RefusedSettingsWrite() : SettingsSend(GetParam().scenario) {}
-
-    bool IsTaken() { return CountWrites(Control(GetParam().quadlet)) != 0; }
-};
-
-TEST_P(RefusedSettingsWrite, EndsTheSendOrIsIgnoredAsItsRowSays) {
-    Zentara_Settings former = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(former));
-    Zentara_Settings block = former;
-    SetWord(block, zprmReserved17, 1);  // a change that writes nothing
-    GetParam().change(block);
-    ASSERT_TRUE(RefuseWrites(Control(GetParam().quadlet)));
-
-    EXPECT_ZERR(GetParam().isChecked ? zerrDriverFault : zerrNone, Send(block));
-
-    EXPECT_TRUE(IsTaken());
-    EXPECT_NE(GetParam().isChecked, WasCommitted());
-    if (!GetParam().isChecked) return;
-    EXPECT_EQ(Control(GetParam().quadlet), GetWrites().back().address) << "nothing comes after";
-    // The former block still counts as the last one sent, and the lock is free.
-    ASSERT_ZERR(zerrNone, Send(former));
-    EXPECT_FALSE(WasCommitted());
-}
-
-INSTANTIATE_TEST_SUITE_P(
-    Of, RefusedSettingsWrite,
-    testing::Values(
-        RefusedWrite{"Depth", SmallMono, 1, ChangeWordTo<zprmImageFormat, 3>, false},
-        RefusedWrite{"RealTimeVideo", SmallFolary, 2, ChangeWordTo<zprmCameraMode, 1>, false},
-        RefusedWrite{"StartColour", SmallMono, 12, ChangeWordTo<zprmColorWheel, 1>, false},
-        RefusedWrite{"Wheel", SmallMono, 12, ChangeWordTo<zprmImageFormat, 6>, false},
-        RefusedWrite{"VerticalBinning", SmallMetrona, 2, ChangeWordTo<zprmVerticalBinning, 2>,
-                     true},
-        RefusedWrite{"HorizontalBinning", SmallMetrona, 2, ChangeWordTo<zprmHorizontalBinning, 2>,
-                     true},
-        RefusedWrite{"RegionX", SmallMono, 4, ChangeWordTo<zprmRoiX, 2>, true},
-        RefusedWrite{"RegionY", SmallMono, 4, ChangeWordTo<zprmRoiY, 2>, true},
-        RefusedWrite{"RegionWidth", SmallMono, 3, ChangeWordTo<zprmRoiWidth, 20>, true},
-        RefusedWrite{"RegionHeight", SmallMono, 3, ChangeWordTo<zprmRoiHeight, 20>, true},
-        RefusedWrite{"ReadoutSpeed", SmallMono, 1, ChangeWordTo<zprmReadoutSpeed, 2>, true},
-        RefusedWrite{"Trigger", SmallMono, 11, ChangeWordTo<zprmTriggerType, 1>, true},
-        RefusedWrite{"Cooler", SmallMono, 14, ChangeWordTo<zprmCoolerActive, 0>, true},
-        RefusedWrite{"DoubleShot", SmallRich, 13, ChangeWordTo<zprmDoubleShot, 1>, true},
-        RefusedWrite{"ShutterDelay", SmallMetrona, 15, ChangeWordTo<zprmMetronaShutterDelay, 60>,
-                     true},
-        RefusedWrite{"Gain", SmallMono, 5, ChangeSignedTo<zprmS32NormalizedGaindB, 3000000>, true},
-        RefusedWrite{"IntensifierGain", SmallIntensified, 18,
-                     ChangeWideTo<zprm64NormIntensGain, 100000000>, true},
-        RefusedWrite{"Offset", SmallMono, 5, ChangeSignedTo<zprmS32AbsoluteOffset, 5>, true},
-        RefusedWrite{"Exposure", SmallMono, 6, ChangeWideTo<zprm64Exposure, 5000000000>, true},
-        RefusedWrite{"ExposureLow", SmallMono, 15, ChangeWideTo<zprm64Exposure, 50000000>, true},
-        RefusedWrite{"RedExposure", SmallMono, 7, ChangeWideTo<zprm64Exposure, 5000000000>, true},
-        RefusedWrite{"BlueExposure", SmallMono, 8, ChangeWideTo<zprm64Exposure, 5000000000>, true},
-        RefusedWrite{"SyncB", SmallMono, 11, ChangeWordTo<zprmSyncb, 0>, true},
-        RefusedWrite{"Fan", SmallMono, 22, ChangeWordTo<zprmFan, 1>, true},
-        RefusedWrite{"Blackout", SmallRich, 21, ChangeWordTo<zprmBlackoutMode, 1>, true},
-        RefusedWrite{"HighSensitivity", SmallRich, 21, ChangeWordTo<zprmHighSensitivityMode, 1>,
-                     true},
-        RefusedWrite{"CoolingTarget", SmallRich, 14,
-                     ChangeSignedTo<zprmS32RegulatedCoolingTemp, -5>, true},
-        RefusedWrite{"CloseDelay", SmallRich, 25, ChangeWordTo<zprmCloseDelay, 5>, true},
-        RefusedWrite{"EMGain", SmallRich, 24, ChangeWordTo<zprmEMGain, 5>, true},
-        RefusedWrite{"Dither", SmallRich, 30, ChangeWordTo<zprmDither, 1>, true},
-        RefusedWrite{"VClockPeriod", SmallRich, 31, ChangeWordTo<zprmVClockPeriod, 5000>, true}),
-    [](const auto& refused) { return std::string(refused.param.name); });
-
-TEST_F(SettingsSend, ARefusedBinningFitsTheRegionAllTheSameAndEndsTheSend) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    SetWord(block, zprmBinning, 2);
-    SetWord(block, zprmTriggerType, 1);
-    ASSERT_TRUE(RefuseWrites(Control(2)));
-
-    EXPECT_ZERR(zerrDriverFault, Send(block));
-
-    EXPECT_EQ(32u << 16 | 24u, Peek(3));
-    EXPECT_FALSE(WasCommitted());
-    EXPECT_EQ(0u, CountWrites(Control(11)));
-}
-
-TEST_F(SettingsSend, AFailingTriggerLeavesTheRegionApplied) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    SetWord(block, zprmRoiX, 8);
-    SetWord(block, zprmTriggerType, 1);
-    SetWide(block, zprm64Exposure, 20'000'000);
-    ASSERT_TRUE(RefuseWrites(Control(11)));
-
-    EXPECT_ZERR(zerrDriverFault, Send(block));
-
-    EXPECT_EQ(8u << 16, Peek(4));
-    EXPECT_EQ(8u, GetCamera().GetROIX());
-    EXPECT_EQ(16'384'000u, GetCamera().GetExposure()) << "not reached";
-}
+// ---- Features ----
 
 class RichSettingsSend : public SettingsSend {
   protected:
     RichSettingsSend() : SettingsSend(SmallRich) {}
 };
-
-// Kept: the second write of this register in a send, which switches high gain off whatever is sent.
-TEST_F(RichSettingsSend, ARefusalOfHighGainEndsTheSendBehindDither) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    SetWord(block, zprmHighGainMode, 1);
-    ASSERT_TRUE(
-        world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_ASYNC_WRITE", "address": )" +
-                       std::to_string(Control(30)) + R"(, "request": 2})"));
-
-    EXPECT_ZERR(zerrDriverFault, Send(block));
-
-    EXPECT_EQ(2u, CountWrites(Control(30)));
-    EXPECT_EQ(0u, CountWrites(Control(31)));
-}
 
 // Kept: high gain can be asked for but not had, and double shot comes with every send.
 TEST_F(RichSettingsSend, HighGainReadsBackAsOffAndDoubleShotAsOn) {
