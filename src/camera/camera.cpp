@@ -41,7 +41,7 @@ ZCamera::ZCamera() {
 ZCamera::ZCamera(const ZCamera& other) : ZObject(other), refCon(static_cast<void*>(other.refCon)) {}
 
 ZCamera& ZCamera::operator=(const ZCamera& other) {
-    refCon = static_cast<void*>(other.refCon);
+    if (this != &other) refCon = static_cast<void*>(other.refCon);
     return *this;
 }
 

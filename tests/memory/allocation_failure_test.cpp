@@ -47,10 +47,12 @@ class GrabEnder {
             hasGivenUp = true;
         }
         // An abort before the grab waits does not count, so it is repeated.
-        while (!isDone) {
-            if (handle != 0) (void)Zentara_Abort(handle);
-            std::this_thread::sleep_for(std::chrono::milliseconds(1));
-        }
+        (void)WaitUntil(
+            [&] {
+                if (!isOver() && handle != 0) (void)Zentara_Abort(handle);
+                return isOver();
+            },
+            std::chrono::seconds(30));
     }
 
     std::atomic<ZentaraHandle> handle{0};
