@@ -9,9 +9,6 @@ namespace {
 constexpr std::string_view SmallGeneration0 =
     R"({"base": "mono", "cameras": [{"sensor": {"width": 64, "height": 48},
         "streamingVersion": 0}]})";
-constexpr std::string_view SmallTweaked =
-    R"({"base": "model:TirelM1", "cameras": [{"sensor": {"width": 64, "height": 48}}]})";
-
 // ---- The tests of the arguments ----
 
 TEST_F(SettingsSend, ArgumentsAreTestedInOrder) {
@@ -355,92 +352,6 @@ TEST_F(OldSettingsSend, ASlowerSpeedIsLeftAloneAndSoAreBytes) {
     SetWord(block, zprmReadoutSpeed, zspeed20MHz);
     ASSERT_ZERR(zerrNone, Send(block));
     EXPECT_EQ(0u, GetWord(block, zprmReadoutSpeed));
-}
-
-// ---- The register tweak ----
-
-class TweakedSettingsSend : public SettingsSend {
-  protected:
-    TweakedSettingsSend() : SettingsSend(SmallTweaked) {}
-};
-
-TEST_F(TweakedSettingsSend, EachSelectorWritesItsRegisterAndOnlyTheFirstTakesThousandths) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    for (std::uint32_t selector = 1; selector <= 8; ++selector) {
-        const std::uint32_t quadlet = 33 + selector;
-        const std::uint32_t value = 20 + selector;
-        SetWord(block, zprmRegisterTweak, selector << 28 | 0x0ABC0000 | value);
-
-        ASSERT_ZERR(zerrNone, Send(block));
-
-        EXPECT_EQ(1u, CountWrites(Control(quadlet))) << selector;
-        EXPECT_EQ(selector == 1 ? value * 1000 : value, Peek(quadlet)) << selector;
-        EXPECT_FALSE(WasCommitted()) << "the word is not compared";
-    }
-}
-
-TEST_F(TweakedSettingsSend, OtherSelectorsDoNothing) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    ASSERT_ZERR(zerrNone, Send(block));
-    const std::size_t writes = GetWrites().size();
-    for (const std::uint32_t selector : {0u, 9u, 10u, 15u}) {
-        SetWord(block, zprmRegisterTweak, selector << 28 | 5);
-
-        ASSERT_ZERR(zerrNone, Send(block));
-
-        EXPECT_EQ(writes, GetWrites().size()) << selector;
-    }
-}
-
-TEST_F(TweakedSettingsSend, AThousandfoldIsCutToSixteenBits) {
-    Zentara_Settings block = ReadDefaults();
-    SetWord(block, zprmRegisterTweak, 0x1000FFFF);
-
-    ASSERT_ZERR(zerrNone, Send(block));
-
-    EXPECT_EQ(65535u * 1000 & 0xFFFF, Peek(34));
-}
-
-TEST_F(TweakedSettingsSend, ARefusedTweakIsIgnored) {
-    Zentara_Settings block = ReadDefaults();
-    SetWord(block, zprmRegisterTweak, 0x30000001);
-    ASSERT_TRUE(RefuseWrites(Control(36)));
-
-    EXPECT_ZERR(zerrNone, Send(block));
-
-    EXPECT_TRUE(WasCommitted());
-}
-
-// The tweak alone is no change; the configuration is read again by the commit that comes later.
-TEST_F(TweakedSettingsSend, ANewMiscCtrlReadsTheConfigurationAgainWithTheNextCommit) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    SetWord(block, zprmRegisterTweak, 0x80000003);
-    const auto countReads = [&] {
-        const std::vector<TraceRecord> requests = world.ReadRequests();
-        return std::ranges::count(requests, "FW_IOCTL_ASYNC_READ", &TraceRecord::name);
-    };
-    const auto before = countReads();
-
-    ASSERT_ZERR(zerrNone, Send(block));
-    EXPECT_EQ(before, countReads());
-
-    SetWord(block, zprmTriggerType, 1);
-    SetWord(block, zprmRegisterTweak, 0);
-    ASSERT_ZERR(zerrNone, Send(block));
-    EXPECT_LT(before, countReads());
-}
-
-TEST_F(SettingsSend, ACameraWithoutTheRegistersIsNotTweaked) {
-    Zentara_Settings block = ReadDefaults();
-    ASSERT_ZERR(zerrNone, Send(block));
-    SetWord(block, zprmRegisterTweak, 0x20000001);
-
-    EXPECT_ZERR(zerrNone, Send(block));
-
-    EXPECT_TRUE(GetWrites().empty());
 }
 
 // ---- Features ----
