@@ -245,7 +245,7 @@ std::vector<std::string> FindNearest(std::string_view name, std::span<const std:
 std::string DescribeUnknown(std::string_view what, std::string_view name,
                             std::span<const std::string> known) {
     const std::vector<std::string> nearest = FindNearest(name, known);
-    const std::string begin = fmt::format("unknown {} '{}'", what, name);
+    std::string begin = fmt::format("unknown {} '{}'", what, name);
     if (nearest.empty()) return begin;
     return fmt::format("{}; did you mean {}?", begin, fmt::join(nearest, ", "));
 }

@@ -48,6 +48,15 @@ class LineIterator {
 /// What stands behind a name of the file.
 enum class JsonKind { Text, Number, Truth, Other };
 
+/// The parser's words without its number and without the place, "[...] parse error at ...: ".
+std::string_view GetReason(std::string_view words) {
+    for (const std::string_view mark : {"] ", ": "}) {
+        const std::size_t at = words.find(mark);
+        if (at != std::string_view::npos) words.remove_prefix(at + mark.size());
+    }
+    return words;
+}
+
 /// Takes the parser's events: an object of texts, and in it the object of the settings. The values
 /// of nested lists and objects are passed over; they are refused at their begin.
 class SettingsReader : public nlohmann::json_sax<nlohmann::json> {
@@ -106,19 +115,16 @@ class SettingsReader : public nlohmann::json_sax<nlohmann::json> {
                      const nlohmann::json::exception& failure) override {
         const std::string_view text = failure.what();
         constexpr std::string_view LineMark = "at line ";
-        std::size_t line = *currentLine;
+        std::size_t line = depth > 0 ? keyLine : *currentLine;
         const std::size_t mark = text.find(LineMark);
         if (mark != std::string_view::npos) {
             const std::string_view digits = text.substr(mark + LineMark.size());
             (void)std::from_chars(digits.data(), digits.data() + digits.size(),
-                                  line);  // Without a number the line stays as counted.
+                                  line);  // Without a number it stays the line of the key.
         }
         constexpr std::string_view BehindLineEnd = "<U+000A>'";  // the last that was read
         if (text.ends_with(BehindLineEnd) && line > 1) --line;
-        const std::size_t reason = text.find(": ");
-        Refuse(line,
-               fmt::format("this is no JSON: {}",
-                           reason == std::string_view::npos ? text : text.substr(reason + 2)));
+        Refuse(line, fmt::format("this is no JSON: {}", GetReason(text)));
         return false;
     }
 

@@ -120,6 +120,14 @@ TEST_F(CaptureSettings, InTheModeOfTheSoftwareTriggerEachImageIsTriggered) {
     EXPECT_THAT(result.output, testing::StartsWith("3 frames"));
 }
 
+TEST_F(CaptureSettings, TheNumberOfTheCameraMayStandBehindASetting) {
+    const ProgramResult result =
+        Run({"grab", "-o", folder.GetPath("a.fits"), "--set", "roi-width=64", "1"});
+
+    EXPECT_EQ(3, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("there is no camera 1"));
+}
+
 TEST_F(CaptureSettings, AValueThatTheCameraMendsIsToldAndTheImageIsTaken) {
     const std::string path = folder.GetPath("a.fits");
 

@@ -49,6 +49,13 @@ TEST(Program, HelpIsPrintedOnStandardOutputAndSucceeds) {
     for (const std::vector<std::string>& arguments : {std::vector<std::string>{"--help"},
                                                       {"list", "--help"},
                                                       {"info", "--help"},
+                                                      {"get", "--help"},
+                                                      {"limits", "--help"},
+                                                      {"set", "--help"},
+                                                      {"preflight", "--help"},
+                                                      {"settings", "--help"},
+                                                      {"settings", "save", "--help"},
+                                                      {"settings", "load", "--help"},
                                                       {"grab", "--help"},
                                                       {"stream", "--help"}}) {
         const ProgramResult result = RunProgram(arguments);
@@ -65,6 +72,10 @@ TEST(Program, WrongUseEndsWithCode2AndSaysHowToGetHelp) {
           {"fly"},
           {"grab"},
           {"grab", "x", "-o", "a.fits"},
+          {"settings"},
+          {"settings", "save"},
+          {"settings", "load", "--simulation", "mono"},
+          {"set"},
           {"stream", "--simulation", "mono"},
           {"grab", "--simulation", "mono", "-o", "image.jpg"}}) {
         const ProgramResult result = RunProgram(arguments);

@@ -154,6 +154,7 @@ constexpr BadFile BadFiles[] = {
     {"{\"settings\": {\n\"binning\" 1}}", ":2: this is no JSON: "},
     {"{\"settings\": {\n\"binning\": tru\n}}", ":2: this is no JSON: "},
     {"", ":1: this is no JSON: "},
+    {"{\"settings\": {\n\"exposure-us\": 1e999\n}}", ":2: this is no JSON: number overflow"},
 };
 
 TEST(SettingsFile, WhatIsWrongWithItIsToldWithItsLine) {
