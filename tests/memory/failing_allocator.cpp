@@ -37,6 +37,9 @@ bool HasRefusedAllocation() {
 
 using ZV::Test::MayAllocate;
 
+// A sanitizer's runtime refers to the wrapped names too.
+#pragma GCC visibility push(default)
+
 extern "C" {
 
 void* __real_malloc(std::size_t bytes);
@@ -78,3 +81,5 @@ void* __wrap__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) n
 }
 
 }  // extern "C"
+
+#pragma GCC visibility pop
