@@ -71,6 +71,7 @@ struct CameraContext {
     Relaxed<std::uint8_t> postProcessing{0};     ///< 1 when post-processing is on.
 
     mutable std::mutex queueMutex;
+    std::uint64_t changesTaken = 0;  ///< Settings changes taken out of the queue. Guarded as it is.
     EventService* services = nullptr;        ///< What threads serve now. Guarded by queueMutex.
     std::condition_variable serviceChanged;  ///< A service has ended or moved on.
     mutable std::mutex settingsMutex;

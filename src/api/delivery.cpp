@@ -121,34 +121,20 @@ void CallExposeDone(CameraContext& context, QueueHold& queueHold, EventService& 
     ZLogMessage(ExposeDoneName, "Called expose done callback for frame number %d", entry.userData);
 }
 
-/// The right to make the next settings change, for the length of a block.
-class ChangeClaim {
-  public:
-    explicit ChangeClaim(EventService& claimer) : service(claimer), isHeld(claimer.ClaimChange()) {}
-    ~ChangeClaim() {
-        if (isHeld) service.EndChange();
-    }
-    ChangeClaim(const ChangeClaim&) = delete;
-    ChangeClaim& operator=(const ChangeClaim&) = delete;
-
-    explicit operator bool() const { return isHeld; }
-
-  private:
-    EventService& service;
-    const bool isHeld;
-};
+/// Makes a change that `service` has taken, in its turn.
+ZentaraResult MakeChange(EventService& service, const QueueEntry& change) {
+    service.AwaitEarlierChanges();
+    return Zentara_SendSettingsToCam(change.camera, change.settings);
+}
 
 /// Applies the settings change behind a frame whose pixels are still on the way, so that it is in
 /// force for the next exposure.
 void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold, EventService& service) {
     if (context.abortRequested != 0 || context.sendInProgress != 0) return;
-    const ChangeClaim claim(service);
-    if (!claim) return;
-    const EntryHold change(context, TakeSettingsEntry(context, /*index=*/1, /*countMin=*/2));
+    const EntryHold change(context, service.TakeChange(/*index=*/1, /*countMin=*/2));
     if (!change) return;
     ZentaraResult result = zerrNone;
-    queueHold.RunReleased(
-        [&] { result = Zentara_SendSettingsToCam(change->camera, change->settings); });
+    queueHold.RunReleased([&] { result = MakeChange(service, *change); });
     if (!WantsCall(*change, zcbFrameDone)) return;
     queueHold.RunReleased([&] { CallClient(*change, result, change->flags); });
 }
@@ -236,17 +222,14 @@ void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
         if (!head) return;
         MakeUpForExposeDone(context, service, *head);
     }
-    service.ClaimNextChange();
     const EntryHold entry(context, TakeFirstEntry(context));
     if (!entry) return;
     // Kept: a change that is the last entry stays. At the next image it is taken out as the entry
     // itself, dropped without being sent, and that image is dropped with it.
-    const EntryHold change(context, TakeSettingsEntry(context, /*index=*/0, /*countMin=*/2));
-    if (!change) service.EndChange();
+    const EntryHold change(context, service.TakeChange(/*index=*/0, /*countMin=*/2));
     if (entry->kind == QueueKindFrame) DeliverFrame(context, *entry, image, status);
     if (!change) return;
-    service.AwaitChange();
-    const ZentaraResult result = Zentara_SendSettingsToCam(change->camera, change->settings);
+    const ZentaraResult result = MakeChange(service, *change);
     if (WantsCall(*change, zcbFrameDone)) CallClient(*change, result, change->flags);
 }
 

@@ -91,10 +91,12 @@ QueueEntry* TakeFirstEntry(CameraContext& context) {
     return TakeEntryAt(context, 0);
 }
 
-QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index, std::uint32_t countMin) {
+QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index, std::uint32_t countMin,
+                              std::uint64_t* ticket) {
     const std::lock_guard hold(context.queueMutex);
     if (context.queueCount < countMin || index >= context.queueCount) return nullptr;
     if (context.queue[index]->kind != QueueKindSettings) return nullptr;
+    *ticket = ++context.changesTaken;
     return TakeEntryAt(context, index);
 }
 

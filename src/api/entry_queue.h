@@ -32,8 +32,9 @@ namespace ZV {
 
 /// Takes the entry at `index` out if it is a settings change and the queue has at least `countMin`
 /// entries, and hands the queue's hold to the caller; else null, and the queue stays as it is.
+/// `*ticket`, which is guarded by queueMutex, receives its place among all changes taken, from 1.
 [[nodiscard]] QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index,
-                                            std::uint32_t countMin);
+                                            std::uint32_t countMin, std::uint64_t* ticket);
 
 /// Lets go of an entry. Null is ignored.
 void LetGoOfEntry(CameraContext& context, QueueEntry* entry);

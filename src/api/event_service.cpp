@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <mutex>
 
+#include "api/entry_queue.h"
 #include "hal/platform/limited_wait.h"
 
 namespace ZV {
@@ -61,36 +62,23 @@ void EventService::AwaitExposeDone(const QueueEntry& entry) {
     (void)WaitForLimit(context.serviceChanged, lock, ExposureLimitMs, isOver);  // kept: goes on
 }
 
-/// Under queueMutex.
-bool EventService::IsChangedByOther() const {
-    for (const EventService* service = context.services; service; service = service->next) {
-        if (service->thread != thread && service->hasChange && !service->isReleased) return true;
-    }
-    return false;
+QueueEntry* EventService::TakeChange(std::uint32_t index, std::uint32_t countMin) {
+    return TakeSettingsEntry(context, index, countMin, &changeTicket);
 }
 
-bool EventService::ClaimChange() {
-    const std::lock_guard hold(context.queueMutex);
-    if (IsChangedByOther()) return false;
-    hasChange = true;
+/// Under queueMutex.
+bool EventService::IsChangeNext() const {
+    for (const EventService* service = context.services; service; service = service->next) {
+        const bool isWaitedFor = service->changeTicket != 0 && !service->isReleased;
+        if (isWaitedFor && service->changeTicket < changeTicket) return false;
+    }
     return true;
 }
 
-void EventService::ClaimNextChange() {
-    const std::lock_guard hold(context.queueMutex);
-    hasChange = true;
-}
-
-void EventService::AwaitChange() {
+void EventService::AwaitEarlierChanges() {
     std::unique_lock lock(context.queueMutex);
-    const auto isOver = [&] { return !IsChangedByOther(); };
-    (void)WaitForLimit(context.serviceChanged, lock, ExposureLimitMs, isOver);  // it goes on
-}
-
-void EventService::EndChange() {
-    const std::lock_guard hold(context.queueMutex);
-    hasChange = false;
-    context.serviceChanged.notify_all();
+    (void)WaitForLimit(context.serviceChanged, lock, ExposureLimitMs,
+                       [&] { return IsChangeNext(); });  // it goes on
 }
 
 /// Under queueMutex.

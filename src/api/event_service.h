@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <thread>
 
 #include "api/camera_context.h"
@@ -29,15 +30,12 @@ class EventService {
     /// Waits while another thread is inside the exposure callback of `entry`.
     void AwaitExposeDone(const QueueEntry& entry);
 
-    /// Claims the next settings change of the queue for this thread. False while another thread has
-    /// one in hand: changes are made one at a time, in the order of the queue.
-    [[nodiscard]] bool ClaimChange();
-    /// Claims one although another thread has one in hand, which is to be awaited before the send.
-    void ClaimNextChange();
+    /// Takes a settings change out of the queue as TakeSettingsEntry does. Changes are made, and
+    /// their callbacks called, in the order in which they are taken, whichever thread takes them: a
+    /// change is in hand until the service ends.
+    [[nodiscard]] QueueEntry* TakeChange(std::uint32_t index, std::uint32_t countMin);
     /// Waits until no other thread has an earlier change in hand.
-    void AwaitChange();
-    /// The claimed change has been made and its callback has returned, or there was none.
-    void EndChange();
+    void AwaitEarlierChanges();
 
   private:
     friend void ReleaseOwnServices(CameraContext& context);
@@ -45,14 +43,14 @@ class EventService {
     friend void AwaitImages(CameraContext& context);
 
     static bool HasOthers(const CameraContext& context, Kind kind);
-    bool IsChangedByOther() const;
+    bool IsChangeNext() const;
 
     CameraContext& context;
     const Kind kind;
     const std::thread::id thread = std::this_thread::get_id();
     // All below: guarded by queueMutex.
     const QueueEntry* calledEntry = nullptr;  ///< Its exposure callback is running.
-    bool hasChange = false;                   ///< A settings change is being made.
+    std::uint64_t changeTicket = 0;           ///< Place of the change in hand; 0 for none.
     bool isReleased = false;                  ///< Nobody waits for it any more.
     EventService* next = nullptr;
 };

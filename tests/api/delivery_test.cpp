@@ -6,7 +6,9 @@
 #include <cstdlib>
 #include <cstring>
 #include <future>
+#include <mutex>
 #include <thread>
+#include <vector>
 
 #include "api/camera_context.h"
 #include "api/entry_queue.h"
@@ -299,6 +301,64 @@ TEST_F(Delivery, ASettingsChangeFollowedByAFrameIsAppliedBehindTheDeliveredFrame
     EXPECT_EQ(1u, heard[0].userData);
     EXPECT_EQ(100u, heard[1].userData);
     EXPECT_ZERR(zerrNone, heard[1].errorCode);
+    EXPECT_EQ(1u, CountQueued());
+}
+
+/// A client whose frame callback lasts until the test lets it go on.
+struct SlowClient {
+    static void Record(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
+                       std::uint32_t) {
+        auto& client = *reinterpret_cast<SlowClient*>(userPrivate);
+        EXPECT_EQ(0u, errorCode);
+        {
+            const std::lock_guard hold(client.mutex);
+            client.heard.push_back(userData);
+        }
+        if (userData != 0) return;
+        client.isInside = true;
+        EXPECT_TRUE(WaitUntil([&] { return client.mayGoOn.load(); }));
+    }
+    std::vector<std::uint32_t> GetHeard() {
+        const std::lock_guard hold(mutex);
+        return heard;
+    }
+    std::uint64_t GetPrivate() { return reinterpret_cast<std::uintptr_t>(this); }
+
+    std::atomic<bool> isInside{false}, mayGoOn{false};
+    std::mutex mutex;
+    std::vector<std::uint32_t> heard;
+};
+
+TEST_F(Delivery, AChangeTakenEarlyWaitsForTheOneBeforeItAndIsNotLost) {
+    constexpr std::uint32_t Frame0 = 0, Change0 = 100, Frame1 = 1, Change1 = 101;
+    ClientFrame second(ImageBytes);
+    Zentara_Settings latest = settings;
+    SlowClient client;
+    SetSettingsWide(settings, zprm64Exposure, 20000000);
+    SetSettingsWide(latest, zprm64Exposure, 30000000);
+    const auto queueFrame = [&](Zentara_Frame* queued, std::uint32_t userData) {
+        ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, queued, SlowClient::Record, zcbFrameDone,
+                                                 client.GetPrivate(), userData));
+    };
+    const auto queueChange = [&](Zentara_Settings* queued, std::uint32_t userData) {
+        ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, queued, SlowClient::Record,
+                                                    zcbFrameDone, client.GetPrivate(), userData));
+    };
+    queueFrame(frame.Get(), Frame0);
+    queueChange(&settings, Change0);
+    queueFrame(second.Get(), Frame1);
+    queueChange(&latest, Change1);
+
+    std::thread runLoop([&] { ReceiveImage(); });
+    EXPECT_TRUE(WaitUntil([&] { return client.isInside.load(); }));
+    std::thread exposure([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return CountQueued() == 1; })) << "the last change was not taken";
+    client.mayGoOn = true;
+    runLoop.join();
+    exposure.join();
+
+    EXPECT_EQ((std::vector<std::uint32_t>{Frame0, Change0, Change1}), client.GetHeard());
+    EXPECT_EQ(30000000u, GetCamera().GetExposure());
     EXPECT_EQ(1u, CountQueued());
 }
 

@@ -59,18 +59,20 @@ TEST_F(EntryQueue, AFullQueueIsTakenWholeInOrder) {
 }
 
 TEST_F(EntryQueue, OnlyASettingsEntryIsTakenFromTheMiddle) {
+    std::uint64_t ticket = 0;
     ASSERT_TRUE(Append(0));
     ASSERT_TRUE(Append(1, QueueKindSettings));
     ASSERT_TRUE(Append(2));
 
-    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 0, 2));
-    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 1, 4));
-    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 3, 2));
-    QueueEntry* const taken = TakeSettingsEntry(context, 1, 2);
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 0, 2, &ticket));
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 1, 4, &ticket));
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 3, 2, &ticket));
+    QueueEntry* const taken = TakeSettingsEntry(context, 1, 2, &ticket);
 
     ASSERT_NE(nullptr, taken);
     EXPECT_EQ(1u, taken->userData);
     EXPECT_EQ((std::vector<std::uint32_t>{0, 2}), GetOrder());
+    EXPECT_EQ(1u, ticket) << "one that is not taken gets no place";
     LetGoOfEntry(context, taken);
 }
 
@@ -122,8 +124,9 @@ TEST_F(EntryQueue, StaysWholeWhileThreadsAppendTakeAndClear) {
         for (std::uint32_t i = 0; i < Rounds; ++i) (void)Append(i, i % 3 == 0 ? 1 : 0);
     });
     std::thread taker([&] {
+        std::uint64_t ticket = 0;
         for (std::uint32_t i = 0; i < Rounds; ++i) {
-            LetGoOfEntry(context, TakeSettingsEntry(context, 1, 2));
+            LetGoOfEntry(context, TakeSettingsEntry(context, 1, 2, &ticket));
             LetGoOfEntry(context, TakeFirstEntry(context));
         }
     });

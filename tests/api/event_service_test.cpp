@@ -4,7 +4,9 @@
 
 #include <atomic>
 #include <chrono>
+#include <optional>
 #include <thread>
+#include <utility>
 
 #include "api/entry_queue.h"
 #include "hal/platform/clock.h"
@@ -192,6 +194,44 @@ TEST_F(Services, AFailedCloseWaitsForTheImageInDelivery) {
     image.mayEnd = true;
 
     EXPECT_TRUE(close.Ends());
+}
+
+TEST_F(Services, ChangesAreMadeInTheOrderInWhichTheyWereTaken) {
+    QueueEntry change;
+    change.kind = QueueKindSettings;
+    ASSERT_TRUE(AppendEntry(context, change));
+    ASSERT_TRUE(AppendEntry(context, change));
+    std::optional<EventService> earlier(std::in_place, context, EventService::Kind::Image);
+    LetGoOfEntry(context, earlier->TakeChange(1, 2));
+
+    Waiter later([&] {
+        EventService service(context, EventService::Kind::Exposure);
+        QueueEntry* const taken = service.TakeChange(1, 2);
+        EXPECT_NE(nullptr, taken) << "a change in hand elsewhere keeps none in the queue";
+        service.AwaitEarlierChanges();
+        LetGoOfEntry(context, taken);
+    });
+
+    EXPECT_TRUE(WaitUntil([&] { return GetQueueCount(context) == 1; }));
+    EXPECT_FALSE(later.EndsSoon());
+    earlier->AwaitEarlierChanges();
+    earlier.reset();
+    EXPECT_TRUE(later.Ends());
+}
+
+TEST_F(Services, AChangeIsNotKeptFromBeingMadeByALaterOne) {
+    QueueEntry change;
+    change.kind = QueueKindSettings;
+    ASSERT_TRUE(AppendEntry(context, change));
+    ASSERT_TRUE(AppendEntry(context, change));
+    EventService earlier(context, EventService::Kind::Exposure);
+    EventService later(context, EventService::Kind::Image);
+    LetGoOfEntry(context, earlier.TakeChange(1, 2));
+    LetGoOfEntry(context, later.TakeChange(1, 2));
+
+    Waiter waiter([&] { earlier.AwaitEarlierChanges(); });
+
+    EXPECT_TRUE(waiter.Ends());
 }
 
 }  // namespace
