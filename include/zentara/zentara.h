@@ -36,8 +36,9 @@
  *
  * Buffers. Every record, array, text and pixel buffer belongs to the client. The library keeps
  * pointers only to what is queued: a queued Zentara_Frame with its pixel buffer, and a queued
- * Zentara_Settings, must stay alive and untouched until their last callback, or until
- * Zentara_Abort or Zentara_CloseCamera returns.
+ * Zentara_Settings, must stay alive and untouched until its callback with zcbFrameDone, or until
+ * Zentara_Abort or Zentara_CloseCamera returns. Only these two give back what has no such callback:
+ * none was asked for, or a change of settings was dropped (Zentara_QueueSettings).
  *
  * Threads. Zentara_LoadDriver, Zentara_ReleaseDriver, Zentara_ListCameras, Zentara_OpenCamera and
  * Zentara_CloseCamera take no lock: never run them alongside one another or alongside other calls
@@ -46,14 +47,15 @@
  *
  * Callbacks come from the library's own threads: the frame thread and the exposure thread of the
  * camera, which are alive from open to close. A callback may call Zentara_QueueFrame,
- * Zentara_QueueSettings, the functions that read, and, with zcbExposeDone, Zentara_Trigger. It must
- * not call Zentara_CloseCamera or Zentara_ReleaseDriver, which wait for the very thread that the
- * callback runs on, nor, from a call with zcbFrameDone, Zentara_Abort or Zentara_GrabFrame: each of
- * these waits for itself for ever.
+ * Zentara_QueueSettings, Zentara_SendSettingsToCam, the functions that read, and, with
+ * zcbExposeDone, Zentara_Trigger. It must not call Zentara_CloseCamera or Zentara_ReleaseDriver,
+ * which wait for the very thread that the callback runs on, nor, from a call with zcbFrameDone,
+ * Zentara_Abort or Zentara_GrabFrame: each of these waits for itself for ever.
  * Zentara_Abort is no better from a call with zcbExposeDone: it may be made up for on the frame
  * thread, when the image is there first.
  * A callback of Zentara_QueueSettings that runs inside that call (empty queue) must not call any
- * queue function. A callback should be short: while it runs no further event of its kind is served.
+ * queue function or send settings. A callback should be short: while it runs no further event of
+ * its kind is served.
  *
  * Numbers are little-endian; records are read and written by byte offset and have the sizes that
  * are asserted below.
@@ -537,9 +539,9 @@ ZENTARA_API ZentaraResult Zentara_TranslateSettings(ZentaraHandle handle,
  * On a camera in real-time video a block for the standard mode makes the camera leave the mode and
  * enter it again, which stops a stream.
  *
- * 8 not loaded; 9 `handle` null; 2 `settings` null; 9 not a camera, or open in another process; the
- * failure of a question for the exposure's limits, after the region of interest has been mended: 3
- * for a block without its magic number.
+ * 8 not loaded; 9 `handle` null; 2 `settings` null; 9 not a camera, not open, or open in another
+ * process; the failure of a question for the exposure's limits, after the region of interest has
+ * been mended: 3 for a block without its magic number.
  */
 ZENTARA_API ZentaraResult Zentara_PreflightSettings(ZentaraHandle handle,
                                                     Zentara_Settings* settings);
@@ -550,8 +552,10 @@ ZENTARA_API ZentaraResult Zentara_PreflightSettings(ZentaraHandle handle,
  * binning and readout speed is read back into the block. Goes over the bus. Streaming that had to
  * stop goes on afterwards. A setting that the camera does not have is no failure.
  *
- * The first failure ends the call: what was set before it stays set. Waits while another thread
- * sends settings or queues.
+ * The first failure ends the call: what was set before it stays set. After a failed send, whichever
+ * call made it, queued changes are no longer applied at the end of an exposure until a send
+ * succeeds; those with an entry behind them are still applied when their frame is delivered. Waits
+ * while another thread sends settings or queues.
  *
  * 8 not loaded; 9 `handle` null; 3 `settings` null or without its magic number; 9 not open; 9 open
  * in another process; a camera's failure (15, 16 or 30).
@@ -739,6 +743,10 @@ ZENTARA_API ZentaraResult Zentara_QueueFrame(ZentaraHandle handle, Zentara_Frame
  * Queues a change of settings that takes effect behind the frames queued before it, or applies it
  * at once if the queue is empty. A change of format depth, region of interest or readout speed
  * cannot be queued.
+ *
+ * A change that is the last entry behind its frame is applied only if the end of that frame's
+ * exposure is seen before its image. Otherwise it is dropped with the next image, unsent and
+ * without a callback, and that image is dropped too: queue a further frame behind each change.
  *
  * With an empty queue the change is made on this thread, the callback (if wanted by zcbFrameDone)
  * runs before the call returns, and the result is that of the change. That callback must not call
