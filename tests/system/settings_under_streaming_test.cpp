@@ -300,7 +300,11 @@ TEST(SettingsBehindAFrame, MayChangeTheBinningWhichIsNotComparedAndRestartsTheSt
 }
 
 /// What a second client thread does to a camera whose settings the first one sends.
-void DisturbStream(Streamed& streamed, std::atomic<bool>& isOver) {
+struct Disturbance {
+    std::atomic<bool> isOver{false};
+    std::atomic<std::size_t> rounds{0};
+};
+void DisturbStream(Streamed& streamed, Disturbance& disturbance) {
     const ZentaraHandle handle = streamed.GetHandle();
     const auto blocks = MakeDifferentSettings(streamed.ReadSettings(), streamed.camera);
     CallbackLog calls;
@@ -309,7 +313,7 @@ void DisturbStream(Streamed& streamed, std::atomic<bool>& isOver) {
         frames.push_back(std::make_unique<ClientFrame>(StreamedCamera::BufferBytes));
     }
     Zentara_Settings block = blocks[0];
-    for (std::size_t round = 0; !isOver; ++round) {
+    for (std::size_t round = 0; !disturbance.isOver; round = ++disturbance.rounds) {
         for (const auto& frame : frames) {
             (void)Zentara_QueueFrame(handle, frame->Get(), CallbackLog::Record, 3,
                                      calls.GetPrivate(), 0);
@@ -335,15 +339,20 @@ TEST_P(SettingsUnderStreaming, OneThreadMaySendWhileAnotherQueuesAbortsAndGrabs)
     ASSERT_NO_FATAL_FAILURE(streamed.AddDifferentSets());
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(streamed.GetHandle(), 1));
     const ZentaraSimulationState before = streamed.session.world.GetState();
-    std::atomic<bool> isOver{false};
-    std::thread other([&] { DisturbStream(streamed, isOver); });
+    Disturbance disturbance;
+    std::thread other([&] { DisturbStream(streamed, disturbance); });
 
     for (std::size_t i = 0; i < Sends; ++i) {
         Zentara_Settings block = streamed.history.GetSet(i * 5 % 9).block;
         EXPECT_ZERR(zerrNone, Zentara_SendSettingsToCam(streamed.GetHandle(), &block));
+        if (i % 3 != 0) continue;
+        // A stream that is always started anew brings no image to a grab.
+        const std::size_t rounds = disturbance.rounds;
+        EXPECT_TRUE(
+            WaitUntil([&] { return disturbance.rounds > rounds; }, std::chrono::seconds(60)));
     }
 
-    isOver = true;
+    disturbance.isOver = true;
     other.join();
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(streamed.GetHandle(), 1));
     ExpectSameReservations(before, streamed.session.world.GetState());
