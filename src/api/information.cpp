@@ -47,8 +47,9 @@ ZentaraResult GetSerialString(const char* function, ZentaraHandle handle, char* 
     ZCamera* const camera = FindCamera(handle);
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
     if (!IsOpen(camera)) return zerrBadHandle;
-    const ZentaraResult result = CopyText(camera->GetSerialNumberString(), text, length);
-    if (result == zerrNone) ZLogMessage(function, "Serial: %s", text);
+    const ZCamera::SerialNumberText serial = camera->CopySerialNumber();
+    const ZentaraResult result = CopyText(serial.data(), text, length);
+    if (result == zerrNone) ZLogMessage(function, "Serial: %s", serial.data());
     return result;
 }
 
@@ -60,8 +61,9 @@ ZentaraResult GetCameraModelString(const char* function, ZentaraHandle handle, c
     ZCamera* const camera = FindCamera(handle);
     if (!IsOpen(camera)) return zerrBadHandle;
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
-    const ZentaraResult result = CopyText(camera->GetModelName(), text, length);
-    if (result == zerrNone) ZLogMessage(function, "Camera model: %s", text);
+    const char* const name = camera->GetModelName();
+    const ZentaraResult result = CopyText(name, text, length);
+    if (result == zerrNone) ZLogMessage(function, "Camera model: %s", name);
     return result;
 }
 

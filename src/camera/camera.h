@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <vector>
 
@@ -330,6 +331,11 @@ class ZENTARA_API ZCamera : public ZObject {
     /// Id of the class that this camera must be made as; GetModel unless a model knows better.
     virtual std::uint32_t ReturnMasqueradedModel();
     virtual CameraResult ReadCameraInfo() = 0;
+
+    /// What GetSerialNumberString tells, always terminated, for the caller alone: that text is
+    /// rewritten when another thread finds that the camera's registers have changed. Reentrant.
+    using SerialNumberText = std::array<char, 29>;
+    virtual SerialNumberText CopySerialNumber() = 0;
 
   private:
     virtual CameraResult SetupCamera() = 0;

@@ -309,15 +309,21 @@ std::uint32_t MorvaneFWCamera::GetTriggerDelayResolution() {
     return ReadConfiguration(ConfigTriggerDelayResolution);
 }
 
-const char* MorvaneFWCamera::GetSerialNumberString() {
+ZCamera::SerialNumberText MorvaneFWCamera::CopySerialNumber() {
     const bool isReversed = !GetBigEndian();
-    std::array<char, ConfigSerialQuadlets * sizeof(std::uint32_t)> text;
+    SerialNumberText text{};
+    static_assert(text.size() == ConfigSerialQuadlets * sizeof(std::uint32_t) + 1);
     for (std::uint32_t index = 0; index < ConfigSerialQuadlets; ++index) {
         const std::uint32_t quadlet = ReadConfiguration(ConfigSerialFirst + index);
         char* const bytes = &text[index * sizeof quadlet];
         std::memcpy(bytes, &quadlet, sizeof quadlet);
         if (isReversed) std::reverse(bytes, bytes + sizeof quadlet);
     }
+    return text;
+}
+
+const char* MorvaneFWCamera::GetSerialNumberString() {
+    const SerialNumberText text = CopySerialNumber();
     // Stored only when it differs: other threads may be reading what they were given.
     const std::lock_guard hold(serialMutex);
     if (std::memcmp(serialText.data(), text.data(), text.size()) != 0)

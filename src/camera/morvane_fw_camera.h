@@ -154,6 +154,7 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     std::uint32_t GetExposureResolution() override;
     std::uint32_t GetTriggerDelayResolution() override;
     const char* GetSerialNumberString() override;
+    SerialNumberText CopySerialNumber() override;
     bool GetRegulatedCoolingTemperatureLock() override;
     std::int32_t GetRegulatedCoolingTemperature() override;
     std::uint16_t GetCCDImageFormat() override;

@@ -2,6 +2,8 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <string>
+#include <thread>
 
 #include "camera/bare_camera.h"
 #include "camera/test_camera.h"
@@ -376,6 +378,41 @@ TEST(SerialNumber, Of28BytesIsEndedAllTheSame) {
     camera.StoreConfiguration(25, 0x79797979);
 
     EXPECT_EQ(28u, std::strlen(camera.GetSerialNumberString()));
+}
+
+TEST(SerialNumber, ThatWasCopiedStaysWhenTheRegistersChange) {
+    BareBase camera;
+    camera.StoreControl(ControlLittleEndian, 1);
+    camera.StoreConfiguration(18, 0x41424344);
+    const ZCamera::SerialNumberText copy = camera.CopySerialNumber();
+    const char* const shared = camera.GetSerialNumberString();
+
+    camera.StoreConfiguration(18, 0x45464748);
+    (void)camera.GetSerialNumberString();
+
+    EXPECT_STREQ("ABCD", copy.data());
+    EXPECT_STREQ("EFGH", shared);
+}
+
+TEST(SerialNumber, IsCopiedWholeWhileAnotherThreadFindsALongerOne) {
+    constexpr int Rounds = 2000;
+    BareBase camera;
+    camera.StoreControl(ControlLittleEndian, 1);
+    std::thread changing([&] {
+        for (int round = 0; round < Rounds; ++round) {
+            const std::uint32_t quadletOfText = round % 2 == 0 ? 0x78787878 : 0;
+            for (std::uint32_t quadlet = 18; quadlet <= 24; ++quadlet)
+                camera.StoreConfiguration(quadlet, quadletOfText);
+            (void)camera.GetSerialNumberString();
+        }
+    });
+
+    for (int round = 0; round < Rounds; ++round) {
+        const ZCamera::SerialNumberText text = camera.CopySerialNumber();
+        EXPECT_EQ('\0', text.back());
+        EXPECT_EQ(std::string::npos, std::string(text.data()).find_first_not_of('x'));
+    }
+    changing.join();
 }
 
 TEST(Identity, StandsInTheConfiguration) {
