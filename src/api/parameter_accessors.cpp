@@ -57,13 +57,19 @@ ZentaraResult TracedKey(const char* function, std::uint32_t key, Body&& body) no
 
 // ---- Reading: values and limits ----
 
+/// What becomes of a key beyond the family's last.
+enum class BeyondLast {
+    AskForSupport,  ///< Refused once the support function has been asked.
+    Print,          ///< The same, and the out value is printed like an answer.
+    RefuseAtOnce,   ///< The support function is not asked.
+};
+
 template <typename Value>
 struct Question {
     Zentara_Settings* block;
     std::uint32_t key;
     Value* value;
-    /// Whether a key beyond the family's last is printed like an answer.
-    bool printsUnknownKey = false;
+    BeyondLast beyondLast = BeyondLast::AskForSupport;
 };
 
 /// What is asked of a key once the arguments have passed.
@@ -80,12 +86,15 @@ ZentaraResult AskParameter(const Question<typename Family::Value>& question,
     if (!HasSettingsMagic(*question.block)) return zerrBadSettings;
     ZCamera* const camera = FindBlockCamera(*question.block);
     if (camera == nullptr) return zerrBadSettings;
-    const bool isSupported = Family::IsSupported(*question.block, question.key);
     const auto* const row = Family::FindRow(question.key);
-    if (row == nullptr && question.printsUnknownKey) Family::Print(question.key, *question.value);
+    if (row == nullptr && question.beyondLast == BeyondLast::RefuseAtOnce) return zerrNotSupported;
+    const bool isSupported = Family::IsSupported(*question.block, question.key);
+    if (row == nullptr && question.beyondLast == BeyondLast::Print) {
+        Family::Print(question.key, *question.value);
+    }
     if (row == nullptr || !isSupported) return zerrNotSupported;
     const ZentaraResult result = answer(*row, *camera, question);
-    Family::Print(question.key, *question.value);
+    if (result == zerrNone) Family::Print(question.key, *question.value);
     return result;
 }
 
@@ -200,19 +209,21 @@ ZentaraResult Zentara_GetParamMax(Zentara_Settings* settings, uint32_t key, uint
 
 ZentaraResult Zentara_GetParamS32(Zentara_Settings* settings, uint32_t key, int32_t* value) {
     using Family = ZV::SignedFamily;
-    return ZV::AskTraced<Family>(__func__, {settings, key, value}, ZV::AnswerValue<Family>);
+    // Kept: it alone looks at the key first, so its trace shows no question for support.
+    return ZV::AskTraced<Family>(__func__, {settings, key, value, ZV::BeyondLast::RefuseAtOnce},
+                                 ZV::AnswerValue<Family>);
 }
 
 ZentaraResult Zentara_GetParamS32Min(Zentara_Settings* settings, uint32_t key, int32_t* value) {
     using Family = ZV::SignedFamily;
     // Kept: the limits of a signed key that does not exist print the out value all the same.
-    return ZV::AskTraced<Family>(__func__, {settings, key, value, true},
+    return ZV::AskTraced<Family>(__func__, {settings, key, value, ZV::BeyondLast::Print},
                                  ZV::AnswerBound<Family, ZV::Bound::Least>);
 }
 
 ZentaraResult Zentara_GetParamS32Max(Zentara_Settings* settings, uint32_t key, int32_t* value) {
     using Family = ZV::SignedFamily;
-    return ZV::AskTraced<Family>(__func__, {settings, key, value, true},
+    return ZV::AskTraced<Family>(__func__, {settings, key, value, ZV::BeyondLast::Print},
                                  ZV::AnswerBound<Family, ZV::Bound::Greatest>);
 }
 

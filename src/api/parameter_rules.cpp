@@ -7,6 +7,7 @@
 #include "api/parameter_table.h"
 #include "api/settings_block.h"
 #include "api/settings_units.h"
+#include "diagnostics/log.h"
 
 namespace ZV {
 
@@ -67,8 +68,10 @@ ZentaraResult GetExposureParameter(const Zentara_Settings& block, ZCamera& /*cam
     return zerrNone;
 }
 
-ZentaraResult RefuseGet(const Zentara_Settings& /*block*/, ZCamera& /*camera*/,
-                        std::uint32_t* /*value*/) {
+// Kept: the log shows a value that was not read.
+ZentaraResult RefuseRegisterTweak(const Zentara_Settings& /*block*/, ZCamera& /*camera*/,
+                                  std::uint32_t* value) {
+    ZentaraDebugOutputSetting32(zprmRegisterTweak, *value);
     return zerrNotSupported;
 }
 

@@ -21,8 +21,9 @@ ZentaraResult GetNormalizedGainParameter(const Zentara_Settings& block, ZCamera&
 template <std::uint32_t Wide>
 ZentaraResult GetExposureParameter(const Zentara_Settings& block, ZCamera& camera,
                                    std::uint32_t* value);
-/// Always zerrNotSupported, value untouched.
-ZentaraResult RefuseGet(const Zentara_Settings& block, ZCamera& camera, std::uint32_t* value);
+/// Always zerrNotSupported; the value is left alone and goes to the log all the same.
+ZentaraResult RefuseRegisterTweak(const Zentara_Settings& block, ZCamera& camera,
+                                  std::uint32_t* value);
 
 ZentaraResult SetGainParameter(Zentara_Settings& block, ZCamera& camera, std::uint32_t key,
                                std::uint32_t value);

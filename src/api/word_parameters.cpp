@@ -518,7 +518,7 @@ constexpr std::array Words{
                                       "the top four bits, value in the low 16"},
                   .log = {.label = "Register Tweak", .isNamed = false},
                   .isSupported = Has<&ZCamera::IsTweekingRegisterSupported>,
-                  .get = RefuseGet,
+                  .get = RefuseRegisterTweak,
                   .set = SetUnchecked},
 };
 

@@ -6,11 +6,12 @@
 #include <string>
 
 #include "support/flat_camera.h"
+#include "support/parameter_worlds.h"
 #include "support/scoped_variable.h"
 #include "support/settings_words.h"
 
-// What the parameters' functions print to the log. Calls inside calls are shown, so that the depth
-// that earlier tests left does not matter.
+// What the functions of parameters and information print to the log. Calls inside calls are shown,
+// so that the depth that earlier tests left does not matter.
 namespace ZV::Test {
 namespace {
 
@@ -46,9 +47,10 @@ class ParameterLog : public OpenedCamera {
   private:
     std::string WriteSwitches() const {
         std::string path = world.GetFolder() / "zentara.conf";
-        std::ofstream(path) << "outputEnabled = 1\noutputSettings = 1\noutputSparseTable = 1\n"
-                               "outputNestedCalls = 1\noutputToFile = 1\noutputFilePath = "
-                            << logPath << "\n";
+        std::ofstream(path)
+            << "outputEnabled = 1\noutputSettings = 1\noutputSparseTable = 1\n"
+               "outputGetInfo = 1\noutputNestedCalls = 1\noutputToFile = 1\noutputFilePath = "
+            << logPath << "\n";
         return path;
     }
     std::string ReadLog() const {
@@ -81,6 +83,63 @@ TEST_F(ParameterLog, AValueThatIsReadIsPrinted) {
     ASSERT_ZERR(zerrNone, Zentara_GetParam(&block, zprmRoiX, &value));
 
     EXPECT_THAT(TakeRecords(), HasSubstr("777"));
+}
+
+TEST_F(ParameterLog, EveryFamilyPrintsWhatIsReadBoundedAndSet) {
+    std::uint32_t word = 0;
+    std::int32_t signedValue = 0;
+    std::uint64_t wide = 0;
+
+    ASSERT_ZERR(zerrNone, Zentara_GetParamMin(&block, zprmPostProcessGainRed, &word));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Post Process Gain Red: 10 "));
+    ASSERT_ZERR(zerrNone, Zentara_GetParamMax(&block, zprmPostProcessGainRed, &word));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Post Process Gain Red: 100000 "));
+    ASSERT_ZERR(zerrNone, Zentara_SetParamS32(&block, zprmS32AbsoluteOffset, -321));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Absolute Offset: -321"));
+    ASSERT_ZERR(zerrNone, Zentara_GetParamS32(&block, zprmS32AbsoluteOffset, &signedValue));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Absolute Offset: -321"));
+    ASSERT_ZERR(zerrNone, Zentara_GetParamS32Max(&block, zprmS32AbsoluteOffset, &signedValue));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Absolute Offset: " + std::to_string(signedValue)));
+    ASSERT_ZERR(zerrNone, Zentara_SetParam64(&block, zprm64Exposure, 7654321));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Exposure (64-bit): 7654321 ns"));
+    ASSERT_ZERR(zerrNone, Zentara_GetParam64(&block, zprm64Exposure, &wide));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Exposure (64-bit): 7654321 ns"));
+    ASSERT_ZERR(zerrNone, Zentara_GetParam64Min(&block, zprm64Exposure, &wide));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Exposure (64-bit): " + std::to_string(wide) + " ns"));
+}
+
+// Kept: one getter looks at the key before it asks; the others ask first.
+TEST_F(ParameterLog, OfASignedKeyThatDoesNotExistTheGetterAloneAsksNotForSupport) {
+    std::uint32_t word = 0;
+    std::int32_t signedValue = 0;
+    std::uint64_t wide = 0;
+
+    ASSERT_ZERR(zerrNotSupported, Zentara_GetParamS32(&block, 3, &signedValue));
+    EXPECT_THAT(TakeRecords(), Not(HasSubstr("Zentara_IsParamS32Supported")));
+    ASSERT_ZERR(zerrNotSupported, Zentara_GetParamS32Min(&block, 3, &signedValue));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Zentara_IsParamS32Supported"));
+    ASSERT_ZERR(zerrNotSupported, Zentara_GetParamS32(&block, 2, &signedValue));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Zentara_IsParamS32Supported"));
+    ASSERT_ZERR(zerrNotSupported, Zentara_GetParam(&block, 47, &word));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Zentara_IsParamSupported"));
+    ASSERT_ZERR(zerrNotSupported, Zentara_GetParam64(&block, 4, &wide));
+    EXPECT_THAT(TakeRecords(), HasSubstr("Zentara_IsParam64Supported"));
+}
+
+class RichLog : public ParameterLog {
+  protected:
+    RichLog() : ParameterLog(RichMono) {}
+};
+
+TEST_F(RichLog, ALimitThatAKeyDoesNotHaveIsNotPrinted) {
+    for (const std::uint32_t key : {27u, 34u, 35u, 45u, 46u}) {
+        std::uint32_t value = 54321;
+
+        ASSERT_ZERR(zerrNotSupported, Zentara_GetParamMin(&block, key, &value)) << key;
+        ASSERT_ZERR(zerrNotSupported, Zentara_GetParamMax(&block, key, &value)) << key;
+
+        EXPECT_THAT(TakeRecords(), Not(HasSubstr("54321"))) << key;
+    }
 }
 
 class TweakLog : public ParameterLog {
@@ -141,6 +200,22 @@ TEST_F(LogOfATakenCamera, ACameraInAnotherProcessIsToldByTheQuestionForSupport) 
                 HasSubstr("Zentara_IsParamSupported - Another process has this camera open."));
 }
 
+// Kept: the serial number alone asks for the access before it asks whether the camera is open.
+TEST_F(ParameterLog, OfAClosedCameraTheSerialNumberAloneIsSaidToBeInAnotherProcess) {
+    constexpr const char* Message = "Another process has this camera open.";
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    TakeRecords();
+    char text[64];
+    std::uint32_t value = 0;
+
+    EXPECT_ZERR(zerrBadHandle, Zentara_GetSerialString(handle, text, sizeof text));
+    EXPECT_THAT(TakeRecords(), HasSubstr(std::string("Zentara_GetSerialString - ") + Message));
+    EXPECT_ZERR(zerrBadHandle, Zentara_GetCameraModelString(handle, text, sizeof text));
+    EXPECT_THAT(TakeRecords(), Not(HasSubstr(Message)));
+    EXPECT_ZERR(zerrBadHandle, Zentara_GetInfo(handle, zinfCcd, &value));
+    EXPECT_THAT(TakeRecords(), Not(HasSubstr(Message)));
+}
+
 TEST_F(ParameterLog, ACameraThatIsClosedIsNotSaidToBeInAnotherProcess) {
     ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
     TakeRecords();
@@ -148,6 +223,36 @@ TEST_F(ParameterLog, ACameraThatIsClosedIsNotSaidToBeInAnotherProcess) {
     EXPECT_ZERR(zerrBadHandle, Zentara_IsParamSupported(handle, zprmRoiX));
 
     EXPECT_THAT(TakeRecords(), Not(HasSubstr("Another process")));
+}
+
+TEST_F(ParameterLog, AnAnswerOfTheInformationIsPrinted) {
+    std::uint32_t value = 0;
+
+    ASSERT_ZERR(zerrNone, Zentara_GetInfo(handle, zinfImageWidth, &value));
+
+    EXPECT_THAT(TakeRecords(), HasSubstr("Image Width: 64"));
+}
+
+TEST_F(ParameterLog, AnInformationKeyWithoutAnAnswerIsNotPrinted) {
+    testing::internal::CaptureStdout();
+    for (const std::uint32_t key : {27u, 28u, 35u, 41u, 100u}) {
+        std::uint32_t value = 0;
+        EXPECT_ZERR(zerrNotSupported, Zentara_GetInfo(handle, key, &value)) << key;
+    }
+    (void)testing::internal::GetCapturedStdout();
+
+    const std::string records = TakeRecords();
+    EXPECT_THAT(records, Not(HasSubstr("ZentaraDebugOutputGetInfo()")));
+    EXPECT_THAT(records, Not(HasSubstr(": 0")));
+}
+
+TEST_F(ParameterLog, AResolutionOfATriggerDelayThatTheCameraDoesNotHaveIsNotPrinted) {
+    std::uint32_t value = 0xDDDDDDDD;
+
+    ASSERT_ZERR(zerrNotSupported, Zentara_GetInfo(handle, zinfTriggerDelayRes, &value));
+
+    EXPECT_NE(0xDDDDDDDDu, value);
+    EXPECT_THAT(TakeRecords(), Not(HasSubstr("Trigger Delay Resolution")));
 }
 
 }  // namespace
