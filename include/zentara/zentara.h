@@ -336,7 +336,8 @@ typedef struct Zentara_CamListItem {
 
 /**
  * The settings of a camera; 260 bytes. A client never looks inside: a block is filled by
- * Zentara_ReadSettingsFromCam and belongs to the camera that filled it.
+ * Zentara_ReadSettingsFromCam or Zentara_ReadDefaultSettings and belongs to the camera that filled
+ * it.
  */
 typedef struct Zentara_Settings {
     uint32_t size; /**< Written as 260; not compared. */
@@ -541,7 +542,8 @@ ZENTARA_API ZentaraResult Zentara_TranslateSettings(ZentaraHandle handle,
  *
  * 8 not loaded; 9 `handle` null; 2 `settings` null; 9 not a camera, not open, or open in another
  * process; the failure of a question for the exposure's limits, after the region of interest has
- * been mended: 3 for a block without its magic number.
+ * been mended: 3 for a block without its magic number, 3 when the camera of the block's own handle
+ * is not open.
  */
 ZENTARA_API ZentaraResult Zentara_PreflightSettings(ZentaraHandle handle,
                                                     Zentara_Settings* settings);
@@ -571,6 +573,8 @@ ZENTARA_API ZentaraResult Zentara_SendSettingsToCam(ZentaraHandle handle,
  * `key` is one of zprm..., zprmS32... or zprm64.... Gain, offset, exposures and normalised gain are
  * worked out from the values that are sent, whatever their own words hold. Where a key has a list
  * of allowed values and no range, its limits are the first and the last entry of that list.
+ * zprmS32NormalizedGaindB reads back rounded to its step and brought into its limits, whatever was
+ * stored.
  *
  * 8 not loaded; 2 `settings` null; 2 `value` null; 3 no magic number; 3 the block's camera is not
  * open; 1 the camera does not have the key, or the key has no such value (`*value` untouched).
@@ -607,13 +611,15 @@ ZENTARA_API ZentaraResult Zentara_GetParam64Max(Zentara_Settings* settings, uint
  *
  * A value beyond the limits passes where the key has a range and no list: the camera's answer shows
  * when the block is sent. Gain, offset and normalised gain are stored as the signed keys that are
- * sent; exposures of 32 bits are stored in their 64-bit key as well.
+ * sent; exposures of 32 bits are stored in their 64-bit key as well. zprmIntensifierGain and
+ * zprmNormIntensGaindB are never sent: zprm64NormIntensGain sets the gain of the intensifier.
  *
  * 8 not loaded; 2 `settings` null; 3 no magic number; 1 no such key; 3 the block's camera is not
  * open; 1 the camera does not have the key; 1 a binning that is not in the list, or a key that
  * cannot be set (nothing stored); 2 any other value that is not in its list, or a cooling target
  * beyond its limits (nothing stored); 2 an exposure beyond its limits, which is stored all the same
- * and brought to the nearest limit by the send.
+ * and brought to the nearest limit by the send. zprmColorWheel and zprmPostProcessBayerAlgorithm
+ * are stored whatever they are, in spite of their lists.
  */
 ZENTARA_API ZentaraResult Zentara_SetParam(Zentara_Settings* settings, uint32_t key,
                                            uint32_t value);

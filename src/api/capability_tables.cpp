@@ -1,6 +1,7 @@
 // What a camera offers for each key: whether it has it, and which values. The answers come from the
 // camera's model; nothing is stored and nothing goes over the bus.
 
+#include <algorithm>
 #include <cstddef>
 #include <vector>
 

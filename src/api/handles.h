@@ -19,8 +19,9 @@ void UnregisterCamera(ZCamera* camera);
 
 /// The access tests of the exported functions. A null camera fails both, without a message.
 [[nodiscard]] bool IsOpen(ZCamera* camera);
-/// False when another process has the camera open, which goes to the log as a message of
-/// `function`.
+/// False for every camera that this process has not open, with the log's message of `function`
+/// that another process has it open: also where nobody has, so callers ask IsOpen first where the
+/// message would mislead.
 [[nodiscard]] bool HasExclusiveAccess(const char* function, ZCamera* camera);
 
 }  // namespace ZV

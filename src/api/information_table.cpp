@@ -9,8 +9,8 @@ namespace ZV {
 
 namespace {
 
-// Kept: a list of its own. It names types that no camera has, calls 25 by another name than
-// GetModelName does, and leaves some models out.
+// Kept: a list of its own. It names types that no camera has, calls 14, 31 and 32 by other names
+// than GetModelName does, and leaves some models out.
 constexpr std::array CameraTypeNames{
     ValueName{5, "Solvane A1"},  ValueName{6, "Solvane A2"},  ValueName{7, "Dorix B1"},
     ValueName{8, "Folary"},      ValueName{9, "Solvane K1"},  ValueName{10, "Dorix R1"},
