@@ -238,6 +238,12 @@ TEST_F(BareCapabilities, AnEightBitBayerCameraListsNoDeepFormatButTheDeepMosaic)
     EXPECT_EQ((List{0, 2, 4, 8, 9, 11, 12}), GetList(zprmPostProcessImageFormat));
 }
 
+TEST_F(BareCapabilities, ARoomOfTwoForAListOfSevenGivesTwo) {
+    ASSERT_EQ(7u, GetList(zprmPostProcessImageFormat).size());
+
+    EXPECT_EQ((List{0, 2}), GetList(zprmPostProcessImageFormat, 2));
+}
+
 TEST_F(BareCapabilities, AListOfTheWheelIsRefusedWithoutAWheel) {
     ExpectNoList(zprmColorWheel);
 }
@@ -307,7 +313,9 @@ class FormatLists : public CapabilityTables, public testing::WithParamInterface<
 TEST_P(FormatLists, GoByColourWheelAndDepth) {
     EXPECT_EQ(GetParam().image, GetList(zprmImageFormat));
     EXPECT_EQ(GetParam().postProcess, GetList(zprmPostProcessImageFormat));
+}
 
+TEST_P(FormatLists, TheLimitsOfTheImageFormatAreZeroAndTheLastOfItsList) {
     std::uint32_t least = Untouched;
     std::uint32_t greatest = Untouched;
     EXPECT_ZERR(zerrNone, Zentara_GetParamMin(&block, zprmImageFormat, &least));

@@ -3,6 +3,7 @@
 #include <cstring>
 #include <string>
 
+#include "camera/camera.h"
 #include "support/flat_camera.h"
 
 namespace ZV::Test {
@@ -89,6 +90,16 @@ TEST_F(Information, WithoutATriggerDelayItsResolutionReturnsOneAndIsWrittenAllTh
     EXPECT_ZERR(zerrNotSupported, Zentara_GetInfo(handle, zinfTriggerDelayRes, &value));
 
     EXPECT_NE(0xDDDDDDDDu, value);
+}
+
+TEST_F(Information, WithoutAnIntensifierKey17ReturnsOneAndTheNeighboursOfKey19StayUsable) {
+    std::uint32_t value = 0;
+
+    EXPECT_ZERR(zerrNotSupported, Zentara_GetInfo(handle, 17, &value));
+    EXPECT_ZERR(zerrNotSupported, Zentara_GetInfo(handle, 19, &value));
+
+    EXPECT_EQ(1000u, GetInfo(18));
+    EXPECT_EQ(1u, GetInfo(20));
 }
 
 TEST_F(Information, EveryOtherKeyAnswersWithSuccess) {
@@ -179,6 +190,46 @@ class ColourInformation : public Information {
 
 TEST_F(ColourInformation, AMosaicIsOfTypeOne) {
     EXPECT_EQ(1u, GetInfo(zinfCcdType));
+}
+
+TEST_F(Information, BehindAWheelThatCyclesTheSensorIsStillOfTypeZero) {
+    ASSERT_EQ(CameraOk, reinterpret_cast<ZCamera*>(handle)->SetRGBFilterCycle(true));
+
+    EXPECT_EQ(3u, reinterpret_cast<ZCamera*>(handle)->GetImageFormat());
+    EXPECT_EQ(0u, GetInfo(zinfCcdType));
+}
+
+class InformationOfAnotherColourKind : public Information {
+  protected:
+    InformationOfAnotherColourKind()
+        : Information(R"({"cameras": [{"model": "SolvaneA1",
+              "sensor": {"width": 64, "height": 48},
+              "configuration": {"17": "0x00060200"}}]})") {}
+};
+
+// Kept: a client that does not preset the value reads what was there.
+TEST_F(InformationOfAnotherColourKind, IsAnsweredWithSuccessAndTheValueIsLeftAlone) {
+    std::uint32_t value = 99;
+
+    EXPECT_ZERR(zerrNone, Zentara_GetInfo(handle, zinfCcdType, &value));
+
+    EXPECT_EQ(99u, value);
+}
+
+class LongSerialNumber : public Information {
+  protected:
+    LongSerialNumber()
+        : Information(R"({"base": "mono", "cameras": [{"serial": "ABCDEFGHIJKLMNOPQRSTUVWXYZ12",
+              "sensor": {"width": 64, "height": 48}}]})") {}
+};
+
+TEST_F(LongSerialNumber, Of28CharactersIsTerminatedAllTheSame) {
+    char text[29];
+
+    EXPECT_ZERR(zerrBadParameter, Zentara_GetSerialString(handle, text, 28));
+    ASSERT_ZERR(zerrNone, Zentara_GetSerialString(handle, text, 29));
+
+    EXPECT_STREQ("ABCDEFGHIJKLMNOPQRSTUVWXYZ12", text);
 }
 
 class IntensifiedInformation : public Information {

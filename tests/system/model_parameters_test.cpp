@@ -10,6 +10,7 @@
 
 #include "support/flat_camera.h"
 #include "support/settings_words.h"
+#include "system/camera_session.h"
 
 // What every model tells of every parameter and information key, by the version of its
 // configuration block, against tables that are checked in: tests/system/golden/MODEL.txt. Each
@@ -135,11 +136,29 @@ std::string DescribeOffer(OpenedBlocks& blocks, std::uint32_t key, const std::st
     return text + list;
 }
 
+/// A key that the camera does not have is refused by every question, and nothing is written.
+template <typename Functions>
+void ExpectNothingOffered(Zentara_Settings& block, const KnownKey& known) {
+    using Value = typename Functions::Value;
+    constexpr Value Untouched = 77;
+    for (const auto function : {Functions::Get, Functions::GetLeast, Functions::GetGreatest}) {
+        EXPECT_EQ("refused 1", Tell(function, block, known.key, Untouched)) << known.name;
+    }
+    EXPECT_ZERR(zerrNotSupported, Functions::IsRange(&block, known.key)) << known.name;
+    EXPECT_ZERR(zerrNotSupported, Functions::IsList(&block, known.key)) << known.name;
+    Value entry = Untouched;
+    std::int32_t count = 1;
+    EXPECT_ZERR(zerrNotSupported, Functions::GetList(&block, known.key, &entry, &count))
+        << known.name;
+    EXPECT_EQ(Untouched, entry) << known.name;
+}
+
 template <typename Functions>
 std::string DescribeKey(OpenedBlocks& blocks, const KnownKey& known) {
     const std::string read = std::to_string(Functions::ReadBlock(blocks.read, known.key));
     const std::string initial = std::to_string(Functions::ReadBlock(blocks.defaults, known.key));
     const bool has = Functions::IsSupported(blocks.handle, known.key) == zerrNone;
+    if (!has) ExpectNothingOffered<Functions>(blocks.read, known);
     return std::string(Functions::Name) + " " + std::to_string(known.key) + " " + known.name +
            ": " + (has ? "yes" : "no") + ", read " + read + ", default " + initial +
            (has ? DescribeOffer<Functions>(blocks, known.key, read) : "");
@@ -229,6 +248,24 @@ TEST_P(ModelParameters, AreThoseOfTheModelsTableInEveryVersionOfItsConfiguration
     std::filesystem::create_directories(written.parent_path());
     std::ofstream(written) << actual;
     EXPECT_EQ(expected, actual) << "what the library tells stands in " << written;
+}
+
+TEST_P(ModelParameters, HaveNoShutterState) {
+    const CameraSession session(std::string("model:") + GetParam());
+    ASSERT_TRUE(session.IsOpen());
+
+    EXPECT_ZERR(zerrNotSupported, Zentara_IsParamSupported(session.GetHandle(), 18));
+}
+
+TEST_P(ModelParameters, TellASerialNumberOfZeroAndModelBOnEveryCamera) {
+    const CameraSession session(std::string("model:") + GetParam());
+    ASSERT_TRUE(session.IsOpen());
+    std::uint32_t value = 77;
+
+    EXPECT_ZERR(zerrNone, Zentara_GetInfo(session.GetHandle(), 1, &value));
+    EXPECT_EQ(0u, value);
+    EXPECT_ZERR(zerrNone, Zentara_GetInfo(session.GetHandle(), 16, &value));
+    EXPECT_EQ(1u, value);
 }
 
 INSTANTIATE_TEST_SUITE_P(AllModels, ModelParameters,

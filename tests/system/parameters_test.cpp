@@ -485,6 +485,20 @@ TEST_F(Parameters, EditingABlockGoesNotOverTheBusAndChangesNoCamera) {
         (void)Zentara_GetParamMax(&block, key, &value);
         (void)Zentara_SetParam(&block, key, value);
     }
+    for (std::uint32_t key = 0; key < 4; ++key) {
+        std::int32_t value = 0;
+        (void)Zentara_GetParamS32(&block, key, &value);
+        (void)Zentara_GetParamS32Min(&block, key, &value);
+        (void)Zentara_GetParamS32Max(&block, key, &value);
+        (void)Zentara_SetParamS32(&block, key, value);
+    }
+    for (std::uint32_t key = 0; key < 5; ++key) {
+        std::uint64_t value = 0;
+        (void)Zentara_GetParam64(&block, key, &value);
+        (void)Zentara_GetParam64Min(&block, key, &value);
+        (void)Zentara_GetParam64Max(&block, key, &value);
+        (void)Zentara_SetParam64(&block, key, value);
+    }
 
     EXPECT_EQ(before, world.ReadRequests().size());
     EXPECT_TRUE(AreSameBytes(camera, ReadSettings()));

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <array>
 #include <cstring>
 #include <optional>
@@ -101,6 +102,14 @@ constexpr ZentaraResult Settings = zerrBadSettings;
 constexpr ZentaraResult Handle = zerrBadHandle;
 constexpr std::uint32_t NoKeys = 0xFFFFFFFF;  ///< The function takes no key.
 
+/// What a function writes beside its out argument.
+enum class Writes {
+    Nothing,
+    Block,       ///< When it succeeds.
+    ListSize,    ///< The size, when it succeeds.
+    SizeOfZero,  ///< The size, although it refuses.
+};
+
 /// The codes of one function, by what is wrong.
 struct Row {
     const char* name;
@@ -113,21 +122,21 @@ struct Row {
     ZentaraResult wrongMagic;
     ZentaraResult closed;  ///< Also for a stale handle and one that was never given.
     ZentaraResult held;    ///< Open in another process.
-    bool writesSize = false;
+    Writes writes = Writes::Nothing;
 };
 
 // A null handle is that of the block where a function takes no other.
 constexpr Row Rows[] = {
     {"ReadSettingsFromCam", Call<Zentara_ReadSettingsFromCam>, 0, 0, NoKeys, Handle, Handle,
-     Parameter, None, None, None, Handle, Handle},
+     Parameter, None, None, None, Handle, Handle, Writes::Block},
     {"ReadDefaultSettings", Call<Zentara_ReadDefaultSettings>, 0, 0, NoKeys, Handle, Handle,
-     Parameter, None, None, None, Handle, Handle},
+     Parameter, None, None, None, Handle, Handle, Writes::Block},
     {"TranslateSettings", Call<Zentara_TranslateSettings>, 0, 0, NoKeys, No, No, No, No, No, No, No,
      No},
     {"PreflightSettings", Call<Zentara_PreflightSettings>, 0, 0, NoKeys, Handle, Handle, Parameter,
-     None, None, Settings, Handle, Handle},
+     None, None, Settings, Handle, Handle, Writes::Block},
     {"SendSettingsToCam", Call<Zentara_SendSettingsToCam>, 0, 0, NoKeys, Handle, Handle, Settings,
-     None, None, Settings, Handle, Handle},
+     None, None, Settings, Handle, Handle, Writes::Block},
 
     {"GetParam", Call<Zentara_GetParam>, 15, 18, 47, Parameter, Settings, Parameter, Parameter,
      None, Settings, Settings, None},
@@ -148,11 +157,11 @@ constexpr Row Rows[] = {
     {"GetParam64Max", Call<Zentara_GetParam64Max>, 0, 3, 4, Parameter, Settings, Parameter,
      Parameter, None, Settings, Settings, None},
     {"SetParam", Call<Zentara_SetParam>, 15, 18, 47, Parameter, Settings, Parameter, None, None,
-     Settings, Settings, None},
+     Settings, Settings, None, Writes::Block},
     {"SetParamS32", Call<Zentara_SetParamS32>, 1, 2, 3, Parameter, Settings, Parameter, None, None,
-     Settings, Settings, None},
+     Settings, Settings, None, Writes::Block},
     {"SetParam64", Call<Zentara_SetParam64>, 0, 3, 4, Parameter, Settings, Parameter, None, None,
-     Settings, Settings, None},
+     Settings, Settings, None, Writes::Block},
 
     {"IsParamSupported", Call<Zentara_IsParamSupported>, 15, 18, 47, Handle, Handle, None, None,
      None, None, Handle, Handle},
@@ -172,11 +181,11 @@ constexpr Row Rows[] = {
     {"IsSparseTableS32", Call<Zentara_IsSparseTableS32>, 1, 2, 3, No, No, No, No, No, No, No, No},
     {"IsSparseTable64", Call<Zentara_IsSparseTable64>, 0, 3, 4, No, No, No, No, No, No, No, No},
     {"GetParamSparseTable", Call<Zentara_GetParamSparseTable>, 12, 18, 47, Parameter, Settings,
-     Parameter, Parameter, Parameter, Settings, Settings, None},
+     Parameter, Parameter, Parameter, Settings, Settings, None, Writes::ListSize},
     {"GetParamSparseTableS32", Call<Zentara_GetParamSparseTableS32>, 1, 2, 3, No, No, No, No, No,
-     No, No, No, true},
+     No, No, No, Writes::SizeOfZero},
     {"GetParamSparseTable64", Call<Zentara_GetParamSparseTable64>, 0, 3, 4, No, No, No, No, No, No,
-     No, No, true},
+     No, No, Writes::SizeOfZero},
 
     {"GetInfo", Call<Zentara_GetInfo>, 5, 17, NoKeys, Handle, Handle, None, Parameter, None, None,
      Handle, Handle},
@@ -185,6 +194,12 @@ constexpr Row Rows[] = {
     {"GetCameraModelString", Call<Zentara_GetCameraModelString>, 0, 0, NoKeys, Handle, Handle, None,
      Parameter, None, None, Handle, Handle},
 };
+
+const Row& GetListRow() {
+    return *std::find_if(std::begin(Rows), std::end(Rows), [](const Row& candidate) {
+        return candidate.call == Call<Zentara_GetParamSparseTable>;
+    });
+}
 
 /// One call with good arguments that a test spoils before it is made.
 class GuardedCall {
@@ -211,7 +226,8 @@ class GuardedCall {
         return block.AreGuardsIntact() && out.AreGuardsIntact() && size.AreGuardsIntact();
     }
 
-    /// A refusal touches nothing; `size` may become 0 where the function says so.
+    /// A refusal touches nothing, nor does a success touch what the row does not say; `size` may
+    /// become 0 where the function says so.
     void Expect(ZentaraResult expected, const std::string& circumstance) {
         const Zentara_Settings before = GetBlock();
         const std::int32_t sizeBefore = GetSize();
@@ -219,11 +235,17 @@ class GuardedCall {
         EXPECT_ZERR(expected, row.call(given)) << row.name << ": " << circumstance;
 
         EXPECT_TRUE(AreGuardsIntact()) << row.name << ": " << circumstance;
-        if (expected == zerrNone) return;
-        EXPECT_TRUE(AreSameBytes(before, GetBlock())) << row.name << ": " << circumstance;
-        EXPECT_TRUE(out.IsUntouched()) << row.name << ": " << circumstance;
-        const bool isWritten = row.writesSize && given.size != nullptr && expected != zerrNotLoaded;
-        EXPECT_EQ(isWritten ? 0 : sizeBefore, GetSize()) << row.name << ": " << circumstance;
+        const bool succeeds = expected == zerrNone;
+        if (!succeeds || row.writes != Writes::Block) {
+            EXPECT_TRUE(AreSameBytes(before, GetBlock())) << row.name << ": " << circumstance;
+        }
+        if (!succeeds) {
+            EXPECT_TRUE(out.IsUntouched()) << row.name << ": " << circumstance;
+        }
+        if (succeeds && row.writes == Writes::ListSize) return;
+        const bool isZeroed =
+            row.writes == Writes::SizeOfZero && given.size != nullptr && expected != zerrNotLoaded;
+        EXPECT_EQ(isZeroed ? 0 : sizeBefore, GetSize()) << row.name << ": " << circumstance;
     }
 
   private:
@@ -315,6 +337,26 @@ TEST_F(SettingsBadInput, AWrongMagicNumberIsRefusedWhereItIsTested) {
                 [](GuardedCall& call) { call.GetBlock().privateWords[SettingsMagicWord] ^= 1; });
 }
 
+// Two faults at once: the one that is tested first is told.
+TEST_F(SettingsBadInput, ANullOutPointerIsToldBeforeAWrongMagicNumber) {
+    for (const Row& row : Rows) {
+        GuardedCall call(row, block);
+        call.given.out = nullptr;
+        call.GetBlock().privateWords[SettingsMagicWord] = 0;
+        call.Expect(row.nullOut != None ? row.nullOut : row.wrongMagic, "null out, wrong magic");
+    }
+}
+
+TEST_F(SettingsBadInput, AWrongMagicNumberIsToldBeforeAKeyBeyondTheFamilysLimit) {
+    for (const Row& row : Rows) {
+        if (row.keyCount == NoKeys) continue;
+        GuardedCall call(row, block);
+        call.given.key = row.keyCount;
+        call.GetBlock().privateWords[SettingsMagicWord] = 0;
+        call.Expect(row.wrongMagic != None ? row.wrongMagic : No, "wrong magic, key beyond");
+    }
+}
+
 // The size is written and never compared.
 TEST_F(SettingsBadInput, ASizeOfTheBlockThatIsWrongIsNoFault) {
     for (const std::uint32_t size : {0u, 1u, 0xFFFFFFFFu}) {
@@ -358,12 +400,34 @@ TEST_F(SettingsBadInput, AnInformationKeyWithoutAnAnswerSetsTheValueToZeroAndNot
     (void)testing::internal::GetCapturedStdout();
 }
 
+TEST_F(SettingsBadInput, ABlockOrTableThatIsWrongIsToldBeforeARoomOfZeroOrLess) {
+    for (const std::int32_t size : {0, -1}) {
+        GuardedCall noBlock(GetListRow(), block);
+        noBlock.SetSize(size);
+        noBlock.given.block = nullptr;
+        noBlock.Expect(Parameter, "null block, size " + std::to_string(size));
+
+        GuardedCall noTable(GetListRow(), block);
+        noTable.SetSize(size);
+        noTable.given.out = nullptr;
+        noTable.Expect(Parameter, "null table, size " + std::to_string(size));
+
+        GuardedCall noMagic(GetListRow(), block);
+        noMagic.SetSize(size);
+        noMagic.GetBlock().privateWords[SettingsMagicWord] = 0;
+        noMagic.Expect(Settings, "wrong magic, size " + std::to_string(size));
+    }
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    for (const std::int32_t size : {0, -1}) {
+        GuardedCall closed(GetListRow(), block);
+        closed.SetSize(size);
+        closed.Expect(Settings, "closed, size " + std::to_string(size));
+    }
+}
+
 TEST_F(SettingsBadInput, ARoomForAListOfZeroOrLessIsAnsweredWithoutAnEntry) {
-    const Row& row = *std::find_if(std::begin(Rows), std::end(Rows), [](const Row& candidate) {
-        return std::string(candidate.name) == "GetParamSparseTable";
-    });
     for (const std::int32_t size : {0, -1, INT32_MIN}) {
-        GuardedCall call(row, block);
+        GuardedCall call(GetListRow(), block);
         call.SetSize(size);
         call.Expect(size == 0 ? None : No, "size " + std::to_string(size));
         EXPECT_TRUE(call.IsOutUntouched()) << size;
