@@ -1,7 +1,11 @@
 #include "hal/platform/debug_output.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
+#include <cstdlib>
 #include <string>
 
 #include "support/scoped_variable.h"
@@ -65,6 +69,68 @@ TEST(DebuggerOutput, IsSilentWhenItsFileCannotBeWritten) {
     const ScopedVariable file(Variable, folder.GetPath("missing/file").c_str());
 
     EXPECT_EQ(CaptureStandardError("text"), "");
+}
+
+/// A named pipe that the variable names.
+class DebuggerPipe : public testing::Test {
+  protected:
+    DebuggerPipe() { isMade = mkfifo(path.c_str(), 0600) == 0; }
+
+    bool isMade = false;
+    TemporaryFolder folder;
+    std::string path = folder.GetPath("pipe");
+    ScopedVariable variable{Variable, path.c_str()};
+};
+
+TEST_F(DebuggerPipe, IsNotWaitedForWhileNobodyReads) {
+    ASSERT_TRUE(isMade);
+
+    EXPECT_EXIT(
+        {
+            alarm(60);
+            WriteDebuggerOutput("text");
+            std::_Exit(0);
+        },
+        testing::ExitedWithCode(0), "");
+}
+
+TEST_F(DebuggerPipe, IsGivenItsTextsAndNotWaitedForWhenItIsFull) {
+    constexpr int Calls = 200;
+    ASSERT_TRUE(isMade);
+    const int reader = open(path.c_str(), O_RDONLY | O_NONBLOCK);
+    ASSERT_LE(0, reader);
+    const std::string text(1000, 'a');
+
+    EXPECT_EXIT(
+        {
+            alarm(60);
+            for (int i = 0; i < Calls; ++i) WriteDebuggerOutput(text.c_str());
+            std::_Exit(0);
+        },
+        testing::ExitedWithCode(0), "");
+
+    std::string piece(text.size(), '\0');
+    EXPECT_EQ(static_cast<ssize_t>(text.size()), read(reader, piece.data(), piece.size()));
+    EXPECT_EQ(text, piece);
+    close(reader);
+}
+
+void CutStandardErrorOff() {
+    int ends[2] = {-1, -1};
+    if (pipe(ends) != 0 || dup2(ends[1], STDERR_FILENO) < 0) std::_Exit(1);
+    close(ends[0]);
+}
+
+TEST(DebuggerOutput, LetsTheProcessLiveWhenTheReaderOfStandardErrorIsGone) {
+    const ScopedVariable one(Variable, "1");
+
+    EXPECT_EXIT(
+        {
+            CutStandardErrorOff();
+            WriteDebuggerOutput("text");
+            std::_Exit(0);
+        },
+        testing::ExitedWithCode(0), "");
 }
 
 TEST(DebuggerOutput, IsOnePieceForEachCallOfTwoThreads) {

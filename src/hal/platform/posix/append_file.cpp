@@ -6,6 +6,9 @@
 #include <cerrno>
 #include <new>
 
+#include "hal/platform/posix/quiet_write.h"
+#include "hal/platform/posix/regular_file.h"
+
 namespace ZV {
 
 struct AppendFile {
@@ -14,7 +17,7 @@ struct AppendFile {
 
 AppendFile* OpenAppendFile(const char* path) {
     const int savedError = errno;
-    const int descriptor = open(path, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC | O_NOCTTY, 0644);
+    const int descriptor = OpenRegularFile(path, O_WRONLY | O_CREAT | O_APPEND);
     auto* const file = descriptor >= 0 ? new (std::nothrow) AppendFile{descriptor} : nullptr;
     if (file == nullptr && descriptor >= 0) close(descriptor);
     errno = savedError;
@@ -23,8 +26,7 @@ AppendFile* OpenAppendFile(const char* path) {
 
 void AppendToFile(AppendFile* file, const void* bytes, std::size_t count) {
     const int savedError = errno;
-    while (write(file->descriptor, bytes, count) < 0 && errno == EINTR) {
-    }
+    WriteQuietly(file->descriptor, bytes, count);
     errno = savedError;
 }
 

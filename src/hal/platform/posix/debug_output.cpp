@@ -7,14 +7,14 @@
 #include <cstring>
 
 #include "hal/platform/environment.h"
+#include "hal/platform/posix/quiet_write.h"
 
 namespace ZV {
 namespace {
 
-void WriteOnce(int file, const char* text) {
-    const std::size_t bytes = std::strlen(text);
-    while (write(file, text, bytes) < 0 && errno == EINTR) {
-    }
+/// A terminal and a named pipe are as good as a file, but none is waited for.
+int OpenTarget(const char* path) {
+    return open(path, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC | O_NONBLOCK | O_NOCTTY, 0644);
 }
 
 }  // namespace
@@ -24,10 +24,9 @@ void WriteDebuggerOutput(const char* text) {
     if (target == nullptr || target[0] == '\0' || text == nullptr) return;
     const int savedError = errno;
     if (std::strcmp(target, "1") == 0) {
-        WriteOnce(STDERR_FILENO, text);
-    } else if (const int file = open(target, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0644);
-               file >= 0) {
-        WriteOnce(file, text);
+        WriteQuietly(STDERR_FILENO, text, std::strlen(text));
+    } else if (const int file = OpenTarget(target); file >= 0) {
+        WriteQuietly(file, text, std::strlen(text));
         close(file);
     }
     errno = savedError;

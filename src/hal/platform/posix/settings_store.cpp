@@ -1,7 +1,6 @@
 #include "hal/platform/settings_store.h"
 
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -14,6 +13,7 @@
 
 #include "hal/platform/environment.h"
 #include "hal/platform/last_error.h"
+#include "hal/platform/posix/regular_file.h"
 #include "hal/platform/posix/system_error.h"
 
 namespace ZV {
@@ -32,20 +32,6 @@ std::string_view Trim(std::string_view text) {
 const char* GetStorePath() {
     const char* path = GetLibraryVariable("ZENTARA_CONFIG");
     return path != nullptr && path[0] != '\0' ? path : DefaultPath;
-}
-
-/// Opens a regular file; anything else could block.
-int OpenRegularFile(const char* path) {
-    const int file = open(path, O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
-    if (file < 0) {
-        SetLastPlatformErrorFromErrno(errno);
-        return -1;
-    }
-    struct stat status {};
-    if (fstat(file, &status) == 0 && S_ISREG(status.st_mode)) return file;
-    SetLastPlatformError(PlatformErrorAccessDenied);
-    close(file);
-    return -1;
 }
 
 std::size_t ReadWhole(int file, char* content, std::size_t capacity) {
@@ -99,8 +85,11 @@ bool ParseNumber(std::string_view text, std::uint32_t* number) {
 }  // namespace
 
 SettingsStore* OpenSettingsStore() {
-    const int file = OpenRegularFile(GetStorePath());
-    if (file < 0) return nullptr;
+    const int file = OpenRegularFile(GetStorePath(), O_RDONLY);
+    if (file < 0) {
+        SetLastPlatformErrorFromErrno(errno);
+        return nullptr;
+    }
     auto* store = new (std::nothrow) SettingsStore;
     if (store == nullptr) {
         SetLastPlatformError(PlatformErrorNotEnoughMemory);
