@@ -1,5 +1,6 @@
 #include "hal/platform/console.h"
 
+#include <io.h>
 #include <windows.h>
 
 #include <cstdio>
@@ -9,12 +10,22 @@ namespace {
 
 constexpr WORD GreyOnBlack = 7;
 
-/// Whether the standard output goes to something that is no console: a file, a pipe, another
-/// device.
+/// Whether an output goes to something that is no console: a file, a pipe, another device.
 bool IsRedirected(HANDLE output) {
     if (output == nullptr || output == INVALID_HANDLE_VALUE) return false;
     DWORD mode = 0;
     return GetFileType(output) != FILE_TYPE_UNKNOWN && !GetConsoleMode(output, &mode);
+}
+
+/// What the stream of the C library writes to, which a host may have changed without the process's
+/// own handle. Null for a stream that is closed.
+HANDLE GetStreamHandle() {
+    const int descriptor = _fileno(stdout);
+    return descriptor >= 0 ? reinterpret_cast<HANDLE>(_get_osfhandle(descriptor)) : nullptr;
+}
+
+bool IsOutputRedirected() {
+    return IsRedirected(GetStdHandle(STD_OUTPUT_HANDLE)) || IsRedirected(GetStreamHandle());
 }
 
 bool HasConsole() {
@@ -30,7 +41,7 @@ bool HasConsole() {
 
 void PrepareLogConsole(const char* title) {
     if (!HasConsole()) return;
-    if (!IsRedirected(GetStdHandle(STD_OUTPUT_HANDLE))) {
+    if (!IsOutputRedirected()) {
         // A refusal is ignored: the log goes elsewhere.
         (void)std::freopen("CONOUT$", "wt", stdout);
     }
