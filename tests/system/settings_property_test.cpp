@@ -7,6 +7,7 @@
 #include "camera/camera.h"
 #include "support/flat_camera.h"
 #include "support/random_blocks.h"
+#include "support/rounds.h"
 #include "support/sending_camera.h"
 #include "support/settings_words.h"
 
@@ -14,7 +15,7 @@
 namespace ZV::Test {
 namespace {
 
-constexpr int Rounds = 200;
+constexpr int Rounds = CountRounds(200);
 
 struct PropertyCase {
     const char* name;

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "support/random_blocks.h"
+#include "support/rounds.h"
 #include "support/sending_camera.h"
 
 // The registers that a send writes, in their order, against a list that is calculated from the
@@ -43,7 +44,7 @@ TraceCase MakeControlCase(const char* name, const char* className, const std::st
     return MakeCase(name, className, R"({"versions": {"control": ")" + version + R"("}})");
 }
 
-constexpr int Rounds = 24;
+constexpr int Rounds = CountRounds(24);
 
 class SettingsTrace : public testing::TestWithParam<TraceCase> {
   protected:
