@@ -3,80 +3,25 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
-#include <cstdlib>
-#include <cstring>
-#include <future>
 #include <mutex>
 #include <thread>
 #include <vector>
 
 #include "api/camera_context.h"
-#include "api/entry_queue.h"
-#include "api/handles.h"
+#include "api/delivery_fixture.h"
 #include "api/settings_block.h"
 #include "diagnostics/log.h"
-#include "imaging/ex_image.h"
 #include "imaging/image_filter.h"
-#include "support/flat_camera.h"
-
-// The camera is open and does not stream: the tests call what its engine calls, one event at a
-// time.
 
 namespace ZV {
 namespace {
 
 using Test::CallbackLog;
 using Test::ClientFrame;
+using Test::Delivery;
 using Test::WaitUntil;
 
-constexpr std::uint32_t Width = 64;
-constexpr std::uint32_t Height = 48;
-constexpr std::uint32_t ImageBytes = Width * Height;
-
-class Delivery : public Test::OpenedCamera {
-  protected:
-    ZCamera& GetCamera() { return *FindCamera(handle); }
-    CameraContext& GetContext() { return *GetCameraContext(GetCamera()); }
-    std::uint32_t CountQueued() { return GetQueueCount(GetContext()); }
-
-    static ZExImage* MakeImage(std::uint16_t errorCode = 0) {
-        auto* const pixels = static_cast<std::uint8_t*>(std::malloc(ImageBytes));
-        std::memset(pixels, 0x42, ImageBytes);
-        return new ZExImage(pixels, ImageBytes, Width, Height, 8, 1000, 1.0, Mono8, CameraMono,
-                            PatternRed, 0, false, 5, 0, 1, false, 17, errorCode, nullptr, true);
-    }
-    void ReceiveImage(ZExImage* image, std::uint16_t status = 0) {
-        ZImageReceivedCallbackStruct record{image, &GetCamera(), status};
-        EXPECT_EQ(nullptr, ImageReceived(&record));
-    }
-    void ReceiveImage() { ReceiveImage(MakeImage()); }
-    void EndExposure() { EXPECT_EQ(nullptr, ExposeDone(&GetCamera())); }
-
-    /// A change behind at least one frame.
-    void QueueSettings(std::uint32_t flags = zcbFrameDone, std::uint32_t userData = 100) {
-        ASSERT_GT(CountQueued(), 0u);
-        ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, &settings, CallbackLog::Record, flags,
-                                                    calls.GetPrivate(), userData));
-    }
-    void QueueFrame(std::uint32_t flags, std::uint32_t userData = 0) {
-        ASSERT_ZERR(zerrNone, Queue(frame, calls, flags, userData));
-    }
-
-    void SetUp() override {
-        OpenedCamera::SetUp();
-        settings = ReadSettings();
-        SetLastSettings(GetContext(), formerSettings);
-    }
-
-    const Zentara_Settings formerSettings = [] {
-        Zentara_Settings unknown;
-        std::memset(&unknown, 0xCD, sizeof(unknown));
-        return unknown;
-    }();
-    Zentara_Settings settings{};
-    ClientFrame frame{ImageBytes};
-    CallbackLog calls;
-};
+constexpr std::uint32_t ImageBytes = Delivery::ImageBytes;
 
 TEST_F(Delivery, AFrameWithFlagsTwoGetsAnExposureCallbackAndNoFrameCallback) {
     QueueFrame(zcbExposeDone, 9);
@@ -302,6 +247,31 @@ TEST_F(Delivery, ASettingsChangeFollowedByAFrameIsAppliedBehindTheDeliveredFrame
     EXPECT_EQ(100u, heard[1].userData);
     EXPECT_ZERR(zerrNone, heard[1].errorCode);
     EXPECT_EQ(1u, CountQueued());
+}
+
+// Kept: the change at the head goes with the image, the one behind it is made.
+TEST_F(Delivery, OfTwoChangesAtTheHeadOneIsDroppedWithTheImageAndTheOtherIsSent) {
+    constexpr std::uint32_t Dropped = 100, Sent = 101;
+    ClientFrame second(ImageBytes);
+    Zentara_Settings latest = settings;
+    SetSettingsWide(settings, zprm64Exposure, 20000000);
+    SetSettingsWide(latest, zprm64Exposure, 30000000);
+    QueueFrame(0);
+    QueueSettings(zcbFrameDone, Dropped);
+    ReceiveImage();
+    ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, &latest, CallbackLog::Record, zcbFrameDone,
+                                                calls.GetPrivate(), Sent));
+    ASSERT_ZERR(zerrNone, Queue(second, calls, zcbFrameDone, 2));
+
+    ReceiveImage();
+
+    ASSERT_EQ(1u, calls.CountCalls());
+    EXPECT_EQ(Sent, calls.GetCalls()[0].userData);
+    EXPECT_EQ(30000000u, GetCamera().GetExposure());
+    EXPECT_EQ(0u, second->privateFilled) << "the image was for nobody";
+    EXPECT_EQ(1u, CountQueued());
+    ReceiveImage();
+    EXPECT_EQ(1u, second->privateFilled);
 }
 
 /// A client whose frame callback lasts until the test lets it go on.

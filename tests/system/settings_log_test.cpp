@@ -1,63 +1,17 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <regex>
 #include <string>
 #include <vector>
 
 #include "simulation/register_file.h"
 #include "support/flat_camera.h"
-#include "support/scoped_variable.h"
+#include "support/log_file.h"
 #include "support/settings_words.h"
-#include "support/temporary_folder.h"
 
 // What preflighting and sending say in the log, nested calls shown.
 namespace ZV::Test {
 namespace {
-
-class LogFile {
-  protected:
-    /// Texts of the messages of `function` since the last call.
-    std::vector<std::string> TakeMessages(const std::string& function) {
-        const std::regex message(R"(\d\d:\d\d\.\d{3} )" + function + " - ([^\\n]*)");
-        std::vector<std::string> texts;
-        for (const std::string& record : TakeRecords()) {
-            std::smatch match;
-            if (std::regex_match(record, match, message)) texts.push_back(match[1]);
-        }
-        return texts;
-    }
-    /// The records without their times.
-    std::vector<std::string> TakeTexts() {
-        std::vector<std::string> texts = TakeRecords();
-        for (std::string& text : texts) {
-            text = std::regex_replace(text, std::regex(R"(^\s*\d\d:\d\d\.\d{3} )"), "");
-        }
-        return texts;
-    }
-
-  private:
-    std::vector<std::string> TakeRecords() {
-        const std::string content = folder.ReadFile("log.txt");
-        std::vector<std::string> records;
-        while (taken < content.size()) {
-            const std::size_t end = content.find('\0', taken);
-            records.push_back(content.substr(taken, end - taken));
-            taken = end == std::string::npos ? content.size() : end + 1;
-        }
-        return records;
-    }
-
-    TemporaryFolder folder;
-    std::size_t taken = 0;
-    ScopedVariable config{"ZENTARA_CONFIG",
-                          folder
-                              .WriteFile("zentara.conf",
-                                         "outputEnabled = 1\noutputToFile = 1\noutputSettings = 1\n"
-                                         "outputNestedCalls = 1\noutputFilePath = " +
-                                             folder.GetPath("log.txt") + "\n")
-                              .c_str()};
-};
 
 class SettingsLog : protected LogFile, public OpenedCamera {
   protected:
