@@ -21,7 +21,9 @@ using Test::CallbackLog;
 using Test::ClientFrame;
 using Test::GetWord;
 using Test::MakeFilledBlock;
+using Test::SettingsMagicWord;
 using Test::SetWord;
+using Test::WaitUntil;
 
 class SendRecord : public Test::OpenedCamera {
   protected:
@@ -41,6 +43,9 @@ class SendRecord : public Test::OpenedCamera {
             R"({"kind": "failRequest", "code": "FW_IOCTL_ASYNC_WRITE", "address": )" +
             std::to_string(Simulation::ControlAddress + 4 * 11) + "}"));
         ASSERT_ZERR(zerrDriverFault, Send());
+    }
+    ZentaraResult QueueChange(Zentara_Settings* change) {
+        return Zentara_QueueSettings(handle, change, nullptr, 0, 0, 0);
     }
     void EndExposure() { EXPECT_EQ(nullptr, ExposeDone(FindCamera(handle))); }
     void ReceiveImage() {
@@ -88,17 +93,23 @@ TEST_F(SendRecord, ASendThatFailsStaysInProgressAndLeavesTheFormerBlock) {
 }
 
 // Kept: an exposure that ends then goes on without the queue's lock, which somebody else may hold.
-TEST_F(SendRecord, AfterAFailedSendAnExposureEndsWithoutTheQueuesLock) {
+TEST_F(SendRecord, AFailingTriggerLeavesTheRegionAppliedAndExposuresEndWithoutTheQueuesLock) {
     ClientFrame frame(GetImageBytes());
     ASSERT_ZERR(zerrNone, Queue(frame, calls, zcbExposeDone));
     FailToSend();
+    EXPECT_EQ(2u, FindCamera(handle)->GetROIX());
+    EXPECT_EQ(62u, FindCamera(handle)->GetROIWidth());
+    EXPECT_EQ(0u, PeekTrigger());
     GetContext().queueLock->Wait();
 
-    EndExposure();
+    auto exposure = std::async(std::launch::async, [&] { EndExposure(); });
+    EXPECT_EQ(std::future_status::ready, exposure.wait_for(std::chrono::seconds(10)));
 
     GetContext().queueLock->Signal();
+    exposure.get();
     EXPECT_EQ(1u, calls.CountCalls());
-    EXPECT_ZERR(zerrNone, Queue(frame, calls, 0)) << "the lock has one unit";
+    EXPECT_ZERR(zerrNone, Send()) << "the lock has one unit";
+    EXPECT_EQ(0, GetContext().sendInProgress);
 }
 
 TEST_F(SendRecord, AfterAGoodSendAnExposureWaitsForTheQueuesLock) {
@@ -171,6 +182,77 @@ TEST_F(SendRecord, AChangeThatTheCameraRefusesTellsItsCallback) {
     EXPECT_EQ(7u, heard[0].userData);
     EXPECT_EQ(1, GetContext().sendInProgress);
 }
+
+TEST_F(SendRecord, AChangeBehindADeliveredFrameThatTheCameraRefusesTellsItsCallback) {
+    ClientFrame frame(GetImageBytes()), second(GetImageBytes());
+    Zentara_Settings change = ReadSettings();
+    SetWord(change, zprmBinning, 5);
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, zcbFrameDone, 1));
+    ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, &change, CallbackLog::Record, 0xF1,
+                                                calls.GetPrivate(), 7));
+    ASSERT_ZERR(zerrNone, Queue(second, calls, zcbFrameDone, 2));
+
+    ReceiveImage();
+
+    const auto heard = calls.GetCalls();
+    ASSERT_EQ(2u, heard.size());
+    EXPECT_EQ(1u, heard[0].userData);
+    EXPECT_ZERR(zerrNone, heard[0].errorCode);
+    EXPECT_EQ(7u, heard[1].userData);
+    EXPECT_ZERR(zerrDriverFault, heard[1].errorCode);
+    EXPECT_EQ(0xF1u, heard[1].flags);
+    EXPECT_EQ(1u, GetQueueCount(GetContext()));
+    EXPECT_EQ(1, GetContext().sendInProgress);
+}
+
+// ---- What queueing a change makes of an abort ----
+
+TEST_F(SendRecord, AChangeAtOnceEndsTheAbortWhetherItSucceedsOrFails) {
+    Zentara_Settings change = ReadSettings();
+    for (const std::uint32_t binning : {1u, 5u}) {
+        SetWord(change, zprmBinning, binning);
+        ASSERT_ZERR(zerrNone, Zentara_Abort(handle));
+        ASSERT_EQ(1, GetContext().abortRequested);
+
+        EXPECT_ZERR(binning == 1 ? zerrNone : zerrDriverFault, QueueChange(&change));
+
+        EXPECT_EQ(0, GetContext().abortRequested) << "binning " << binning;
+    }
+}
+
+TEST_F(SendRecord, AChangeBehindAFrameEndsTheAbort) {
+    ClientFrame frame(GetImageBytes());
+    Zentara_Settings change = ReadSettings();
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, 0));
+    GetContext().abortRequested = 1;
+
+    EXPECT_ZERR(zerrNone, QueueChange(&change));
+
+    EXPECT_EQ(0, GetContext().abortRequested);
+}
+
+TEST_F(SendRecord, ARefusedChangeLeavesTheAbort) {
+    Zentara_Settings change = ReadSettings();
+    Zentara_Settings moved = change, wrongMagic = change;
+    SetWord(moved, zprmRoiX, 2);
+    wrongMagic.privateWords[SettingsMagicWord] ^= 1;
+    ASSERT_ZERR(zerrNone, Zentara_Abort(handle));
+
+    EXPECT_ZERR(zerrBadSettings, QueueChange(nullptr));
+    EXPECT_ZERR(zerrBadSettings, QueueChange(&wrongMagic));
+    EXPECT_ZERR(zerrBadSettings, QueueChange(&moved));
+    EXPECT_EQ(1, GetContext().abortRequested);
+
+    ClientFrame frame(GetImageBytes());
+    for (std::uint32_t i = 0; i < QueueCapacity; ++i) {
+        ASSERT_ZERR(zerrNone, Queue(frame, calls, 0));
+    }
+    GetContext().abortRequested = 1;
+    EXPECT_ZERR(zerrQueueFull, QueueChange(&change));
+    EXPECT_EQ(1, GetContext().abortRequested);
+}
+
+// ---- What the settings leave in the record ----
 
 TEST_F(SendRecord, PostProcessingIsOneForAnyWordButZero) {
     for (const std::uint32_t word : {1u, 7u, 256u, 0xFFFFFFFFu}) {
@@ -254,6 +336,41 @@ TEST_F(SendRecord, APreflightLeavesTheRecordAlone) {
 
     EXPECT_TRUE(AreSameBytes(last, GetLastSettings(GetContext())));
     EXPECT_EQ(0, GetContext().sendInProgress);
+}
+
+TEST_F(SendRecord, ASendWaitsForTheQueuesLock) {
+    SetWord(block, zprmTriggerType, 3);
+    const std::size_t before = world.ReadRegisterWrites().size();
+    GetContext().queueLock->Wait();
+
+    auto client = std::async(std::launch::async, [&] { return Send(); });
+    EXPECT_EQ(std::future_status::timeout, client.wait_for(std::chrono::milliseconds(50)));
+    EXPECT_EQ(before, world.ReadRegisterWrites().size());
+    EXPECT_EQ(0, GetContext().sendInProgress);
+
+    GetContext().queueLock->Signal();
+    EXPECT_ZERR(zerrNone, client.get());
+    EXPECT_EQ(3u, PeekTrigger());
+}
+
+// A camera that does not answer holds the send in its middle.
+TEST_F(SendRecord, AClientThatQueuesWaitsForTheEndOfASend) {
+    SetWord(block, zprmTriggerType, 3);
+    ClientFrame frame(GetImageBytes());
+    ASSERT_TRUE(
+        world.AddFault(R"({"kind": "neverComplete", "code": "FW_IOCTL_ASYNC_WRITE", "address": )" +
+                       std::to_string(Simulation::ControlAddress + 4 * 11) + "}"));
+    const auto pended = world.GetState().pendedRequests;
+
+    auto sending = std::async(std::launch::async, [&] { return Send(); });
+    EXPECT_TRUE(WaitUntil([&] { return world.GetState().pendedRequests > pended; }));
+    auto queueing = std::async(std::launch::async, [&] { return Queue(frame, calls, 0); });
+    EXPECT_EQ(std::future_status::timeout, queueing.wait_for(std::chrono::milliseconds(50)));
+    EXPECT_EQ(1, GetContext().sendInProgress);
+
+    EXPECT_TRUE(world.Unplug());
+    EXPECT_ZERR(zerrDriverFault, sending.get());
+    EXPECT_ZERR(zerrNone, queueing.get());
 }
 
 TEST_F(SendRecord, SendsOfSeveralThreadsComeOneAfterTheOther) {
