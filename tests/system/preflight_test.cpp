@@ -338,6 +338,22 @@ TEST_F(FolaryPreflight, LeavingTheModeTakesTheLimitsOfTheStandardModeAndLeavesIt
     EXPECT_LT(before, world.ReadRegisterWrites().size());
 }
 
+// Kept: a preflight alone commits nothing, and so nothing starts the stream again.
+TEST_F(FolaryPreflight, LeavingTheModeForAMomentStopsAStreamWhichOnlyASendStartsAgain) {
+    ASSERT_EQ(CameraOk, GetCamera().SetRTVMode(true));
+    ASSERT_EQ(CameraOk, GetCamera().UpdateSettingsOnCamera());
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    SetWord(block, zprmCameraMode, 0);
+
+    ASSERT_ZERR(zerrNone, Zentara_PreflightSettings(handle, &block));
+
+    EXPECT_FALSE(GetCamera().IsCameraStreaming());
+    EXPECT_EQ(0u, world.GetState().isStreaming);
+    EXPECT_TRUE(GetCamera().GetRTVMode());
+    ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(handle, &block));
+    EXPECT_TRUE(GetCamera().IsCameraStreaming());
+}
+
 // Kept: the vertical limit then goes by the camera's binning, the horizontal one by the block's.
 TEST_F(FolaryPreflight, LeavingTheModeTakesTheCamerasBinningForTheHeightAlone) {
     ASSERT_EQ(CameraOk, GetCamera().SetRTVMode(true));

@@ -269,7 +269,10 @@ TEST_F(Queueing, ASizeOfZeroAndTheRightMagicNumberAreAccepted) {
 }
 
 TEST_F(Queueing, AChangedRegionOrSpeedIsRefusedAndNothingIsQueued) {
+    constexpr int Capacity = 100;
     CallbackLog calls;
+    ClientFrame frame(GetImageBytes());
+    ASSERT_ZERR(zerrNone, Queue(frame, calls, 0));
     const Zentara_Settings settings = ReadSettings();
     for (const std::uint32_t key :
          {zprmRoiX, zprmRoiY, zprmRoiWidth, zprmRoiHeight, zprmReadoutSpeed}) {
@@ -281,9 +284,10 @@ TEST_F(Queueing, AChangedRegionOrSpeedIsRefusedAndNothingIsQueued) {
             << key;
     }
 
+    for (int i = 1; i < Capacity; ++i) ASSERT_ZERR(zerrNone, Queue(frame, calls, 0)) << i;
+    EXPECT_ZERR(zerrQueueFull, Queue(frame, calls, 0)) << "one frame and nothing else was queued";
+    EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
     EXPECT_EQ(0u, calls.CountCalls());
-    ClientFrame frame(GetImageBytes());
-    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get())) << "something was queued";
 }
 
 TEST_F(Queueing, ChangedBinningIsNotCompared) {

@@ -150,6 +150,22 @@ TEST_F(SettingsSend, AFailedCommitIsIgnored) {
     EXPECT_FALSE(WasCommitted()) << "the block counts as sent";
 }
 
+// The block is the last one sent; it is the camera's region that had changed meanwhile.
+TEST_F(SettingsSend, AStreamThatASetterStopsGoesOnEvenWhereTheBlockIsTheLastOne) {
+    Zentara_Settings block = ReadDefaults();
+    ASSERT_ZERR(zerrNone, Send(block));
+    ASSERT_ZERR(zerrNone, Send(block));
+    ASSERT_FALSE(WasCommitted()) << "nothing to change";
+    ASSERT_EQ(CameraOk, GetCamera().SetROI(0, 0, 32, 24));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+
+    EXPECT_ZERR(zerrNone, Send(block));
+
+    EXPECT_TRUE(WasCommitted());
+    EXPECT_TRUE(GetCamera().IsCameraStreaming());
+    EXPECT_EQ(64u, GetCamera().GetROIWidth());
+}
+
 TEST_F(SettingsSend, ReadingMakesTheNextSendOfTheSameBlockNoChange) {
     Zentara_Settings block = ReadDefaults();
     ASSERT_ZERR(zerrNone, Send(block));
