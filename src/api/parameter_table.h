@@ -38,6 +38,7 @@ enum class LogForm {
     Number,        ///< "Gain: 7"
     WithUnit,      ///< "Trigger Delay: 500 ns", by the row's unit.
     Named,         ///< "SyncB: 1 (Expose)", by the row's value names.
+    ImageFormat,   ///< "Image Format: 2 (Mono 8-Bit)", by the labels of the formats.
     Microseconds,  ///< "Exposure: 1500 us (1.5 ms)"
     Nanoseconds,   ///< "Exposure (64-bit): 1500000 ns (1.5 ms)"
     Celsius,       ///< "Regulated Cooling Temp: -10 C"

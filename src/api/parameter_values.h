@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "api/parameter_table.h"
+#include "imaging/image_format_labels.h"
 #include "zentara/zentara.h"
 
 namespace ZV {
@@ -32,21 +33,14 @@ inline constexpr std::array WheelNames{
     ValueName{zwheelBlack, "Black"},
     ValueName{zwheelBlue, "Blue"},
 };
-inline constexpr std::array FormatNames{
-    ValueName{zfmtRaw8, "Raw 8-Bit"},
-    ValueName{zfmtRaw16, "Raw 16-Bit"},
-    ValueName{zfmtMono8, "Mono 8-Bit"},
-    ValueName{zfmtMono16, "Mono 16-Bit"},
-    ValueName{zfmtBayer8, "Bayer 8-Bit"},
-    ValueName{zfmtBayer16, "Bayer 16-Bit"},
-    ValueName{zfmtRGBPlane8, "RGB Plane 8-Bit"},
-    ValueName{zfmtRGBPlane16, "RGB Plane 16-Bit"},
-    ValueName{zfmtBGR24, "BGR24"},
-    ValueName{zfmtXRGB32, "XRGB32"},
-    ValueName{zfmtRGB48, "RGB48"},
-    ValueName{zfmtBGRX32, "BGRX32"},
-    ValueName{zfmtRGB24, "RGB24"},
-};
+constexpr std::array<ValueName, ImageFormatLabels.size()> MakeFormatNames() {
+    std::array<ValueName, ImageFormatLabels.size()> names{};
+    for (std::uint32_t format = 0; format < names.size(); ++format) {
+        names[format] = {format, ImageFormatLabels[format]};
+    }
+    return names;
+}
+inline constexpr std::array FormatNames = MakeFormatNames();
 inline constexpr std::array SyncBNames{
     ValueName{zsyncbTriggerMask, "Trigger Mask"},
     ValueName{zsyncbExpose, "Expose"},

@@ -11,6 +11,7 @@
 #include "diagnostics/key_names.h"
 #include "diagnostics/log.h"
 #include "diagnostics/log_state.h"
+#include "imaging/image_formats.h"
 
 namespace ZV {
 
@@ -46,6 +47,11 @@ void WriteNamed(const LoggedValue& value) {
     ZLogWrite("%s: %s (%s)", value.label, value.digits, name);
 }
 
+void WriteImageFormat(const LoggedValue& value) {
+    const char* const label = GetImageFormatLabel(static_cast<std::uint32_t>(value.number));
+    ZLogWrite("%s: %s (%s)", value.label, value.digits, label);
+}
+
 void WriteMicroseconds(const LoggedValue& value) {
     ZLogWrite("%s: %s us (%.1f ms)", value.label, value.digits,
               static_cast<double>(value.number) / 1000.0);
@@ -76,6 +82,7 @@ constexpr std::array FormWriters{
     FormWriter{LogForm::Number, WriteNumber},
     FormWriter{LogForm::WithUnit, WriteWithUnit},
     FormWriter{LogForm::Named, WriteNamed},
+    FormWriter{LogForm::ImageFormat, WriteImageFormat},
     FormWriter{LogForm::Microseconds, WriteMicroseconds},
     FormWriter{LogForm::Nanoseconds, WriteNanoseconds},
     FormWriter{LogForm::Celsius, WriteCelsius},

@@ -2,36 +2,32 @@
 
 #include <array>
 
+#include "imaging/image_format_labels.h"
+
 namespace ZV {
 namespace {
 
 struct FormatRow {
     ZImageFormatEnum format;
-    const char* label;
     std::uint8_t imagePixelBytes;   // As the size of an image counts.
     std::uint8_t filterPixelBytes;  // As a filter asks for its output; three-colour formats only.
     bool is16Bit;
 };
 
-// Kept: the last row has a size for the filters, but neither size nor label for a client.
+// Kept: the last row has a size for the filters, but none for a client.
 constexpr std::array FormatRows{
-    FormatRow{Raw8, "Raw 8-Bit", 1, 0, false},
-    FormatRow{Raw16, "Raw 16-Bit", 2, 0, true},
-    FormatRow{Mono8, "Mono 8-Bit", 1, 0, false},
-    FormatRow{Mono16, "Mono 16-Bit", 2, 0, true},
-    FormatRow{Bayer8, "Bayer 8-Bit", 1, 0, false},
-    FormatRow{Bayer16, "Bayer 16-Bit", 2, 0, true},
-    FormatRow{RGBPlane8, "RGB Plane 8-Bit", 3, 3, false},
-    FormatRow{RGBPlane16, "RGB Plane 16-Bit", 6, 6, true},
-    FormatRow{BGR24, "BGR24", 3, 3, false},
-    FormatRow{XRGB32, "XRGB32", 4, 4, false},
-    FormatRow{RGB48, "RGB48", 6, 6, true},
-    FormatRow{BGRX32, "BGRX32", 4, 4, false},
-    FormatRow{RGB24, "RGB24", 3, 3, false},
-    FormatRow{RGBX32, "Unknown image format", 0, 4, false},
+    FormatRow{Raw8, 1, 0, false},      FormatRow{Raw16, 2, 0, true},
+    FormatRow{Mono8, 1, 0, false},     FormatRow{Mono16, 2, 0, true},
+    FormatRow{Bayer8, 1, 0, false},    FormatRow{Bayer16, 2, 0, true},
+    FormatRow{RGBPlane8, 3, 3, false}, FormatRow{RGBPlane16, 6, 6, true},
+    FormatRow{BGR24, 3, 3, false},     FormatRow{XRGB32, 4, 4, false},
+    FormatRow{RGB48, 6, 6, true},      FormatRow{BGRX32, 4, 4, false},
+    FormatRow{RGB24, 3, 3, false},     FormatRow{RGBX32, 0, 4, false},
 };
 
-constexpr FormatRow UnknownRow{RGBX32, "Unknown image format", 0, 0, false};
+constexpr FormatRow UnknownRow{RGBX32, 0, 0, false};
+
+constexpr char UnknownLabel[] = "Unknown image format";
 
 constexpr const FormatRow& FindRow(std::uint32_t format) {
     return format < FormatRows.size() ? FormatRows[format] : UnknownRow;
@@ -80,7 +76,7 @@ std::uint32_t GetThreeColourPixelBytes(std::uint32_t format) {
 }
 
 const char* GetImageFormatLabel(std::uint32_t format) {
-    return FindRow(format).label;
+    return format < ImageFormatLabels.size() ? ImageFormatLabels[format] : UnknownLabel;
 }
 
 std::uint32_t GetBytesPerSample(std::uint32_t bitDepth) {
