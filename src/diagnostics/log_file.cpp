@@ -4,6 +4,8 @@
 // consistent operations, so one of the two sees the other.
 
 #include <atomic>
+#include <chrono>
+#include <thread>
 
 #include "diagnostics/log_state.h"
 #include "hal/platform/append_file.h"
@@ -20,11 +22,14 @@ std::atomic<AppendFile*> logFile{nullptr};
 std::atomic<std::uint32_t> writerCount{0};
 
 constexpr std::uint64_t WriterMicrosecondsMax = 1000000;
+/// Pause between two looks: a writer of a lower priority needs the processor.
+constexpr std::chrono::microseconds LookInterval{100};
 
 bool AreWritersDone() {
     const std::uint64_t deadline = GetMonotonicMicroseconds() + WriterMicrosecondsMax;
     while (writerCount.load() != 0) {
         if (GetMonotonicMicroseconds() > deadline) return false;
+        std::this_thread::sleep_for(LookInterval);
     }
     return true;
 }
