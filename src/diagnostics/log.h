@@ -15,8 +15,8 @@ namespace ZV {
 /// subtraction.
 ///
 /// A record is the time since ZLogOpen and a text, with no line end but those of its format. It
-/// goes to the debugger output, or with one write and a zero byte behind it to the file. Texts of
-/// more than 1023 characters are cut.
+/// goes to the debugger output, or with one write and a zero byte behind it to the file. A record
+/// of more than 1023 characters, the time among them, is cut.
 
 /// Start: reads the switches, which stay as read until the next start, and opens the file. A file
 /// that cannot be opened is told to the debugger output, and the records are lost. The depth of
