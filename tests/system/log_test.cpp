@@ -89,6 +89,21 @@ void AskCamera(ZentaraHandle handle) {
     (void)Zentara_GetCameraModelString(handle, text.data(), 1);
 }
 
+/// What a client asks of the library alone. Each question about a format has both answers.
+void AskLibrary() {
+    std::uint16_t major = 0, minor = 0, build = 0;
+    (void)Zentara_Version(&major, &minor);
+    (void)Zentara_LibVersion(&major, &minor, &build);
+    for (const std::uint32_t format : {zfmtMono16, zfmtBayer8, zfmtRGB48}) {
+        (void)Zentara_is16bit(format);
+        (void)Zentara_is3Color(format);
+        (void)Zentara_isBayer(format);
+        (void)Zentara_isColor(format);
+        (void)Zentara_isMonochrome(format);
+    }
+    (void)Zentara_CalcImageSize(zfmtRGB48, 0x10000, 0x4000);
+}
+
 /// Loads, lists, opens, asks, edits, sends, takes an image and undoes it all.
 void RunClient() {
     (void)Zentara_LoadDriver();
@@ -99,6 +114,7 @@ void RunClient() {
     (void)Zentara_OpenCamera(0, &handle);
     (void)Zentara_OpenCamera(0, &handle);
     (void)Zentara_OpenCamera(7, &handle);
+    AskLibrary();
     AskCamera(handle);
     Zentara_Settings settings{};
     (void)Zentara_ReadDefaultSettings(handle, &settings);
@@ -169,6 +185,7 @@ TEST(LogOfASession, ShowsTheCallbacksOfAStream) {
               "<time> Buffer size: 3072|\n<time> Format: 2|\n<time> Width: 64|\n",
               "<time> Zentara_SetStreaming - Streaming is now on|\n",
               "<time> Zentara_SetStreaming - Streaming is already on|\n",
+              "<time> Zentara_SetStreaming - Streaming is now off|\n",
               "<time> Zentara_QueueSettings - Queue was empty, so settings change applied "
               "immediately|\n"}) {
             if (text.find(record) == std::string::npos) return std::string(record) + "in\n" + text;
