@@ -16,10 +16,12 @@ namespace ZV::Test {
 namespace {
 
 constexpr int Rounds = CountRounds(200);
+constexpr std::uint16_t CcdMosaic = 2;
 
 struct PropertyCase {
     const char* name;
     std::string_view scenario;
+    bool countsMicroseconds = false;  ///< Its exposure registers do: control registers of 1.x.
 };
 
 void PrintTo(const PropertyCase& property, std::ostream* stream) {
@@ -30,7 +32,7 @@ constexpr PropertyCase Cases[] = {
     {"Mono", SmallMono},
     {"Colour", SmallColour},
     {"PacketsOfVersion0", R"({"base": "mono", "cameras": [{"streamingVersion": 0}]})"},
-    {"FirstGeneration", "old"},
+    {"FirstGeneration", "old", /*countsMicroseconds=*/true},
     {"Metrona", "metrona"},
     {"Intensified", "intensified"},
     {"Mirrored", "rotated"},
@@ -50,8 +52,50 @@ class SettingsProperty : public testing::WithParamInterface<PropertyCase>, publi
         EXPECT_ZERR(zerrNone, Zentara_ReadDefaultSettings(handle, &block));
         return block;
     }
+    /// Keeps a block away from what has tests of its own, further below.
+    void AvoidExceptions(Zentara_Settings& block) {
+        if (GetCamera().GetStreamingVersion() == 0) AvoidFastDeepFormats(block);
+        if (GetParam().countsMicroseconds) AvoidRoundedExposures(block);
+        if (GetWord(block, zprmCameraMode) == zmodeRealTimeVideo) AvoidVideosLimits(block);
+    }
+    bool Send(Zentara_Settings& block) {
+        const bool isSent = Zentara_SendSettingsToCam(handle, &block) == zerrNone;
+        sent += isSent ? 1 : 0;
+        return isSent;
+    }
+    /// What a camera refuses is a share of the blocks; a test of none would prove nothing.
+    void ExpectMostWereSent(int rounds) const { EXPECT_GE(sent, rounds / 4); }
 
     RandomBlocks blocks;
+
+  private:
+    ZCamera& GetCamera() const { return *reinterpret_cast<ZCamera*>(handle); }
+    static void AvoidFastDeepFormats(Zentara_Settings& block) {
+        constexpr std::uint32_t DeepFormats[] = {1, 3, 5, 7, 10};
+        constexpr std::uint32_t PlainSpeeds[] = {0, 1, 2, 3};
+        const std::uint32_t format = GetWord(block, zprmImageFormat);
+        if (format > 12) SetWord(block, zprmImageFormat, zfmtMono8);
+        const bool isDeep = std::ranges::find(DeepFormats, format) != std::end(DeepFormats);
+        const bool isPlain = std::ranges::find(PlainSpeeds, GetWord(block, zprmReadoutSpeed)) !=
+                             std::end(PlainSpeeds);
+        if (isDeep && !isPlain) SetWord(block, zprmReadoutSpeed, zspeed10MHz);
+    }
+    void AvoidVideosLimits(Zentara_Settings& block) const {
+        if (GetCamera().IsRTVModeSupported()) {
+            SetWord(block, zprmRoiX, 0);
+            SetWord(block, zprmRoiY, 0);
+        } else if (GetCamera().GetCCDImageFormat() == CcdMosaic) {
+            SetWord(block, zprmCameraMode, zmodeStandard);
+        }
+    }
+    static void AvoidRoundedExposures(Zentara_Settings& block) {
+        for (std::uint32_t key = 0; key < 3; ++key) {
+            const std::uint64_t exposure = GetWide(block, key) % 4'000'000'000;
+            SetWide(block, key, std::max<std::uint64_t>(exposure, 1'000'000));
+        }
+    }
+
+    int sent = 0;
 };
 
 INSTANTIATE_TEST_SUITE_P(Of, SettingsProperty, testing::ValuesIn(Cases),
@@ -71,27 +115,13 @@ TEST_P(SettingsProperty, ASecondPreflightChangesNothing) {
     }
 }
 
-/// Keeps a block away from what has tests of its own, further below.
-void AvoidExceptions(Zentara_Settings& block) {
-    constexpr std::uint32_t PlainSpeeds[] = {0, 1, 2, 3};
-    SetWord(block, zprmCameraMode, zmodeStandard);
-    if (GetWord(block, zprmImageFormat) > 12) SetWord(block, zprmImageFormat, zfmtMono8);
-    const bool isPlain =
-        std::ranges::find(PlainSpeeds, GetWord(block, zprmReadoutSpeed)) != std::end(PlainSpeeds);
-    if (!isPlain) SetWord(block, zprmReadoutSpeed, zspeed10MHz);
-    for (std::uint32_t key = 0; key < 3; ++key) {
-        const std::uint64_t exposure = GetWide(block, key) % 4'000'000'000;
-        SetWide(block, key, std::max<std::uint64_t>(exposure, 1'000'000));
-    }
-}
-
 TEST_P(SettingsProperty, ABlockThatWasSentAndReadBackFitsTheCamera) {
     SCOPED_TRACE(blocks.DescribeSeed());
     for (int round = 0; round < Rounds; ++round) {
         Zentara_Settings block = ReadDefaults();
         blocks.Change(block);
         AvoidExceptions(block);
-        if (Zentara_SendSettingsToCam(handle, &block) != zerrNone) continue;
+        if (!Send(block)) continue;
         const Zentara_Settings read = ReadSettings();
         Zentara_Settings again = read;
 
@@ -99,6 +129,7 @@ TEST_P(SettingsProperty, ABlockThatWasSentAndReadBackFitsTheCamera) {
 
         ASSERT_TRUE(AreSameBlocks(read, again)) << "round " << round;
     }
+    ExpectMostWereSent(Rounds);
 }
 
 TEST_P(SettingsProperty, ABlockThatWasSentTwiceComesBackTheSame) {
@@ -107,13 +138,14 @@ TEST_P(SettingsProperty, ABlockThatWasSentTwiceComesBackTheSame) {
         Zentara_Settings block = ReadDefaults();
         blocks.Change(block);
         AvoidExceptions(block);
-        if (Zentara_SendSettingsToCam(handle, &block) != zerrNone) continue;
+        if (!Send(block)) continue;
         Zentara_Settings again = block;
 
         ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(handle, &again));
 
         ASSERT_TRUE(AreSameBlocks(block, again)) << "round " << round;
     }
+    ExpectMostWereSent(Rounds / 4);
 }
 
 // ---- Blocks of anything ----
@@ -227,6 +259,19 @@ TEST_F(SettingsException, AnOddMaximumOfAMosaicIsOnlyMadeEvenTheNextTime) {
     EXPECT_EQ(49u, GetWord(read, zprmRoiHeight));
     EXPECT_EQ(64u, GetWord(mended, zprmRoiWidth));
     EXPECT_EQ(48u, GetWord(mended, zprmRoiHeight));
+}
+
+// Kept: without the mode its largest region is one pixel, which no mosaic has.
+TEST_F(SettingsException, RealTimeVideoThatAMosaicLacksLeavesOnePixelAndTwoTheNextTime) {
+    Open(SmallColour);
+    SetWord(block, zprmCameraMode, zmodeRealTimeVideo);
+
+    SendAndReadBack();
+
+    EXPECT_EQ(zmodeStandard, GetWord(read, zprmCameraMode));
+    EXPECT_EQ(1u, GetWord(read, zprmRoiWidth));
+    EXPECT_EQ(2u, GetWord(mended, zprmRoiWidth));
+    EXPECT_EQ(2u, GetWord(mended, zprmRoiHeight));
 }
 
 constexpr std::string_view MicrosecondControl =
