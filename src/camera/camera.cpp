@@ -1,6 +1,7 @@
 #include "camera/camera.h"
 
 #include <algorithm>
+#include <cstring>
 #include <mutex>
 #include <new>
 
@@ -50,6 +51,14 @@ ZCamera::~ZCamera() {
     delete bayerPipeline;
     delete ratioCorrection;
     delete bayerFilter;
+}
+
+ZCamera::SerialNumberText ZCamera::CopySerialNumber() {
+    (void)GetSerialNumberString();  // the text is read from the place where this puts it
+    const std::lock_guard hold(serialMutex);
+    SerialNumberText copy{};
+    std::memcpy(copy.data(), serialText.data(), copy.size() - 1);
+    return copy;
 }
 
 CameraResult ZCamera::Initialize() {

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstdint>
+#include <mutex>
 #include <vector>
 
 #include "camera/camera_result.h"
@@ -333,9 +334,9 @@ class ZENTARA_API ZCamera : public ZObject {
     virtual CameraResult ReadCameraInfo() = 0;
 
     /// What GetSerialNumberString tells, always terminated, for the caller alone: that text is
-    /// rewritten when another thread finds that the camera's registers have changed. Reentrant.
+    /// rewritten when another thread finds that the camera's registers have changed. Thread-safe.
     using SerialNumberText = std::array<char, 29>;
-    virtual SerialNumberText CopySerialNumber() = 0;
+    SerialNumberText CopySerialNumber();
 
   private:
     virtual CameraResult SetupCamera() = 0;
@@ -358,6 +359,8 @@ class ZENTARA_API ZCamera : public ZObject {
     ZFolaryRatioCorrection* ratioCorrection = nullptr;
     Relaxed<bool> isOpen{false};
     Relaxed<bool> exclusiveAccess{false};
+    std::mutex serialMutex;              ///< Leaf.
+    std::array<char, 256> serialText{};  ///< Last serial number told. Guarded by serialMutex.
 
     /// Null until a camera has been opened; guarded, like the number, by a leaf mutex.
     static std::vector<ZCamera*>* m_connectedCameras;

@@ -309,25 +309,20 @@ std::uint32_t MorvaneFWCamera::GetTriggerDelayResolution() {
     return ReadConfiguration(ConfigTriggerDelayResolution);
 }
 
-ZCamera::SerialNumberText MorvaneFWCamera::CopySerialNumber() {
+const char* MorvaneFWCamera::GetSerialNumberString() {
     const bool isReversed = !GetBigEndian();
-    SerialNumberText text{};
-    static_assert(text.size() == ConfigSerialQuadlets * sizeof(std::uint32_t) + 1);
+    std::array<char, ConfigSerialQuadlets * sizeof(std::uint32_t)> text{};
     for (std::uint32_t index = 0; index < ConfigSerialQuadlets; ++index) {
         const std::uint32_t quadlet = ReadConfiguration(ConfigSerialFirst + index);
         char* const bytes = &text[index * sizeof quadlet];
         std::memcpy(bytes, &quadlet, sizeof quadlet);
         if (isReversed) std::reverse(bytes, bytes + sizeof quadlet);
     }
-    return text;
-}
-
-const char* MorvaneFWCamera::GetSerialNumberString() {
-    const SerialNumberText text = CopySerialNumber();
     // Stored only when it differs: other threads may be reading what they were given.
     const std::lock_guard hold(serialMutex);
-    if (std::memcmp(serialText.data(), text.data(), text.size()) != 0)
+    if (std::memcmp(serialText.data(), text.data(), text.size()) != 0) {
         std::memcpy(serialText.data(), text.data(), text.size());
+    }
     return serialText.data();
 }
 

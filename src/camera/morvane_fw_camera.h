@@ -154,7 +154,6 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     std::uint32_t GetExposureResolution() override;
     std::uint32_t GetTriggerDelayResolution() override;
     const char* GetSerialNumberString() override;
-    SerialNumberText CopySerialNumber() override;
     bool GetRegulatedCoolingTemperatureLock() override;
     std::int32_t GetRegulatedCoolingTemperature() override;
     std::uint16_t GetCCDImageFormat() override;
@@ -409,8 +408,6 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     StreamingState streaming;
     GainModel gainModel;
     std::int32_t defaultGaindB = 0;
-    std::mutex serialMutex;              ///< Leaf.
-    std::array<char, 256> serialText{};  ///< Written under serialMutex.
 
   private:
     struct SetupStep;
