@@ -154,7 +154,8 @@ TEST(LogOfASession, ShowsNestedCallsBySwitch) {
 
 /// A frame of each kind of callback through the queue and one settings change at once.
 std::string RunStream() {
-    const LoggedWorld world("outputFrame = 1\n");
+    // Nested calls too: the threads' calls raise one common depth, which may drift.
+    const LoggedWorld world("outputFrame = 1\noutputNestedCalls = 1\n");
     (void)Zentara_LoadDriver();
     std::array<Zentara_CamListItem, 4> items{};
     auto length = static_cast<std::uint32_t>(items.size());
@@ -181,14 +182,20 @@ TEST(LogOfASession, ShowsTheCallbacksOfAStream) {
         const std::string text = RunStream();
         for (const char* record :
              {"<time> ImageReceived start|\n", "<time> ImageReceived end (error code 0)\\n",
-              "<time> Zentara_Frame structure:|\n<time> pBuffer: <address>|\n"
-              "<time> Buffer size: 3072|\n<time> Format: 2|\n<time> Width: 64|\n",
               "<time> Zentara_SetStreaming - Streaming is now on|\n",
               "<time> Zentara_SetStreaming - Streaming is already on|\n",
               "<time> Zentara_SetStreaming - Streaming is now off|\n",
               "<time> Zentara_QueueSettings - Queue was empty, so settings change applied "
               "immediately|\n"}) {
             if (text.find(record) == std::string::npos) return std::string(record) + "in\n" + text;
+        }
+        // Records of the exposure thread may stand between those of the frame.
+        std::size_t place = 0;
+        for (const char* record :
+             {"<time> Zentara_Frame structure:|\n", "<time> pBuffer: <address>|\n",
+              "<time> Buffer size: 3072|\n", "<time> Format: 2|\n", "<time> Width: 64|\n"}) {
+            place = text.find(record, place);
+            if (place == std::string::npos) return std::string(record) + "in order in\n" + text;
         }
         // Kept: a frame that is queued is silent.
         return text.find("Zentara_QueueFrame") == std::string::npos ? "" : text;
