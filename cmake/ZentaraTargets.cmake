@@ -31,3 +31,11 @@ function(zentara_sources result folder)
   file(GLOB_RECURSE found CONFIGURE_DEPENDS ${folder}/*.cpp ${folder}/*.h)
   set(${result} ${found} PARENT_SCOPE)
 endfunction()
+
+# For a build that answers quickly; every other build shows what a source forgets to include.
+function(zentara_precompile target)
+  if(ZENTARA_PRECOMPILE)
+    target_precompile_headers(${target} PRIVATE
+      <algorithm> <array> <atomic> <memory> <mutex> <string> <thread> <vector> ${ARGN})
+  endif()
+endfunction()
