@@ -106,12 +106,16 @@ HALStatus MorvaneFWCamera::WaitForCloseOfRunLoop() {
     return HAL_SemaphoreWait(streaming.closeLock);
 }
 
-/// Beside an exposure callback that lasts: what it has begun to start or stop is done first.
+/// Beside an exposure callback that lasts: what it has begun to start or stop is done first. A
+/// stream that it has started behind the close's stop ends here, or the next opening would find it
+/// on and no device behind it.
 HALStatus MorvaneFWCamera::Disconnect() {
     const std::lock_guard hold(streaming.switchMutex);
+    if (streaming.isStreaming) (void)StopUnderSwitchMutex();  // said there; the device goes anyway
     HALCamera record = GetHALCamera();
     const HALStatus status = HAL_CameraDisconnect(&record);
     SetHALCamera(record);
+    if (status == HALOk) streaming.isStreaming = false;  // also when the stop above failed
     return status;
 }
 

@@ -57,6 +57,10 @@ CameraResult MorvaneFWCamera::StartUnderStreamLock(const StreamCallbacks* newCal
 
 CameraResult MorvaneFWCamera::StopStreamingImages() {
     const std::lock_guard hold(streaming.switchMutex);
+    return StopUnderSwitchMutex();
+}
+
+CameraResult MorvaneFWCamera::StopUnderSwitchMutex() {
     HALCamera record = GetHALCamera();
     HALStatus status =
         HAL_CameraStopStreaming(&record, registers.stream.GetQuadletAddress(StreamSwitch));

@@ -469,6 +469,7 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     CameraResult StartStream(const StreamCallbacks* newCallbacks, bool externalBuffers,
                              bool* hasStarted);
     CameraResult StartUnderStreamLock(const StreamCallbacks* newCallbacks, bool externalBuffers);
+    CameraResult StopUnderSwitchMutex();
     void ClearFrameInfoVector();
 
     bool DropSurplusFrame();

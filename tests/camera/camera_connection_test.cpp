@@ -205,6 +205,54 @@ TEST_F(OneSlowClient, ACameraDeletedUnderAnExposureCallbackWaitsForIt) {
     EXPECT_EQ(1u, client.ended);
 }
 
+/// A client whose exposure callback starts the stream again behind the stop of a close, as a change
+/// of settings may that is made at an exposure's end.
+struct LateStarter {
+    TestCamera& camera;
+    TestClient& client;
+    std::atomic<bool> isInside{false};
+    CameraResult started = CameraRefused;
+
+    static void* ExposeDone(void* refCon) {
+        auto& self = *static_cast<LateStarter*>(refCon);
+        if (self.isInside.exchange(true)) return nullptr;
+        EXPECT_TRUE(WaitUntil([&] { return !self.camera.IsCameraStreaming(); }));
+        self.started = self.camera.StartStreamingImages(TestClient::ReceiveImage, nullptr, false,
+                                                        &self.client);
+        return nullptr;
+    }
+};
+
+TEST_F(OneClosedCamera, IsNotLeftStreamingByAStartBehindTheStopOfItsClose) {
+    for (const bool failsToStop : {false, true}) {
+        TestClient client;
+        LateStarter starter{*camera, client};
+        ASSERT_EQ(CameraOk, camera->Ready());
+        camera->streaming.callbacks.Set({nullptr, LateStarter::ExposeDone, &starter});
+        camera->streaming.isStreaming = true;  // for the callback to see the close's stop
+        ASSERT_EQ(HALOk, HAL_ConditionSignal(camera->streaming.exposeDoneCondition));
+        ASSERT_TRUE(WaitUntil([&] { return starter.isInside.load(); }));
+        if (failsToStop) {
+            // Nothing runs at the close's own stop, so that the late one meets the fault.
+            ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_STOP"})"));
+        }
+
+        ASSERT_EQ(CameraOk, camera->CloseCamera());
+
+        EXPECT_EQ(CameraOk, starter.started);
+        EXPECT_FALSE(camera->IsCameraStreaming());
+        EXPECT_EQ(0u, world.GetState().attachedBuffers);
+        if (!failsToStop) {
+            EXPECT_EQ(0u, world.GetState().isStreaming);
+        }
+        ASSERT_EQ(CameraOk, camera->OpenCamera());
+        ASSERT_EQ(CameraOk,
+                  camera->StartStreamingImages(TestClient::ReceiveImage, nullptr, false, &client));
+        EXPECT_TRUE(WaitUntil([&] { return client.GetImageCount() >= 2; }));
+        ASSERT_EQ(CameraOk, camera->CloseCamera());
+    }
+}
+
 TEST(CameraTakenByAnother, ReadsAsOpenAndIsRefused) {
     CameraWorld one(
         R"({"base": "mono", "timeScale": 0, "cameras": [{"held": {"from": 2, "to": 2}}]})");
