@@ -13,7 +13,6 @@ constexpr std::uint64_t WaitBase = 5000000000;
 }  // namespace
 
 CameraResult MorvaneFWCamera::GetOneImage(ZExImage** image) {
-    const bool isToRestart = streaming.restartAfterUpdate;
     const HALStatus status = ForgetOneImage();
     if (status != HALOk) return ReportHalStatus(status);
 
@@ -29,13 +28,14 @@ CameraResult MorvaneFWCamera::GetOneImage(ZExImage** image) {
     if (result == CameraOk) result = AwaitOneImage();
     if (result != CameraOk) return result;
     if (hasStarted) {
+        // Kept: the callback stays the one of this call. A commit that starts the stream of a
+        // failed change again, or one that another thread's setter has stopped here, starts it with
+        // this callback, and the client's frames are served only after it is switched off and on.
         result = StopStreamingImages();
-        // A setter of another thread may have stopped this stream, which is not to come back.
-        if (!isToRestart) streaming.restartAfterUpdate = false;
         if (result != CameraOk) return result;
+    } else {
+        (void)streaming.callbacks.ReplaceImage(former.image, former.refCon);
     }
-    // Also for a stream that a setter of another thread has stopped and starts again.
-    (void)streaming.callbacks.ReplaceImage(former.image, former.refCon);
     *image = ClaimOneImage();
     return *image != nullptr ? CameraOk : CameraNoImage;
 }
