@@ -73,7 +73,7 @@ std::uint32_t ReadPacketsPerRequest() {
     SettingsStore* const store = OpenSettingsStore();
     if (store != nullptr) (void)ReadStoredNumber(store, "MaxPacketsPerRequest", &packets);
     CloseSettingsStore(store);
-    return std::min(packets, AdapterPacketsPerRequestMax);
+    return packets;
 }
 
 bool MakeRing(AdapterContext& context) {

@@ -26,13 +26,12 @@ inline constexpr std::uint32_t AdapterRequestCount = 10;
 inline constexpr std::uint32_t AdapterPacketBytesMin = 9;
 inline constexpr std::uint32_t AdapterPacketBytesMax = 9200;
 inline constexpr std::uint32_t AdapterPacketsPerRequestDefault = 100;
-/// An eighth of a second of the bus; a stored number above it counts as this one.
-inline constexpr std::uint32_t AdapterPacketsPerRequestMax = 1000;
 /// Length of the wait for a silent source before `timedOut` is called, in milliseconds of the wait
 /// clock.
 inline constexpr std::uint64_t AdapterSilenceMs = 1000;
 
-/// Bytes of one request buffer for packets of `payloadBytes`.
+/// Bytes of one request buffer for packets of `payloadBytes`. Any stored number counts; a start
+/// whose buffers find no memory fails.
 constexpr std::uint64_t GetAdapterRequestBytes(std::uint16_t payloadBytes,
                                                std::uint32_t packetsPerRequest) {
     const std::uint64_t slotBytes = (std::uint64_t{payloadBytes} + 12 + 3) / 4 * 4;

@@ -206,12 +206,11 @@ TEST_F(AdapterCamera, ABufferHoldsTheStoredNumberOfPacketsOrAHundred) {
     EXPECT_EQ(112u * 7 + 32, GetCapacityWith("7"));
 }
 
-TEST_F(AdapterCamera, AStoredNumberOfPacketsIsLimitedSoThatNoBufferTakesAllMemory) {
-    for (const char* stored : {"1001", "4294967295"}) {
-        EXPECT_EQ(AdapterPacketBytesMax, GetCapacityWith(stored));
-    }
-    EXPECT_EQ(1000u, AdapterPacketsPerRequestMax);
-    EXPECT_LE(GetAdapterRequestBytes(0xFFFF, AdapterPacketsPerRequestMax), 66'000'000u);
+TEST_F(AdapterCamera, AnyStoredNumberOfPacketsCounts) {
+    EXPECT_EQ(112ull * 5000 + 32, GetAdapterRequestBytes(100, 5000));
+    EXPECT_EQ(65548ull * 0xFFFFFFFF + 32, GetAdapterRequestBytes(0xFFFF, 0xFFFFFFFF));
+
+    EXPECT_EQ(AdapterPacketBytesMax, GetCapacityWith("5000"));
 }
 
 TEST_F(AdapterCamera, WithNoPacketStoredABufferHasItsSpareBytesAlone) {
