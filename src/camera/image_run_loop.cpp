@@ -174,8 +174,9 @@ void MorvaneFWCamera::PrivateRunExposeDoneCB() {
     RunExposeThread(streaming.exposeThreadsMade);
 }
 
-/// `number` tells the threads of one camera apart, in the order in which they begin: only as many
-/// as have been made begin, so that the last number is always somebody's.
+/// `number` tells the threads of one camera apart, in the order in which they begin. A thread that
+/// could not be made leaves its number to the next: until then one that has outlived its close is
+/// the last again, and finds its reason to run taken away or serves the camera in its stead.
 void MorvaneFWCamera::RunExposeThread(std::uint32_t number) {
     const auto isLast = [&] { return number == streaming.exposeThreadsMade.load(); };
     while (streaming.exposeDoneActive && isLast()) {
