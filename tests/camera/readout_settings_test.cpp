@@ -79,16 +79,16 @@ TEST(SymmetricalBinning, RefusesAModeWithStreamingAlreadyStoppedAndTheCodeCleare
     }
 }
 
-/// Stands in for another client that starts the stream behind the stop step.
-struct StreamStartsMeanwhile : BinningCamera {
+/// Stands for a flag that rises while the setter has the lock; no real start gets so far.
+struct StreamShowsUnderTheLock : BinningCamera {
     std::uint32_t GetMaxCCDWidthForBinningMode(std::uint32_t mode) override {
         streaming.isStreaming = true;
         return BinningCamera::GetMaxCCDWidthForBinningMode(mode);
     }
 };
 
-TEST(SymmetricalBinning, LeavesAStreamAloneThatAnotherClientStartsBehindItsStopStep) {
-    StreamStartsMeanwhile camera;
+TEST(SymmetricalBinning, StopsNoStreamWhileItHoldsTheLockForWhichAStopWaits) {
+    StreamShowsUnderTheLock camera;
     std::atomic<bool> hasReturned{false};
     CameraResult result = CameraBadValue;
 
@@ -107,6 +107,34 @@ TEST(SymmetricalBinning, LeavesAStreamAloneThatAnotherClientStartsBehindItsStopS
     EXPECT_FALSE(camera.streaming.restartAfterUpdate);
     EXPECT_EQ(500u << 16 | 400, camera.ReadControl(3));
     EXPECT_EQ(0u, camera.ReadControl(4));
+}
+
+/// Tells when the setter is about to run its stop step.
+struct StopStepIsNear : BinningCamera {
+    std::uint16_t GetSymmetricalBinningMode() override {
+        isNear = true;
+        return BinningCamera::GetSymmetricalBinningMode();
+    }
+    std::atomic<bool> isNear{false};
+};
+
+TEST(SymmetricalBinning, StopsAStreamThatAnotherClientStartsBehindItsStopStep) {
+    for (int round = 0; round < 50; ++round) {
+        StopStepIsNear camera;
+        CameraResult result = CameraBadValue;
+        // Another start has the lock; the setter waits for it behind its stop step.
+        ASSERT_EQ(HALOk, HAL_SemaphoreWait(camera.streaming.streamLock));
+        std::thread setter([&] { result = camera.SetSymmetricalBinning(2); });
+        EXPECT_TRUE(WaitUntil([&] { return camera.isNear.load(); }));
+        camera.streaming.isStreaming = true;
+        EXPECT_EQ(HALOk, HAL_SemaphoreSignal(camera.streaming.streamLock));
+        setter.join();
+
+        EXPECT_EQ(CameraOk, result);
+        EXPECT_FALSE(camera.streaming.isStreaming);
+        EXPECT_TRUE(camera.streaming.restartAfterUpdate);
+        EXPECT_EQ(500u << 16 | 400, camera.ReadControl(3));
+    }
 }
 
 TEST(SymmetricalBinning, WritesWidthXHeightYWhenItBinsAndSizeBeforePositionWhenItEnds) {
