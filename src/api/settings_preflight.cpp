@@ -7,6 +7,7 @@
 #include "api/format_sets.h"
 #include "api/handles.h"
 #include "api/settings_block.h"
+#include "api/settings_change.h"
 #include "camera/camera.h"
 #include "diagnostics/log.h"
 #include "imaging/image_formats.h"
@@ -172,6 +173,7 @@ ZentaraResult PreflightSettings(const char* function, ZentaraHandle handle,
     ZCamera* const camera = FindCamera(handle);
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
     const Preflight preflight{function, handle, *camera, *settings};
+    const SettingsChange change(*camera);
     CapReadoutSpeed(preflight);
     AlignToMosaic(preflight);
     FitToRealTimeVideo(preflight);

@@ -13,6 +13,7 @@
 #include "api/register_tweak.h"
 #include "api/result_codes.h"
 #include "api/settings_block.h"
+#include "api/settings_change.h"
 #include "api/settings_compare.h"
 #include "api/settings_units.h"
 #include "camera/camera.h"
@@ -254,6 +255,7 @@ void ReadBack(const Send& send) {
 
 ZentaraResult SendLocked(const char* function, const Send& send, ZentaraHandle handle) {
     const SemaphoreHold queueing(*send.context.queueLock);
+    const SettingsChange change(send.camera);
     // Kept: a send that fails leaves the flag set until one succeeds.
     send.context.sendInProgress = 1;
     const bool wasStreaming = send.camera.IsCameraStreaming();

@@ -320,6 +320,11 @@ class ZENTARA_API ZCamera : public ZObject {
 
     // Control.
     virtual CameraResult UpdateSettingsOnCamera() = 0;
+    /// Around a batch of settings: between a change of the image's geometry and its commit frames
+    /// are dropped, since they still come with the former one. At the end of the batch they count
+    /// as they come again, also without a commit. Batches may be nested, and meet. Thread-safe.
+    virtual void BeginSettingsChange() = 0;
+    virtual void EndSettingsChange() = 0;
     virtual bool IsCameraStreaming() = 0;
     virtual CameraResult GetOneImage(ZExImage** image) = 0;
     virtual CameraResult StartStreamingImages(ImageCallback imageCallback,

@@ -4,6 +4,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
+#include <mutex>
 
 #include "camera/morvane_fw_camera.h"
 
@@ -75,11 +76,41 @@ bool MorvaneFWCamera::IsGeometryInForce(const tStFrameInfo& frame) const {
            streaming.geometryInForce;
 }
 
+/// Under `geometryMutex`.
 void MorvaneFWCamera::AnnounceNewGeometry() {
-    if (streaming.isGeometryPending) return;
+    if (streaming.changesInProgress == 0 || streaming.isGeometryPending) return;
     streaming.geometryInForce =
         PackGeometry(GetImageWidth(), GetImageHeight(), GetBitDepth(), IsInterlaced());
     streaming.isGeometryPending = true;
+}
+
+CameraResult MorvaneFWCamera::WriteGeometry(std::uint32_t quadlet, std::uint32_t value) {
+    const std::lock_guard hold(streaming.geometryMutex);
+    AnnounceNewGeometry();
+    return WriteControl(quadlet, value);
+}
+
+CameraResult MorvaneFWCamera::WriteGeometryField(const RegisterField& field, std::uint32_t value) {
+    const std::lock_guard hold(streaming.geometryMutex);
+    AnnounceNewGeometry();
+    return WriteControlField(field, value);
+}
+
+HALStatus MorvaneFWCamera::TakeOverGeometry() {
+    const std::lock_guard hold(streaming.geometryMutex);
+    const HALStatus status = WriteCommand(CommandTakeOver, 1);
+    if (status == HALOk) streaming.isGeometryPending = false;
+    return status;
+}
+
+void MorvaneFWCamera::BeginSettingsChange() {
+    const std::lock_guard hold(streaming.geometryMutex);
+    ++streaming.changesInProgress;
+}
+
+void MorvaneFWCamera::EndSettingsChange() {
+    const std::lock_guard hold(streaming.geometryMutex);
+    if (--streaming.changesInProgress == 0) streaming.isGeometryPending = false;
 }
 
 bool MorvaneFWCamera::ProvideBuffer(tStFrameInfo& frame) {

@@ -42,9 +42,8 @@ CameraResult MorvaneFWCamera::StartUnderStreamLock(const StreamCallbacks* newCal
     // Frames of a former run no longer match the new number. Kept: a failure gives the lock, which
     // the end gives a second time.
     if (SetPSN(GetPSN() + 1) != CameraOk) (void)HAL_SemaphoreSignal(streaming.streamLock);
-    HALStatus status = WriteCommand(CommandTakeOver, 1);
+    HALStatus status = TakeOverGeometry();
     if (status != HALOk) return ReportHalStatus(status);
-    streaming.isGeometryPending = false;
     if (newCallbacks != nullptr) streaming.callbacks.Set(*newCallbacks);
     streaming.usesExternalBuffers = externalBuffers;
     streaming.isStreaming = true;  // kept: stays when the start below fails

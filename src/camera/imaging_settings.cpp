@@ -17,7 +17,7 @@ constexpr std::uint32_t LowHalf = 0xFFFF;
 
 CameraResult MorvaneFWCamera::ChangeField(const RegisterField& field, std::uint32_t value) {
     TurnOffStreaming();
-    return WriteControlField(field, value);
+    return WriteGeometryField(field, value);
 }
 
 // The ROI's fields compare the register, not the getter: a model may state its position from
@@ -26,7 +26,7 @@ CameraResult MorvaneFWCamera::ChangeROIField(const RegisterField& field, std::ui
                                              std::uint32_t greatest, StopStep stopStep) {
     if (value == ReadControlField(field)) return CameraOk;
     if (stopStep == StopStep::Due) TurnOffStreaming();
-    return WriteControlField(field, std::min(value, greatest));
+    return WriteGeometryField(field, std::min(value, greatest));
 }
 
 std::uint32_t MorvaneFWCamera::GetGreatestROIWidth() {

@@ -282,6 +282,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
 
     // Control.
     CameraResult UpdateSettingsOnCamera() override;
+    void BeginSettingsChange() override;
+    void EndSettingsChange() override;
     bool IsCameraStreaming() override;
     CameraResult GetOneImage(ZExImage** image) override;
     CameraResult StartStreamingImages(ImageCallback imageCallback,
@@ -379,9 +381,11 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     /// rolled back.
     CameraResult WriteControl(std::uint32_t quadlet, std::uint32_t value);
     CameraResult WriteControlField(const RegisterField& field, std::uint32_t value);
-    /// Before a change of the image's size or fields that does not stop the stream: what arrives
-    /// until the settings are taken over is not taken for an image of the new geometry.
-    void AnnounceNewGeometry();
+    /// Write a register that decides the image's size or fields. A stream may run meanwhile, since
+    /// not every model stops it and another client may start it: within a batch of settings what
+    /// arrives before they are taken over is not taken for an image of the new geometry.
+    CameraResult WriteGeometry(std::uint32_t quadlet, std::uint32_t value);
+    CameraResult WriteGeometryField(const RegisterField& field, std::uint32_t value);
     /// Writes one quadlet of the command block; prints nothing.
     HALStatus WriteCommand(std::uint32_t quadlet, std::uint32_t value);
     /// Version words as last read, the major number in the upper half.
@@ -439,6 +443,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     CameraResult LowerFrequencyForBus(float megahertz, std::uint32_t binning);
     std::uint16_t GetFastestPacketSize();
     CameraResult TakeOverSettings();
+    HALStatus TakeOverGeometry();
+    void AnnounceNewGeometry();
     CameraResult RefreshConfiguration();
     void RestartStreaming();
 

@@ -85,7 +85,7 @@ CameraResult MorvaneFWCamera::WriteBinning(std::uint32_t mode) {
                      InsertField(ControlBinning, ReadControl(ControlBinning.quadlet), 0));
         return CameraBadValue;
     }
-    const CameraResult result = WriteControlField(ControlBinning, *code);
+    const CameraResult result = WriteGeometryField(ControlBinning, *code);
     // Kept: a write that fails gives the lock here and once more at the end.
     if (result != CameraOk) (void)GiveLock(streaming.streamLock);
     return result;

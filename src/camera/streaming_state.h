@@ -82,8 +82,8 @@ struct StreamingState {
     Relaxed<bool> usesExternalBuffers{false};
     Relaxed<bool> restartAfterUpdate{false};  ///< A setter has stopped a stream that is to go on.
     Relaxed<bool> abortPending{false};        ///< The next frame request is refused.
-    /// A setter has changed the image's geometry under a stream that it does not stop. Until the
-    /// take-over the camera sends images of `geometryInForce`.
+    /// A setter has changed the image's geometry. Until the take-over the camera sends images of
+    /// `geometryInForce`; a change that ends without one leaves frames to count as they come.
     Relaxed<bool> isGeometryPending{false};
     Relaxed<std::uint64_t> geometryInForce{0};
     Relaxed<bool> configStale{false};  ///< MiscCtrl has changed what the camera reports.
@@ -97,6 +97,10 @@ struct StreamingState {
     /// One start or stop at a time, whoever calls: the stream layer takes them only one by one.
     /// Taken before `streamLock`, never by the bus thread.
     std::mutex switchMutex;
+    /// A write of the image's geometry is told apart from a take-over: it stands before it or
+    /// behind it. Held over their requests; nothing but the HAL's locks is taken under it.
+    std::mutex geometryMutex;
+    std::uint32_t changesInProgress = 0;  ///< Batches of settings. Guarded by geometryMutex.
 };
 
 }  // namespace ZV

@@ -31,9 +31,8 @@ CameraResult MorvaneFWCamera::UpdateSettingsOnCamera() {
 
 CameraResult MorvaneFWCamera::TakeOverSettings() {
     if (imagePipeline != nullptr) imagePipeline->ResetFilters();
-    const HALStatus status = WriteCommand(CommandTakeOver, 1);
+    const HALStatus status = TakeOverGeometry();
     if (status != HALOk) return ReportHalStatus(status);
-    streaming.isGeometryPending = false;
     // Frames under way were made with the old settings.
     IgnoreFrameInfoVector();
     return CameraOk;

@@ -158,8 +158,7 @@ CameraResult Folary::SetSymmetricalBinning(std::uint32_t mode) {
         StoreControl(BinningQuadlet, cleared);
         return CameraBadValue;
     }
-    AnnounceNewGeometry();
-    const CameraResult result = WriteControl(BinningQuadlet, cleared | row->bits);
+    const CameraResult result = WriteGeometry(BinningQuadlet, cleared | row->bits);
     if (result != CameraOk) return result;
 
     if (mode >= 2)
@@ -189,8 +188,7 @@ CameraResult Folary::SetVerticalBinning(std::uint32_t mode) {
 
 CameraResult Folary::SetRTVMode(bool isOn) {
     if (isOn == GetRTVMode()) return CameraOk;
-    AnnounceNewGeometry();
-    CameraResult result = WriteControlField(ControlRtvMode, isOn);
+    CameraResult result = WriteGeometryField(ControlRtvMode, isOn);
     if (result != CameraOk) return result;
     if (!isOn) return PlaceROI(GetCCDWidth(), GetCCDHeight());
 

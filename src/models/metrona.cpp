@@ -84,8 +84,7 @@ CameraResult Metrona::SetVerticalBinning(std::uint32_t mode) {
 
 CameraResult Metrona::SetAxisBinning(const RegisterField& field, std::uint32_t mode) {
     if (mode < 1 || mode > GreatestBinning) return CameraBadValue;
-    AnnounceNewGeometry();
-    return WriteControlField(field, mode - 1);
+    return WriteGeometryField(field, mode - 1);
 }
 
 std::uint32_t Metrona::GetMaxCCDWidthForBinningMode(std::uint32_t mode) {

@@ -299,10 +299,45 @@ TEST(SettingsBehindAFrame, MayChangeTheBinningWhichIsNotComparedAndRestartsTheSt
     ExpectCallbacksInOrder(streamed.flow->GetEvents());
 }
 
+/// An image that a grab called good, as the camera's own record of it would stand.
+struct GrabbedImage {
+    std::uint32_t number = 0, width = 0, height = 0;
+    std::uint64_t checksum = 0;
+
+    bool IsAsSent(const TraceRecord& sent) const {
+        return sent.rollingFrameNumber == number && sent.width == width && sent.height == height &&
+               sent.checksum == checksum;
+    }
+};
+
+GrabbedImage ReadGrabbed(const Streamed& streamed, ClientFrame& frame) {
+    const std::size_t sampleBytes = frame->bits > 8 ? 2 : 1;
+    const std::size_t bytes = sampleBytes * frame->width * frame->height;
+    std::vector<std::uint8_t> pixels(frame.GetPixels(), frame.GetPixels() + bytes);
+    if (streamed.session.GetCamera().GetStreamingVersion() == 2) {
+        std::reverse(pixels.begin(), pixels.end());
+        for (std::size_t i = 0; sampleBytes == 2 && i + 1 < bytes; i += 2) {
+            std::swap(pixels[i], pixels[i + 1]);
+        }
+    }
+    return {frame->frameNumber, frame->width, frame->height,
+            CalculateChecksum(pixels.data(), pixels.size())};
+}
+
+void ExpectImagesAsSent(const SimulationWorld& world, const std::vector<GrabbedImage>& grabbed) {
+    const auto sent = world.ReadFrames();
+    for (const GrabbedImage& image : grabbed) {
+        EXPECT_TRUE(std::any_of(sent.begin(), sent.end(),
+                                [&](const auto& record) { return image.IsAsSent(record); }))
+            << "frame " << image.number << ", " << image.width << " x " << image.height;
+    }
+}
+
 /// What a second client thread does to a camera whose settings the first one sends.
 struct Disturbance {
     std::atomic<bool> isOver{false};
     std::atomic<std::size_t> rounds{0};
+    std::vector<GrabbedImage> grabbed;  // for the first thread once the second has ended
 };
 void DisturbStream(Streamed& streamed, Disturbance& disturbance) {
     const ZentaraHandle handle = streamed.GetHandle();
@@ -327,6 +362,9 @@ void DisturbStream(Streamed& streamed, Disturbance& disturbance) {
         EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
         const ZentaraResult grabbed = Zentara_GrabFrame(handle, frames[1]->Get());
         EXPECT_TRUE(grabbed == zerrNone || grabbed == zerrCameraFault) << grabbed;
+        if (grabbed == zerrNone && (*frames[1])->errorCode == zerrNone) {
+            disturbance.grabbed.push_back(ReadGrabbed(streamed, *frames[1]));
+        }
     }
     EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
     for (const auto& frame : frames) EXPECT_TRUE(frame->IsGuardIntact());
@@ -354,6 +392,8 @@ TEST_P(SettingsUnderStreaming, OneThreadMaySendWhileAnotherQueuesAbortsAndGrabs)
 
     disturbance.isOver = true;
     other.join();
+    EXPECT_FALSE(disturbance.grabbed.empty());
+    ExpectImagesAsSent(streamed.session.world, disturbance.grabbed);
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(streamed.GetHandle(), 1));
     ExpectSameReservations(before, streamed.session.world.GetState());
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(streamed.GetHandle(), 0));

@@ -6,6 +6,7 @@
 
 #include "camera/register_map.h"
 #include "simulation/register_file.h"
+#include "support/flat_camera.h"
 #include "support/settings_words.h"
 #include "support/wait_until.h"
 #include "system/streamed_camera.h"
@@ -182,6 +183,70 @@ TEST_P(StreamUnderSends, AStreamThatTheClientStartsAfterAFailedSendIsNotStoppedB
     const std::size_t before = streamed.flow->CountFrames();
     ASSERT_TRUE(streamed.flow->WaitForFrames(before + Circulating));
     EXPECT_TRUE(streamed.flow->Drain());
+}
+
+TEST_P(StreamUnderSends, AGrabBehindAFailedSendKeepsTheStreamThatTheNextSendStarts) {
+    // Kept: the grab starts and stops a stream of its own and leaves its callback in place, and the
+    // restart to the commit.
+    Streamed streamed(GetParam());
+    ASSERT_TRUE(streamed.session.IsOpen());
+    const ZentaraHandle handle = streamed.GetHandle();
+    const SimulationWorld& world = streamed.session.world;
+    Zentara_Settings settings = streamed.ReadSettings();
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    SetWord(settings, zprmRoiWidth, 96);
+    Zentara_Settings failing = settings;
+    SetWord(failing, zprmTriggerType, ztrigSoftware);
+    ASSERT_TRUE(streamed.session.world.AddFault(MakeFailingWrite(ControlTriggerType.quadlet)));
+    ASSERT_NE(zerrNone, Zentara_SendSettingsToCam(handle, &failing));
+    ASSERT_FALSE(streamed.IsStreaming());
+    ClientFrame frame(StreamedCamera::BufferBytes);
+    ASSERT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+    EXPECT_FALSE(streamed.IsStreaming());
+    CallbackLog calls;
+    ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frame.Get(), CallbackLog::Record, zcbFrameDone,
+                                             calls.GetPrivate(), 0));
+
+    const std::uint64_t before = world.GetState().framesSent;
+    ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(handle, &settings));
+
+    EXPECT_TRUE(streamed.IsStreaming());
+    EXPECT_TRUE(WaitUntil([&] { return world.GetState().framesSent > before + 10; }));
+    EXPECT_EQ(0u, calls.CountCalls());
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    EXPECT_TRUE(calls.WaitForCalls(1));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+}
+
+// A model that is binned under its stream.
+
+TEST(MetronaUnderSends, AFailedSendDoesNotSilenceTheStream) {
+    CameraSession session(
+        R"({"base": "metrona", "cameras": [{"sensor": {"width": 160, "height": 120}}]})");
+    ASSERT_TRUE(session.IsOpen());
+    const ZentaraHandle handle = session.GetHandle();
+    Zentara_Settings settings{};
+    ASSERT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(handle, &settings));
+    FrameFlow flow(handle, Circulating, StreamedCamera::BufferBytes, 0);
+    flow.Begin();
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    ASSERT_TRUE(flow.WaitForFrames(Circulating));
+    SetWord(settings, zprmVerticalBinning, 2);
+    SetWord(settings, zprmHorizontalBinning, 65);  // refused behind the vertical one
+
+    EXPECT_ZERR(zerrDriverFault, Zentara_SendSettingsToCam(handle, &settings));
+
+    const std::size_t before = flow.CountFrames();
+    EXPECT_TRUE(flow.WaitForFrames(before + 3 * Circulating));
+    ASSERT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(handle, &settings));
+    SetWord(settings, zprmHorizontalBinning, 2);
+    EXPECT_ZERR(zerrNone, Zentara_SendSettingsToCam(handle, &settings));
+    EXPECT_TRUE(WaitUntil([&] { return flow.GetFrames().back().width == 80; }));
+    flow.StopCirculating();
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
 }
 
 // Trigger modes.
