@@ -72,6 +72,7 @@ struct CameraContext {
 
     mutable std::mutex queueMutex;
     std::uint64_t changesTaken = 0;  ///< Settings changes taken out of the queue. Guarded as it is.
+    std::uint64_t servicesBegun = 0;         ///< Numbers services. Guarded by queueMutex.
     EventService* services = nullptr;        ///< What threads serve now. Guarded by queueMutex.
     std::condition_variable serviceChanged;  ///< A service has ended or moved on.
     mutable std::mutex settingsMutex;

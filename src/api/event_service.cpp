@@ -24,6 +24,7 @@ bool IsQueued(const CameraContext& context, const QueueEntry& entry) {
 EventService::EventService(CameraContext& served, Kind servedKind)
     : context(served), kind(servedKind) {
     const std::lock_guard hold(context.queueMutex);
+    number = ++context.servicesBegun;
     next = context.services;
     context.services = this;
 }
@@ -82,10 +83,11 @@ void EventService::AwaitEarlierChanges() {
 }
 
 /// Under queueMutex.
-bool EventService::HasOthers(const CameraContext& context, Kind kind) {
+bool EventService::HasOthers(const CameraContext& context, Kind kind, std::uint64_t lastNumber) {
     const std::thread::id self = std::this_thread::get_id();
     for (const EventService* service = context.services; service; service = service->next) {
-        if (service->kind == kind && service->thread != self && !service->isReleased) return true;
+        const bool isMeant = service->kind == kind && service->number <= lastNumber;
+        if (isMeant && service->thread != self && !service->isReleased) return true;
     }
     return false;
 }
@@ -101,16 +103,17 @@ void ReleaseOwnServices(CameraContext& context) {
 
 void AwaitExposures(CameraContext& context) {
     std::unique_lock lock(context.queueMutex);
-    const auto isOver = [&] {
-        return !EventService::HasOthers(context, EventService::Kind::Exposure);
+    const auto isOver = [&, last = context.servicesBegun] {
+        return !EventService::HasOthers(context, EventService::Kind::Exposure, last);
     };
     (void)WaitForLimit(context.serviceChanged, lock, ExposureLimitMs, isOver);  // it goes on
 }
 
 void AwaitImages(CameraContext& context) {
     std::unique_lock lock(context.queueMutex);
-    context.serviceChanged.wait(
-        lock, [&] { return !EventService::HasOthers(context, EventService::Kind::Image); });
+    context.serviceChanged.wait(lock, [&, last = context.servicesBegun] {
+        return !EventService::HasOthers(context, EventService::Kind::Image, last);
+    });
 }
 
 }  // namespace ZV

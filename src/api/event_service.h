@@ -42,13 +42,14 @@ class EventService {
     friend void AwaitExposures(CameraContext& context);
     friend void AwaitImages(CameraContext& context);
 
-    static bool HasOthers(const CameraContext& context, Kind kind);
+    static bool HasOthers(const CameraContext& context, Kind kind, std::uint64_t lastNumber);
     bool IsChangeNext() const;
 
     CameraContext& context;
     const Kind kind;
     const std::thread::id thread = std::this_thread::get_id();
     // All below: guarded by queueMutex.
+    std::uint64_t number = 0;                 ///< Place among the context's services, from 1.
     const QueueEntry* calledEntry = nullptr;  ///< Its exposure callback is running.
     std::uint64_t changeTicket = 0;           ///< Place of the change in hand; 0 for none.
     bool isReleased = false;                  ///< Nobody waits for it any more.
@@ -58,10 +59,11 @@ class EventService {
 /// Lets nobody wait for what this very thread is serving: it is about to wait itself.
 void ReleaseOwnServices(CameraContext& context);
 
-/// Waits until no other thread serves the end of an exposure, or five seconds have passed.
+/// Waits until no other thread serves the end of an exposure that it had begun to serve before the
+/// call, or five seconds have passed.
 void AwaitExposures(CameraContext& context);
 
-/// Waits until no other thread serves an image.
+/// Waits until no other thread serves an image that it had begun to serve before the call.
 void AwaitImages(CameraContext& context);
 
 }  // namespace ZV

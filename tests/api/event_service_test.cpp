@@ -4,6 +4,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <memory>
 #include <optional>
 #include <thread>
 #include <utility>
@@ -175,6 +176,23 @@ TEST_F(Services, AnAbortWaitsForExposuresAndFiveSecondsAtMost) {
     AwaitExposures(context);
 
     SetWaitClockDivisor(1);
+}
+
+TEST_F(Services, AnAbortDoesNotWaitForExposuresThatBeginAfterIt) {
+    constexpr int Rounds = 20;
+    auto current = std::make_unique<Server>(context, EventService::Kind::Exposure);
+    Waiter abort([&] { AwaitExposures(context); });
+    bool hasEnded = abort.EndsSoon();
+    EXPECT_FALSE(hasEnded);
+
+    // At every moment some exposure is served, and each ends soon.
+    for (int round = 0; round < Rounds && !hasEnded; ++round) {
+        auto later = std::make_unique<Server>(context, EventService::Kind::Exposure);
+        current = std::move(later);
+        hasEnded = abort.EndsSoon();
+    }
+
+    EXPECT_TRUE(hasEnded);
 }
 
 TEST_F(Services, AnAbortWaitsNeitherForItselfNorForAnotherThatAborts) {
