@@ -65,7 +65,6 @@ ZentaraResult SetStreaming(const char* function, ZentaraHandle handle, std::uint
     ZCamera* const camera = FindCamera(handle);
     if (!IsOpen(camera)) return zerrBadHandle;
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
-    if (GetCameraContext(*camera) == nullptr) return zerrBadHandle;  // images have no taker
     return enable != 0 ? StartStreaming(function, *camera) : StopStreaming(function, *camera);
 }
 
@@ -76,7 +75,6 @@ ZentaraResult Trigger(const char* function, ZentaraHandle handle) {
     if (!IsOpen(camera)) return zerrBadHandle;
     if (!camera->IsCameraStreaming()) return zerrNotStreaming;
     if (!HasExclusiveAccess(function, camera)) return zerrBadHandle;
-    if (GetCameraContext(*camera) == nullptr) return zerrBadHandle;  // as above
     if (camera->GetTriggerMode() != ztrigSoftware) return zerrNotSupported;
     return TranslateCameraResult(camera->SoftwareTrigger());
 }

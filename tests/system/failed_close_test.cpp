@@ -39,23 +39,36 @@ class CameraThatCannotBeClosed : public OpenedCamera {
     }
 };
 
-TEST_F(CameraThatCannotBeClosed, IsNotStartedAgain) {
+TEST_F(CameraThatCannotBeClosed, AnswersAsItsStreamStands) {
     BreakDisconnect();
     ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
 
-    EXPECT_ZERR(zerrBadHandle, Zentara_SetStreaming(handle, 1));
-    EXPECT_ZERR(zerrBadHandle, Zentara_SetStreaming(handle, 0));
-    // A trigger asks for a stream first.
+    EXPECT_ZERR(zerrCameraBusy, Zentara_SetStreaming(handle, 1)) << "no bandwidth is given back";
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0)) << "off already";
     EXPECT_ZERR(zerrNotStreaming, Zentara_Trigger(handle));
     EXPECT_EQ(0u, world.GetState().attachedBuffers);
 }
 
-TEST_F(CameraThatCannotBeClosed, IsNotTriggeredWhileItStillStreams) {
+TEST_F(CameraThatCannotBeClosed, IsClosedAllTheSameWhenOnlyItsStreamCouldNotBeStopped) {
     BreakStop();
     ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
 
     EXPECT_ZERR(zerrBadHandle, Zentara_Trigger(handle));
     EXPECT_ZERR(zerrBadHandle, Zentara_SetStreaming(handle, 0));
+    EXPECT_EQ(0u, world.GetState().openHandles);
+}
+
+TEST_F(CameraThatCannotBeClosed, CanBeSwitchedOnAndOffAndDropsTheImagesOfItsStream) {
+    ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_FREE_RESOURCES"})"));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    const std::uint64_t before = world.GetState().framesSent;
+
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+
+    EXPECT_TRUE(WaitUntil([&] { return world.GetState().framesSent > before + 4; }));
+    EXPECT_ZERR(zerrNotSupported, Zentara_Trigger(handle)) << "not in the software mode";
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+    EXPECT_ZERR(zerrNotStreaming, Zentara_Trigger(handle));
 }
 
 TEST_F(CameraThatCannotBeClosed, TakesASecondCloseWhichTriesAgain) {
