@@ -98,8 +98,9 @@ HALStatus StartCallbackLoop(FWDeviceContext& context) {
 }
 
 bool SendListen(FWDeviceContext& context) {
+    // Without the mutex: the loop may be parsing a first frame by now, and wait in the camera for a
+    // lock that whoever starts the stream holds until this has returned.
     StreamSwitchRecord record = MakeStreamSwitchRecord(context.resourceHandle);
-    const MutexHold hold(context.streamMutex);
     return SendOverlapped(context.device, ControlRequest{FW_IOCTL_LISTEN, &record, sizeof record,
                                                          &record, sizeof record});
 }
