@@ -61,6 +61,16 @@ ZCamera::SerialNumberText ZCamera::CopySerialNumber() {
     return copy;
 }
 
+void ZCamera::BeginSettingsChange() {
+    const std::lock_guard hold(geometryMutex);
+    ++changesInProgress;
+}
+
+void ZCamera::EndSettingsChange() {
+    const std::lock_guard hold(geometryMutex);
+    if (--changesInProgress == 0) isGeometryPending = false;
+}
+
 CameraResult ZCamera::Initialize() {
     if (m_isToolboxInitialized) return CameraAlreadyInitialized;
     (void)HAL_Open();  // cannot fail

@@ -320,11 +320,6 @@ class ZENTARA_API ZCamera : public ZObject {
 
     // Control.
     virtual CameraResult UpdateSettingsOnCamera() = 0;
-    /// Around a batch of settings: between a change of the image's geometry and its commit frames
-    /// are dropped, since they still come with the former one. At the end of the batch they count
-    /// as they come again, also without a commit. Batches may be nested, and meet. Thread-safe.
-    virtual void BeginSettingsChange() = 0;
-    virtual void EndSettingsChange() = 0;
     virtual bool IsCameraStreaming() = 0;
     virtual CameraResult GetOneImage(ZExImage** image) = 0;
     virtual CameraResult StartStreamingImages(ImageCallback imageCallback,
@@ -342,6 +337,12 @@ class ZENTARA_API ZCamera : public ZObject {
     /// rewritten when another thread finds that the camera's registers have changed. Thread-safe.
     using SerialNumberText = std::array<char, 29>;
     SerialNumberText CopySerialNumber();
+
+    /// Around a batch of settings: between a change of the image's geometry and its commit frames
+    /// are dropped, since they still come with the former one. At the end of the batch they count
+    /// as they come again, also without a commit. Batches may be nested, and meet. Thread-safe.
+    void BeginSettingsChange();
+    void EndSettingsChange();
 
   private:
     virtual CameraResult SetupCamera() = 0;
@@ -364,6 +365,13 @@ class ZENTARA_API ZCamera : public ZObject {
     ZFolaryRatioCorrection* ratioCorrection = nullptr;
     Relaxed<bool> isOpen{false};
     Relaxed<bool> exclusiveAccess{false};
+    /// A write of the image's geometry is told apart from a take-over: it stands before it or
+    /// behind it. Held over their requests; nothing but the HAL's locks is taken under it.
+    std::mutex geometryMutex;
+    std::uint32_t changesInProgress = 0;  ///< Batches of settings. Guarded by geometryMutex.
+    /// A setter has changed the image's geometry. Until the take-over the camera sends images of
+    /// the geometry in force; a change that ends without one leaves frames to count as they come.
+    Relaxed<bool> isGeometryPending{false};
     std::mutex serialMutex;              ///< Leaf.
     std::array<char, 256> serialText{};  ///< Last serial number told. Guarded by serialMutex.
 

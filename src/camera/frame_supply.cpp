@@ -71,46 +71,36 @@ std::uint64_t MorvaneFWCamera::CalculateFrameBytes() {
 /// A frame made for an image that the camera does not send yet would come with the pixels of the
 /// former one.
 bool MorvaneFWCamera::IsGeometryInForce(const tStFrameInfo& frame) const {
-    if (!streaming.isGeometryPending) return true;
+    if (!isGeometryPending) return true;
     return PackGeometry(frame.width, frame.height, frame.bitDepth, frame.interlaced) ==
            streaming.geometryInForce;
 }
 
 /// Under `geometryMutex`.
 void MorvaneFWCamera::AnnounceNewGeometry() {
-    if (streaming.changesInProgress == 0 || streaming.isGeometryPending) return;
+    if (changesInProgress == 0 || isGeometryPending) return;
     streaming.geometryInForce =
         PackGeometry(GetImageWidth(), GetImageHeight(), GetBitDepth(), IsInterlaced());
-    streaming.isGeometryPending = true;
+    isGeometryPending = true;
 }
 
 CameraResult MorvaneFWCamera::WriteGeometry(std::uint32_t quadlet, std::uint32_t value) {
-    const std::lock_guard hold(streaming.geometryMutex);
+    const std::lock_guard hold(geometryMutex);
     AnnounceNewGeometry();
     return WriteControl(quadlet, value);
 }
 
 CameraResult MorvaneFWCamera::WriteGeometryField(const RegisterField& field, std::uint32_t value) {
-    const std::lock_guard hold(streaming.geometryMutex);
+    const std::lock_guard hold(geometryMutex);
     AnnounceNewGeometry();
     return WriteControlField(field, value);
 }
 
 HALStatus MorvaneFWCamera::TakeOverGeometry() {
-    const std::lock_guard hold(streaming.geometryMutex);
+    const std::lock_guard hold(geometryMutex);
     const HALStatus status = WriteCommand(CommandTakeOver, 1);
-    if (status == HALOk) streaming.isGeometryPending = false;
+    if (status == HALOk) isGeometryPending = false;
     return status;
-}
-
-void MorvaneFWCamera::BeginSettingsChange() {
-    const std::lock_guard hold(streaming.geometryMutex);
-    ++streaming.changesInProgress;
-}
-
-void MorvaneFWCamera::EndSettingsChange() {
-    const std::lock_guard hold(streaming.geometryMutex);
-    if (--streaming.changesInProgress == 0) streaming.isGeometryPending = false;
 }
 
 bool MorvaneFWCamera::ProvideBuffer(tStFrameInfo& frame) {

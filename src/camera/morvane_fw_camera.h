@@ -282,8 +282,6 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
 
     // Control.
     CameraResult UpdateSettingsOnCamera() override;
-    void BeginSettingsChange() override;
-    void EndSettingsChange() override;
     bool IsCameraStreaming() override;
     CameraResult GetOneImage(ZExImage** image) override;
     CameraResult StartStreamingImages(ImageCallback imageCallback,

@@ -80,13 +80,10 @@ struct StreamingState {
     ExternalBufferQueue externalBuffers;
     Relaxed<bool> bigEndian{false};  ///< Goes to each image; nothing ever sets it.
     Relaxed<bool> usesExternalBuffers{false};
-    Relaxed<bool> restartAfterUpdate{false};  ///< A setter has stopped a stream that is to go on.
-    Relaxed<bool> abortPending{false};        ///< The next frame request is refused.
-    /// A setter has changed the image's geometry. Until the take-over the camera sends images of
-    /// `geometryInForce`; a change that ends without one leaves frames to count as they come.
-    Relaxed<bool> isGeometryPending{false};
-    Relaxed<std::uint64_t> geometryInForce{0};
-    Relaxed<bool> configStale{false};  ///< MiscCtrl has changed what the camera reports.
+    Relaxed<bool> restartAfterUpdate{false};    ///< A setter has stopped a stream that is to go on.
+    Relaxed<bool> abortPending{false};          ///< The next frame request is refused.
+    Relaxed<std::uint64_t> geometryInForce{0};  ///< Of the images that the camera sends.
+    Relaxed<bool> configStale{false};           ///< MiscCtrl has changed what the camera reports.
     HALThread* runLoopThread = nullptr;
     HALThread* exposeDoneThread = nullptr;
     HALSemaphore* streamLock = nullptr;
@@ -97,10 +94,6 @@ struct StreamingState {
     /// One start or stop at a time, whoever calls: the stream layer takes them only one by one.
     /// Taken before `streamLock`, never by the bus thread.
     std::mutex switchMutex;
-    /// A write of the image's geometry is told apart from a take-over: it stands before it or
-    /// behind it. Held over their requests; nothing but the HAL's locks is taken under it.
-    std::mutex geometryMutex;
-    std::uint32_t changesInProgress = 0;  ///< Batches of settings. Guarded by geometryMutex.
 };
 
 }  // namespace ZV
