@@ -1,7 +1,10 @@
 // One register read and one write through the HAL. The counter `ratio` is their time over that of a
-// bare control request to a simulated driver of the same kind, measured in turns.
+// bare control request to a simulated driver of the same kind, measured in turns. All threads stay
+// on one processor: whether a simulated driver's thread answers beside the caller or from another
+// processor would else outweigh everything that is compared.
 
 #include <benchmark/benchmark.h>
+#include <sched.h>
 
 #include <algorithm>
 #include <chrono>
@@ -28,6 +31,24 @@ constexpr char Scenario[] = "mono";
 constexpr std::uint32_t PrimaryIdAddress = 0xE0010038;
 constexpr std::uint32_t SecondaryIdAddress = 0xE0001138;
 constexpr std::uint32_t RegisterAddress = 0xD0002010;
+
+/// Keeps this thread, and those that it makes, on one processor for the length of a block.
+class OneProcessor {
+  public:
+    OneProcessor() {
+        sched_getaffinity(0, sizeof former, &former);
+        cpu_set_t here;
+        CPU_ZERO(&here);
+        CPU_SET(sched_getcpu(), &here);
+        sched_setaffinity(0, sizeof here, &here);
+    }
+    ~OneProcessor() { sched_setaffinity(0, sizeof former, &former); }
+    OneProcessor(const OneProcessor&) = delete;
+    OneProcessor& operator=(const OneProcessor&) = delete;
+
+  private:
+    cpu_set_t former;
+};
 
 /// A camera of the library's own simulation, connected.
 class ConnectedCamera {
@@ -143,6 +164,7 @@ double GetMedian(std::vector<double> values) {
 
 void AccessRegister(benchmark::State& state, bool (ConnectedCamera::*access)(),
                     bool (BareDevice::*bareAccess)()) {
+    const OneProcessor processor;
     ConnectedCamera camera;
     BareDevice bare;
     bool isGood = camera.IsReady() && bare.IsReady();
