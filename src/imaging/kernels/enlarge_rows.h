@@ -1,0 +1,53 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+
+#include "imaging/kernels/row_kernels.h"
+
+namespace ZV {
+
+/// Positions of an enlarging in one direction, worked out in double precision by adding the step up
+/// once per output sample, in the shapes that the row loops read. `sampleBytes` (1 or 2) says what
+/// the linear plan's groups index. Without memory `IsMade` is false.
+class LinearPositions {
+  public:
+    LinearPositions() = default;
+    LinearPositions(std::int32_t sourceLength, std::int32_t outputLength, double factor,
+                    std::size_t sampleBytes);
+    [[nodiscard]] bool IsMade() const { return positions != nullptr; }
+    /// One entry per output sample; sample `index` + 1 lies inside the source.
+    [[nodiscard]] const LinearPosition& operator[](std::size_t output) const {
+        return positions[output];
+    }
+    [[nodiscard]] const LinearPlan& GetPlan() const { return plan; }
+
+  private:
+    std::unique_ptr<LinearPosition[]> positions;
+    std::unique_ptr<std::int32_t[]> bases;
+    std::unique_ptr<std::uint8_t[]> pairs;
+    std::unique_ptr<std::int16_t[]> weights;
+    LinearPlan plan;
+};
+
+class CubicPositions {
+  public:
+    CubicPositions() = default;
+    CubicPositions(std::int32_t sourceLength, std::int32_t outputLength, double factor);
+    [[nodiscard]] bool IsMade() const { return positions != nullptr; }
+    /// One entry per output sample; the four samples from `index` lie inside the source.
+    [[nodiscard]] const CubicPosition& operator[](std::size_t output) const {
+        return positions[output];
+    }
+    [[nodiscard]] const CubicPlan& GetPlan() const { return plan; }
+
+  private:
+    std::unique_ptr<CubicPosition[]> positions;
+    std::unique_ptr<std::int32_t[]> bases;
+    std::unique_ptr<std::int32_t[]> places;
+    std::unique_ptr<float[]> weights;
+    CubicPlan plan;
+};
+
+}  // namespace ZV
