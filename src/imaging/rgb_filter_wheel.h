@@ -1,6 +1,8 @@
 #pragma once
 
+#include <array>
 #include <atomic>
+#include <cstddef>
 #include <cstdint>
 
 #include "hal/hal.h"
@@ -10,15 +12,24 @@
 
 namespace ZV {
 
-/// Collects the three colours of a filter wheel into one image. `Process` declines until it is
-/// built.
+/// Collects three frames, one of each colour of a filter wheel, and packs them into one image.
 ///
-/// `Reset` may be called on any thread; formats and counts are read on any.
+/// `Process` runs on the streaming thread. `Reset`, `Enable` and `Disable` may be called on any
+/// thread; formats and counts are read on any.
 class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
   public:
     explicit ZRGBFilterWheel(std::uint16_t outputFormat);
     ~ZRGBFilterWheel() override;
 
+    /// Takes a frame into the plane of its filter colour, and packs the planes when each holds one.
+    ///
+    /// A set begins with the camera's start colour and goes on red, green, blue, red; a frame out
+    /// of turn is dropped and the set waits. In this order: 9 the semaphore cannot be had;
+    /// `FilterDeclined` the camera's wheel does not turn; `FilterNothingYet` out of turn (nothing
+    /// stored); `FilterNotInitialised` the frame is larger than the planes (nothing stored);
+    /// `FilterNothingYet` the set is not complete; `FilterFailed` the output format is none of 6 to
+    /// 12, or the image does not fit the output; 9 the semaphore cannot be given back. A set that
+    /// could not be packed stays as it is: the next frame in turn tries again.
     FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
     /// Stores the largest size and makes the planes if there are none. `FilterDone`.
     FilterResult Init(std::uint32_t width, std::uint32_t height) override;
@@ -33,25 +44,32 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
 
     std::uint32_t GetOutputFormat() const;
     bool IsStarted() const { return isStarted.load(std::memory_order_relaxed); }
-    std::uint16_t GetRedCount() const { return redCount.load(std::memory_order_relaxed); }
-    std::uint16_t GetGreenCount() const { return greenCount.load(std::memory_order_relaxed); }
-    std::uint16_t GetBlueCount() const { return blueCount.load(std::memory_order_relaxed); }
+    /// Frames taken in this set.
+    std::uint16_t GetRedCount() const { return GetCount(0); }
+    std::uint16_t GetGreenCount() const { return GetCount(1); }
+    std::uint16_t GetBlueCount() const { return GetCount(2); }
 
     /// Makes three planes of 16-bit samples if there are none.
     void AllocateBuffers(std::uint32_t width, std::uint32_t height);
     void FreeBuffers();
 
   private:
-    bool WouldComplete(std::uint32_t filterColour) const;
+    struct Shot {
+        PixelBuffer plane;
+        std::atomic<std::uint16_t> count{0};
+    };
+
+    std::uint16_t GetCount(std::size_t place) const;
+    bool IsInTurn(const ZInImageBufferStruct& in);
+    FilterResult Collect(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out);
+    FilterResult Store(const ZInImageBufferStruct& in);
+    FilterResult Pack(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out) const;
+    void DropSet();
 
     std::atomic<std::uint32_t> outputFormat;
-    std::atomic<bool> isStarted{false};  // guarded by semaphore, as are the counts and planes
-    std::atomic<std::uint16_t> redCount{0};
-    std::atomic<std::uint16_t> greenCount{0};
-    std::atomic<std::uint16_t> blueCount{0};
-    PixelBuffer redPlane;
-    PixelBuffer greenPlane;
-    PixelBuffer bluePlane;
+    std::atomic<bool> isStarted{false};  // guarded by semaphore, as is all below
+    std::uint16_t nextColour = 0;
+    std::array<Shot, 3> shots;  // Red, green, blue.
     bool buffersAllocated = false;
     HALSemaphore* semaphore = nullptr;
     std::uint32_t widthMax = 0;
