@@ -806,6 +806,54 @@ ZENTARA_API ZentaraResult Zentara_ProcessRaw(ZentaraHandle handle, Zentara_Frame
 /** Accepted and ignored. 8 not loaded; else 1. */
 ZENTARA_API ZentaraResult Zentara_SetFrameBuffers(ZentaraHandle handle, Zentara_Frame* frame);
 
+/* ---- White balance and exposure: take images of their own ----
+ *
+ * Both run on the caller's thread, wait for each image as Zentara_GrabFrame does (Zentara_Abort
+ * from another thread ends the wait) and go over the bus. Do not stream meanwhile, and let no other
+ * call take or process images of the same camera. The region is in pixels of the image; its width
+ * and height are cut to the image's, `x` and `y` are not looked at: a row that is too long goes on
+ * in the row below, and what lies beyond the image counts as black. At the end the block goes to
+ * the camera as by Zentara_SendSettingsToCam, whose result is not looked at, so `settings` should
+ * be what the camera was last sent.
+ */
+
+/**
+ * Finds the red and blue gains that make the mean of a region grey, and writes them, with a green
+ * gain of 1000, to zprmPostProcessGainRed, -Green and -Blue of `settings`. Up to 6 images are
+ * taken, until the mean of each colour lies in the middle of its range: 80 to 199 with 8 bits,
+ * 20560 to 51400 with more. It is no failure when that does not come to pass. With a filter wheel
+ * the exposures are balanced too and written to the block. A colour of mean 0 makes gains of no
+ * use.
+ *
+ * A gain is a scale times 1000, truncated twice on its way to the camera and back: what
+ * Zentara_ReadSettingsFromCam tells may be one less.
+ *
+ * 8 not loaded; 2 `settings` null; 3 no magic number, or the camera of the block is not open; 32
+ * `width` or `height` 0, or both below 16 (one alone may be); 0 at once, without an image, when
+ * zprmPostProcessImageFormat is not a format of colour (Zentara_isColor); a camera's failure (15,
+ * 16 or 30); 16 for an image without three colours, such as a mosaic that the format in force does
+ * not resolve; the failure of Zentara_SetParam or Zentara_SetParam64.
+ */
+ZENTARA_API ZentaraResult Zentara_WhiteBalance(Zentara_Settings* settings, uint32_t x, uint32_t y,
+                                               uint32_t width, uint32_t height);
+
+/**
+ * Finds an exposure at which the brightest sample of a region lies near full scale, and writes it
+ * to zprm64Exposure of `settings`, with the exposures of a filter wheel to zprm64ExposureRed and
+ * zprm64ExposureBlue. Up to 10 images of 8 bits are taken; each moves the exposure by a factor of 4
+ * at most, within the camera's limits, until it moves by no more than a tenth. A wheel that cycles
+ * is held at green meanwhile.
+ *
+ * A camera that fails meanwhile does not fail the call: the exposure that it has then is written
+ * and sent.
+ *
+ * 8 not loaded; 2 `settings` null; 3 no magic number, or the camera of the block is not open; 32
+ * `width` or `height` 0, or both below 16 (one alone may be); the failure of Zentara_SetParam64 of
+ * zprm64Exposure.
+ */
+ZENTARA_API ZentaraResult Zentara_AutoExpose(Zentara_Settings* settings, uint32_t x, uint32_t y,
+                                             uint32_t width, uint32_t height);
+
 /* ---- Image helpers: need no loaded library, reentrant ---- */
 
 /** 1 if samples of `format` have 16 bits (1, 3, 5, 7, 10), else 0. */
