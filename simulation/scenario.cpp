@@ -25,6 +25,8 @@ void AddMono(Scenario* scenario) {
 
 void AddColour(Scenario* scenario) {
     scenario->cameras.push_back(MakeNamed("PellanA1"));
+    // The first exposure shows all patches of the chart: its white stays below the full well.
+    scenario->cameras.back().scene.brightness = 4e5;
 }
 
 void AddWheel(Scenario* scenario) {
