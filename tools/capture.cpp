@@ -4,7 +4,9 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <array>
 #include <ctime>
+#include <utility>
 
 #include "models/sensor_table.h"
 
@@ -14,6 +16,7 @@ namespace {
 constexpr double NanosecondsPerSecond = 1e9;
 constexpr double MillionthsPerDecibel = 1e6;
 constexpr double NanometresPerMicrometre = 1000;
+constexpr double ScaleUnit = 1000;
 
 std::string GetSoftwareName() {
     std::uint16_t major = 0, minor = 0, build = 0;
@@ -22,11 +25,20 @@ std::string GetSoftwareName() {
     return fmt::format("Zentara {}.{}.{}", major, minor, build);
 }
 
-/// Post-processing may make more bytes of an image, and the buffer must hold either.
-std::size_t GetImageBytes(const Camera& camera, bool isPostProcessed) {
-    const std::uint32_t plain = camera.GetInfo(zinfImageSize).value_or(0);
-    if (!isPostProcessed) return plain;
-    return std::max(plain, camera.GetInfo(zinfPostProcessImageSize).value_or(0));
+/// Post-processing and a filter wheel may make more bytes of an image, and the buffer must hold
+/// either.
+std::size_t GetImageBytes(const Camera& camera, const SettingsBlock& settings) {
+    const auto read = [&](std::uint32_t key) {
+        return static_cast<std::uint32_t>(
+            settings.Get(GetSetting(ParameterFamily::Word, key)).value_or(0));
+    };
+    const std::uint64_t plain = camera.GetInfo(zinfImageSize).value_or(0);
+    const std::uint64_t wheel =
+        Zentara_CalcImageSize(read(zprmImageFormat), camera.GetInfo(zinfImageWidth).value_or(0),
+                              camera.GetInfo(zinfImageHeight).value_or(0));
+    const std::uint64_t processed =
+        read(zprmDoPostProcessing) != 0 ? camera.GetInfo(zinfPostProcessImageSize).value_or(0) : 0;
+    return std::max({plain, wheel, processed});
 }
 
 }  // namespace
@@ -46,7 +58,7 @@ CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings
         return static_cast<std::uint32_t>(read(ParameterFamily::Word, key));
     };
     CaptureFacts facts;
-    facts.imageBytes = GetImageBytes(camera, readWord(zprmDoPostProcessing) != 0);
+    facts.imageBytes = GetImageBytes(camera, settings);
     facts.exposureNs = static_cast<std::uint64_t>(read(ParameterFamily::Wide, zprm64Exposure));
     facts.isSoftwareTriggered = readWord(zprmTriggerType) == ztrigSoftware;
     const bool isSplit = camera.GetInfo(zinfAsymmetricalBinning).value_or(0) != 0;
@@ -69,31 +81,44 @@ CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings
     image.coolingTargetCelsius =
         settings.Get(GetSetting(ParameterFamily::Signed, zprmS32RegulatedCoolingTemp));
     image.isPostProcessed = readWord(zprmDoPostProcessing) != 0;
+    constexpr std::array ScaleKeys{zprmPostProcessGainRed, zprmPostProcessGainGreen,
+                                   zprmPostProcessGainBlue};
+    for (std::size_t i = 0; i < ScaleKeys.size(); ++i)
+        image.scales[i] = readWord(ScaleKeys[i]) / ScaleUnit;
     image.pixelSizeMicrometres =
         ZV::GetSensorPixelSize(camera.GetInfo(zinfCcd).value_or(0)) / NanometresPerMicrometre;
     return facts;
 }
 
 bool IsWritable(const Zentara_Frame& frame) {
-    return Zentara_is3Color(frame.format) == 0 && frame.width > 0 && frame.height > 0;
+    return FindPixelFormat(frame.format) != nullptr && frame.width > 0 && frame.height > 0;
+}
+
+void TakeFrame(const Zentara_Frame& frame, std::vector<std::uint8_t> pixels, Image* image) {
+    const PixelFormat& layout = *FindPixelFormat(frame.format);
+    image->layout = &layout;
+    image->width = frame.width;
+    image->height = frame.height;
+    image->bits = frame.bits;
+    const std::uint64_t samples =
+        std::uint64_t{frame.width} * frame.height * layout.samplesPerPixel;
+    image->bytesPerSample = layout.bytesPerSample;
+    // Who asks for raw data is told raw, whatever the samples are.
+    if (!layout.IsThreeColour()) image->bytesPerSample = frame.size >= 2 * samples ? 2 : 1;
+    image->pixels = std::move(pixels);
+    image->pixels.resize(samples * image->bytesPerSample);
+    image->format = FormatValue(GetSetting(ParameterFamily::Word, zprmImageFormat), frame.format);
+    image->isBayer = Zentara_isBayer(frame.format) != 0;
+    image->bayerPattern = frame.bayerPattern;
+    image->frameNumber = frame.frameNumber;
+    image->frameError = frame.errorCode;
+    image->words = {frame.privateBinning, frame.privateRealTime, frame.privatePattern};
 }
 
 Image MakeImage(const CaptureFacts& facts, const FrameBuffer& buffer,
                 std::chrono::system_clock::time_point begin) {
-    const Zentara_Frame& frame = buffer.frame;
     Image image = facts.prototype;
-    image.width = frame.width;
-    image.height = frame.height;
-    image.bits = frame.bits;
-    const std::uint64_t pixels = std::uint64_t{frame.width} * frame.height;
-    image.bytesPerSample = frame.size >= 2 * pixels ? 2 : 1;
-    image.pixels = buffer.pixels;
-    image.pixels.resize(pixels * image.bytesPerSample);
-    image.format = FormatValue(GetSetting(ParameterFamily::Word, zprmImageFormat), frame.format);
-    image.isBayer = Zentara_isBayer(frame.format) != 0;
-    image.bayerPattern = frame.bayerPattern;
-    image.frameNumber = frame.frameNumber;
-    image.frameError = frame.errorCode;
+    TakeFrame(buffer.frame, buffer.pixels, &image);
     image.dateObs = FormatUtc(begin);
     return image;
 }

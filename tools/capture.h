@@ -29,11 +29,14 @@ struct CaptureFacts {
 /// From an open camera and the block of the settings in force.
 CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings);
 
-/// True for a format with one sample a pixel, which the writers take.
+/// True for a frame with pixels in a format that has a number.
 bool IsWritable(const Zentara_Frame& frame);
 
-/// The image of a delivered frame whose exposure began at `begin`. Takes the pixels out of
-/// `buffer`.
+/// Makes `pixels` and what the record of their frame says part of an image. The frame is writable;
+/// what is missing of its pixels becomes 0.
+void TakeFrame(const Zentara_Frame& frame, std::vector<std::uint8_t> pixels, Image* image);
+
+/// The image of a delivered frame whose exposure began at `begin`.
 Image MakeImage(const CaptureFacts& facts, const FrameBuffer& buffer,
                 std::chrono::system_clock::time_point begin);
 

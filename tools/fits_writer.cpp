@@ -2,13 +2,14 @@
 
 #include <array>
 #include <string>
+#include <vector>
 
+#include "fits_names.h"
+#include "image_samples.h"
 #include "image_writers.h"
 
 namespace ZentaraProgram {
 namespace {
-
-constexpr std::array<const char*, 4> BayerNames{"RGGB", "GRBG", "GBRG", "BGGR"};
 
 std::string DescribeFitsStatus(int status) {
     std::array<char, FLEN_STATUS> text{};
@@ -43,6 +44,17 @@ class HeaderWriter {
     int* status;
 };
 
+/// What `zentara process` needs to finish a frame later.
+void WriteFrameWords(HeaderWriter& header, const Image& image) {
+    header.Number("PIXFORM", image.layout->format, "Format of the frame, by its number");
+    header.Number("FRMBIN", image.words.binning, "Binning mode of the frame, by its code");
+    header.Truth("FRMRTV", image.words.realTime != 0, "Frame of the real-time mode");
+    header.Number("FRMPATT", image.words.pattern, "Colour pattern of the frame, by its code");
+    for (std::size_t colour = 0; colour < ColourCount; ++colour)
+        header.Decimal(FitsScaleKeys[colour], image.scales[colour], -15,
+                       "Scale of post-processing");
+}
+
 void WriteHeader(fitsfile* file, const Image& image, int* status) {
     HeaderWriter header(file, status);
     header.Text("DATE-OBS", image.dateObs, "Begin of the exposure, UTC");
@@ -67,7 +79,8 @@ void WriteHeader(fitsfile* file, const Image& image, int* status) {
     header.Text("IMGFORM", image.format, "Format of the samples");
     header.Truth("POSTPROC", image.isPostProcessed, "Post-processed by the library");
     if (image.isBayer)
-        header.Text("BAYERPAT", BayerNames[image.bayerPattern & 3U], "Mosaic of the first pixel");
+        header.Text("BAYERPAT", std::string(FitsBayerNames[image.bayerPattern & 3U]),
+                    "Mosaic of the first pixel");
     header.Text("ROWORDER", "TOP-DOWN", "The first row is the top of the image");
     header.Text("INSTRUME", image.model, "Camera model");
     header.Text("SERIALNO", image.serialNumber, "Camera serial number");
@@ -75,6 +88,7 @@ void WriteHeader(fitsfile* file, const Image& image, int* status) {
     header.Number("BITDEPTH", image.bits, "[bit] Depth of a sample");
     header.Number("FRAMENUM", image.frameNumber, "Number of the frame, counted by the camera");
     header.Number("FRAMEERR", image.frameError, "Error code of the frame, 0 is good");
+    WriteFrameWords(header, image);
     fits_write_date(file, status);
 }
 
@@ -91,14 +105,14 @@ std::string WriteFits(const std::string& path, const Image& image) {
         return reason;
     }
     const bool isDeep = image.bytesPerSample == 2;
-    std::array<LONGLONG, 2> size{image.width, image.height};
-    fits_create_imgll(file, isDeep ? USHORT_IMG : BYTE_IMG, 2, size.data(), &status);
+    std::array<LONGLONG, 3> size{image.width, image.height, image.GetChannels()};
+    fits_create_imgll(file, isDeep ? USHORT_IMG : BYTE_IMG, image.GetChannels() > 1 ? 3 : 2,
+                      size.data(), &status);
     WriteHeader(file, image, &status);
+    std::vector<std::uint8_t> scratch;
     // cfitsio does not write to its argument, although it takes a pointer to non-const.
-    auto* pixels = const_cast<std::uint8_t*>(image.pixels.data());
-    fits_write_img(file, isDeep ? TUSHORT : TBYTE, 1,
-                   static_cast<LONGLONG>(image.width) * static_cast<LONGLONG>(image.height), pixels,
-                   &status);
+    auto* pixels = const_cast<std::uint8_t*>(GetPlaneSamples(image, &scratch).data());
+    fits_write_img(file, isDeep ? TUSHORT : TBYTE, 1, size[0] * size[1] * size[2], pixels, &status);
     fits_write_chksum(file, &status);
     int closeStatus = 0;
     fits_close_file(file, &closeStatus);

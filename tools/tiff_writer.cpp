@@ -3,20 +3,28 @@
 #include <algorithm>
 #include <cerrno>
 #include <string>
+#include <vector>
 
+#include "image_samples.h"
 #include "image_writers.h"
 
 namespace ZentaraProgram {
 namespace {
 
-constexpr std::uint32_t StripBytes = 1U << 20;
+constexpr std::size_t StripBytes = std::size_t{1} << 20;
+
+std::size_t GetRowBytes(const Image& image) {
+    return std::size_t{image.width} * image.GetChannels() * image.bytesPerSample;
+}
 
 void SetTags(TIFF* file, const Image& image, std::uint32_t rowsPerStrip) {
+    const std::uint32_t channels = image.GetChannels();
     TIFFSetField(file, TIFFTAG_IMAGEWIDTH, image.width);
     TIFFSetField(file, TIFFTAG_IMAGELENGTH, image.height);
     TIFFSetField(file, TIFFTAG_BITSPERSAMPLE, static_cast<int>(8 * image.bytesPerSample));
-    TIFFSetField(file, TIFFTAG_SAMPLESPERPIXEL, 1);
-    TIFFSetField(file, TIFFTAG_PHOTOMETRIC, PHOTOMETRIC_MINISBLACK);
+    TIFFSetField(file, TIFFTAG_SAMPLESPERPIXEL, static_cast<int>(channels));
+    TIFFSetField(file, TIFFTAG_PHOTOMETRIC,
+                 channels > 1 ? PHOTOMETRIC_RGB : PHOTOMETRIC_MINISBLACK);
     TIFFSetField(file, TIFFTAG_PLANARCONFIG, PLANARCONFIG_CONTIG);
     TIFFSetField(file, TIFFTAG_COMPRESSION, COMPRESSION_NONE);
     TIFFSetField(file, TIFFTAG_ROWSPERSTRIP, rowsPerStrip);
@@ -25,9 +33,10 @@ void SetTags(TIFF* file, const Image& image, std::uint32_t rowsPerStrip) {
 }
 
 bool WriteStrips(TIFF* file, const Image& image, std::uint32_t rowsPerStrip) {
-    const std::size_t rowBytes = std::size_t{image.width} * image.bytesPerSample;
+    const std::size_t rowBytes = GetRowBytes(image);
+    std::vector<std::uint8_t> scratch;
     // libtiff does not write to its argument, although it takes a pointer to non-const.
-    auto* pixels = const_cast<std::uint8_t*>(image.pixels.data());
+    auto* pixels = const_cast<std::uint8_t*>(GetPixelSamples(image, &scratch).data());
     for (std::uint32_t row = 0, strip = 0; row < image.height; row += rowsPerStrip, ++strip) {
         const std::size_t bytes = rowBytes * std::min(rowsPerStrip, image.height - row);
         if (TIFFWriteEncodedStrip(file, strip, pixels + rowBytes * row,
@@ -46,8 +55,9 @@ std::string WriteTiff(const std::string& path, const Image& image) {
     errno = 0;
     TIFF* file = TIFFOpen(path.c_str(), "w");
     if (file == nullptr) return DescribeFileFailure();
-    const std::uint32_t rowBytes = std::max(1U, image.width * image.bytesPerSample);
-    const std::uint32_t rowsPerStrip = std::max(1U, StripBytes / rowBytes);
+    const std::size_t rowBytes = std::max<std::size_t>(1, GetRowBytes(image));
+    const auto rowsPerStrip =
+        static_cast<std::uint32_t>(std::max<std::size_t>(1, StripBytes / rowBytes));
     SetTags(file, image, rowsPerStrip);
     const bool isWritten = WriteStrips(file, image, rowsPerStrip) && TIFFFlush(file) == 1;
     TIFFClose(file);
