@@ -33,6 +33,13 @@ struct StreamOptions {
     bool isQuiet = false;
 };
 
+struct HistogramOptions {
+    std::string source;   ///< Number of a camera, or a file.
+    std::string picture;  ///< File for a picture, or empty.
+    SettingsOptions settings;
+    double timeoutSeconds = 60;
+};
+
 ExitCode RunList(const CommonOptions& common);
 /// Without keys: all that there is.
 ExitCode RunInfo(const CommonOptions& common, const std::vector<std::string>& keys);
@@ -47,5 +54,6 @@ ExitCode RunSave(const CommonOptions& common, const std::string& file,
                  const SettingsOptions& options);
 ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options);
 ExitCode RunStream(const CommonOptions& common, const StreamOptions& options);
+ExitCode RunHistogram(const CommonOptions& common, const HistogramOptions& options);
 
 }  // namespace ZentaraProgram

@@ -34,6 +34,7 @@ struct Arguments {
     CommonOptions common;
     GrabOptions grab;
     StreamOptions stream;
+    HistogramOptions histogram;
     SettingsOptions settings;
     std::string file;
     std::vector<std::string> words;  ///< Keys or assignments, with the camera's number before them.
@@ -64,6 +65,22 @@ void AddSettings(CLI::App* command, SettingsOptions* settings) {
     command->add_option("--load", settings->file, "File of settings to send first");
     command->add_option("--set", settings->assignments, "KEY=VALUE, as often as needed")
         ->allow_extra_args(false);
+}
+
+void AddColour(CLI::App* command, ColourOptions* colour) {
+    command->add_flag("--colour,--color", colour->isColour,
+                      "Three colours, made and balanced by post-processing");
+    command->add_option(
+        "--format", colour->format,
+        "Format of the images: rgb24, rgb48, bgr24, rgb-planes, bayer8, mono16 ...");
+    command->add_option("--bayer", colour->algorithm,
+                        "How a mosaic becomes colours: average, fast or bicubic");
+}
+
+void AddTimeout(CLI::App* command, double* seconds, const char* meaning) {
+    command->add_option("--timeout", *seconds, meaning)
+        ->default_val(60)
+        ->check(CLI::Range(0.001, 1e6));
 }
 
 void AddQuestions(CLI::App& app, Arguments* arguments) {
@@ -106,10 +123,8 @@ void AddGrab(CLI::App& app, Arguments* arguments) {
     AddCamera(grab, &arguments->common);
     grab->add_option("-o,--output", arguments->grab.output, "File: .fits, .tiff, .png or .raw")
         ->required();
-    grab->add_option("--timeout", arguments->grab.timeoutSeconds,
-                     "Longest wait for the image, seconds")
-        ->default_val(60)
-        ->check(CLI::Range(0.001, 1e6));
+    AddTimeout(grab, &arguments->grab.timeoutSeconds, "Longest wait for the image, seconds");
+    AddColour(grab, &arguments->grab.settings.colour);
     AddSettings(grab, &arguments->grab.settings);
     grab->footer(SettingsNote);
 }
@@ -124,15 +139,28 @@ void AddStream(CLI::App& app, Arguments* arguments) {
         ->check(CLI::PositiveNumber);
     stream->add_option("-o,--output", options->output,
                        "Numbered files: night.fits gives night-000001.fits ...");
-    stream->add_option("--timeout", options->timeoutSeconds, "Longest wait for a frame, seconds")
-        ->default_val(60)
-        ->check(CLI::Range(0.001, 1e6));
+    AddTimeout(stream, &options->timeoutSeconds, "Longest wait for a frame, seconds");
     stream->add_option("--buffers", options->buffers, "Frames queued at once")
         ->default_val(8)
         ->check(CLI::Range(1, 100));
     stream->add_flag("-q,--quiet", options->isQuiet, "No progress");
+    AddColour(stream, &options->settings.colour);
     AddSettings(stream, &options->settings);
     stream->footer(SettingsNote);
+}
+
+void AddHistogram(CLI::App& app, Arguments* arguments) {
+    HistogramOptions* options = &arguments->histogram;
+    CLI::App* histogram =
+        app.add_subcommand("histogram", "Show how often each value stands in an image");
+    AddCommon(histogram, &arguments->common);
+    histogram->add_option("source", options->source, "Number of a camera, or a FITS file")
+        ->default_val("0");
+    histogram->add_option("--png", options->picture, "Draw it into a file as well");
+    AddTimeout(histogram, &options->timeoutSeconds, "Longest wait for the image, seconds");
+    AddColour(histogram, &options->settings.colour);
+    AddSettings(histogram, &options->settings);
+    histogram->footer("The bars are logarithmic: a bin of one sample still shows.");
 }
 
 bool IsNumber(const std::string& text) {
@@ -153,7 +181,7 @@ bool TakeCamera(Arguments* arguments) {
 }
 
 ExitCode RunSetOfWords(const Arguments& arguments) {
-    if (!arguments.words.empty()) return RunSet(arguments.common, {{}, arguments.words});
+    if (!arguments.words.empty()) return RunSet(arguments.common, {{}, arguments.words, {}});
     PrintError("there is nothing to set; KEY=VALUE is wanted");
     return ExitWrongUse;
 }
@@ -176,9 +204,10 @@ const std::vector<CommandRow>& GetCommands() {
          [](const Arguments& a) { return RunSave(a.common, a.file, a.settings); }},
         {{"settings", "load"},
          [](const Arguments& a) {
-             return RunSet(a.common, {a.file, {}});
+             return RunSet(a.common, {a.file, {}, {}});
          }},
         {{"grab"}, [](const Arguments& a) { return RunGrab(a.common, a.grab); }},
+        {{"histogram"}, [](const Arguments& a) { return RunHistogram(a.common, a.histogram); }},
         {{"stream"}, [](const Arguments& a) { return RunStream(a.common, a.stream); }},
     };
     return commands;
@@ -229,6 +258,7 @@ ExitCode Run(int count, char** values) {
     AddSettingsFiles(app, &arguments);
     AddGrab(app, &arguments);
     AddStream(app, &arguments);
+    AddHistogram(app, &arguments);
     try {
         app.parse(count, values);
     } catch (const CLI::Success& success) {

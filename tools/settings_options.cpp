@@ -64,6 +64,8 @@ ExitCode ReadEdits(const SettingsOptions& options, std::vector<SettingEdit>* edi
             problems.push_back(problem);
         }
     }
+    const std::string colour = FindColourProblem(options.colour);
+    if (!colour.empty()) problems.push_back(colour);
     return TellProblems(problems);
 }
 
@@ -81,12 +83,15 @@ namespace {
 
 /// Reads the settings of the camera, makes the edits and sends them. `result` is the code of a call
 /// that failed.
-ExitCode SendEdits(const Camera& camera, SentSettings* settings, ZentaraResult* result) {
+ExitCode SendEdits(const Camera& camera, const ColourOptions& colour, SentSettings* settings,
+                   ZentaraResult* result) {
     *result = settings->before.Read(camera);
     if (*result != zerrNone) {
         PrintError("the settings cannot be read: " + DescribeResult(*result));
         return GetExitCode(*result);
     }
+    const std::string problem = AddColourEdits(camera, settings->before, colour, &settings->edits);
+    if (!problem.empty()) return TellProblems({problem});
     settings->asked = settings->before;
     const ExitCode applied = ApplyEdits(camera, settings->edits, &settings->asked);
     settings->sent = settings->asked;
@@ -106,7 +111,7 @@ ExitCode OpenWithSettings(std::uint32_t cameraId, const SettingsOptions& options
     const ExitCode opened = session->Open(cameraId);
     if (opened != ExitDone) return opened;
     ZentaraResult result = zerrNone;
-    const ExitCode sent = SendEdits(session->GetCamera(), settings, &result);
+    const ExitCode sent = SendEdits(session->GetCamera(), options.colour, settings, &result);
     return result == zerrNone ? sent : session->Judge(result);
 }
 

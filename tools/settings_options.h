@@ -3,15 +3,18 @@
 #include <string>
 #include <vector>
 
+#include "colour_options.h"
 #include "exit_codes.h"
 #include "settings_file.h"
 
 namespace ZentaraProgram {
 
-/// Settings that a command line asks for: those of a file, then those of --set.
+/// Settings that a command line asks for: those of a file, then those of --set, then those that
+/// --colour and its like stand for.
 struct SettingsOptions {
     std::string file;
     std::vector<std::string> assignments;  ///< "exposure=250ms"
+    ColourOptions colour;
 };
 
 /// Checks all that can be checked without a camera; says on standard error what is wrong.

@@ -57,7 +57,8 @@ TEST(Program, HelpIsPrintedOnStandardOutputAndSucceeds) {
                                                       {"settings", "save", "--help"},
                                                       {"settings", "load", "--help"},
                                                       {"grab", "--help"},
-                                                      {"stream", "--help"}}) {
+                                                      {"stream", "--help"},
+                                                      {"histogram", "--help"}}) {
         const ProgramResult result = RunProgram(arguments);
 
         EXPECT_EQ(0, result.exitCode);
