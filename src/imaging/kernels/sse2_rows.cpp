@@ -17,7 +17,6 @@ constexpr std::size_t VectorBytes = 16;
 constexpr std::size_t VectorWords = 8;
 constexpr std::size_t VectorFloats = 4;
 constexpr std::size_t GroupOutputs = 8;
-
 constexpr std::int32_t WeightOne = 16384;
 
 inline __m128i Load(const void* from) {
@@ -89,15 +88,21 @@ inline void StoreTriple(Sample* to, const Triple& value) {
     Store(to + 2 * step, value.c);
 }
 
+template <std::size_t Planes, typename Sample>
+inline void PackOneByOne(const Sample* const* planes, Sample* pixels, std::size_t i,
+                         std::size_t count) {
+    for (; i < count; ++i) {
+        for (std::size_t c = 0; c < Planes; ++c) pixels[Planes * i + c] = planes[c][i];
+    }
+}
+
 void Pack8x3(const std::uint8_t* const planes[3], std::uint8_t* pixels, std::size_t count) {
     std::size_t i = 0;
     for (; i + VectorBytes <= count; i += VectorBytes) {
         const Triple samples = {Load(planes[0] + i), Load(planes[1] + i), Load(planes[2] + i)};
         StoreTriple(pixels + 3 * i, InterleaveDwords(PairWords(PairBytes(samples))));
     }
-    for (; i < count; ++i) {
-        for (std::size_t c = 0; c < 3; ++c) pixels[3 * i + c] = planes[c][i];
-    }
+    PackOneByOne<3>(planes, pixels, i, count);
 }
 
 void Pack16x3(const Word* const planes[3], Word* pixels, std::size_t count) {
@@ -106,9 +111,7 @@ void Pack16x3(const Word* const planes[3], Word* pixels, std::size_t count) {
         const Triple samples = {Load(planes[0] + i), Load(planes[1] + i), Load(planes[2] + i)};
         StoreTriple(pixels + 3 * i, InterleaveDwords(PairWords(samples)));
     }
-    for (; i < count; ++i) {
-        for (std::size_t c = 0; c < 3; ++c) pixels[3 * i + c] = planes[c][i];
-    }
+    PackOneByOne<3>(planes, pixels, i, count);
 }
 
 // Linear rows. Samples of 16 bits are made signed for the multiplication by 32768 less, which the
@@ -294,13 +297,16 @@ void CubicRow(const Sample* row, const CubicPlan& plan, float* output) {
     }
 }
 
-/// Four samples of a column pass, cut to whole numbers.
+/// Of 0.5000001, added in double precision, a fraction from 0.4999999 upward makes a whole number;
+/// of those that single precision has, this is the least.
+constexpr float LeastFractionUp = 0x1.FFFFFAp-2F;
+
+/// Four samples of a column pass: 0.5000001 added, the fraction cut off.
 inline __m128i RoundSingles(__m128 values) {
-    const __m128d half = _mm_set1_pd(0.5000001);
-    const __m128d low = _mm_cvtps_pd(values);
-    const __m128d high = _mm_cvtps_pd(_mm_movehl_ps(values, values));
-    return _mm_unpacklo_epi64(_mm_cvttpd_epi32(_mm_add_pd(low, half)),
-                              _mm_cvttpd_epi32(_mm_add_pd(high, half)));
+    const __m128i whole = _mm_cvttps_epi32(values);
+    const __m128 fraction = _mm_sub_ps(values, _mm_cvtepi32_ps(whole));
+    const __m128 isUp = _mm_cmpge_ps(fraction, _mm_set1_ps(LeastFractionUp));
+    return _mm_sub_epi32(whole, _mm_castps_si128(isUp));
 }
 
 inline __m128i MixCubic(const float* const rows[4], std::size_t i, const CubicWeights& weights) {
@@ -315,30 +321,19 @@ inline __m128i MixCubic(const float* const rows[4], std::size_t i, const CubicWe
                                  _mm_set1_ps(weights.second), _mm_set1_ps(weights.third)));
 }
 
+/// Eight samples, held within the range of signed words.
+inline __m128i MixCubicWords(const float* const rows[4], std::size_t i,
+                             const CubicWeights& weights) {
+    const __m128i low = MixCubic(rows, i, weights);
+    return _mm_packs_epi32(low, MixCubic(rows, i + VectorFloats, weights));
+}
+
 /// The sample at `i`, which need not be followed by others.
 inline std::int32_t MixCubicOnce(const float* const rows[4], std::size_t i,
                                  const CubicWeights& weights, std::int32_t greatest) {
     const float sum = SumTerms(rows[0][i], rows[1][i], rows[2][i], rows[3][i], weights);
     const std::int32_t whole = _mm_cvttsd_si32(_mm_set_sd(static_cast<double>(sum) + 0.5000001));
-    if (whole < 0) return 0;
-    return whole > greatest ? greatest : whole;
-}
-
-/// Words from numbers of 32 bits, held within 0 to 65535.
-inline __m128i PackUnsigned(__m128i low, __m128i high) {
-    const __m128i middle = _mm_set1_epi32(32768);
-    return FlipWords(_mm_packs_epi32(_mm_sub_epi32(low, middle), _mm_sub_epi32(high, middle)));
-}
-
-// Words of one channel out of two vectors.
-
-inline __m128i TakeEvenWords(__m128i low, __m128i high) {
-    return _mm_packs_epi32(_mm_srai_epi32(_mm_slli_epi32(low, 16), 16),
-                           _mm_srai_epi32(_mm_slli_epi32(high, 16), 16));
-}
-
-inline __m128i TakeOddWords(__m128i low, __m128i high) {
-    return _mm_packs_epi32(_mm_srai_epi32(low, 16), _mm_srai_epi32(high, 16));
+    return whole < 0 ? 0 : (whole > greatest ? greatest : whole);
 }
 
 void Split16(const Word* row, Word* even, Word* odd, std::size_t count) {
@@ -346,8 +341,10 @@ void Split16(const Word* row, Word* even, Word* odd, std::size_t count) {
     for (; i + VectorWords <= count; i += VectorWords) {
         const __m128i low = Load(row + 2 * i);
         const __m128i high = Load(row + 2 * i + VectorWords);
-        Store(even + i, TakeEvenWords(low, high));
-        Store(odd + i, TakeOddWords(low, high));
+        // Made signed, a word passes through the packing unchanged.
+        Store(even + i, _mm_packs_epi32(_mm_srai_epi32(_mm_slli_epi32(low, 16), 16),
+                                        _mm_srai_epi32(_mm_slli_epi32(high, 16), 16)));
+        Store(odd + i, _mm_packs_epi32(_mm_srai_epi32(low, 16), _mm_srai_epi32(high, 16)));
     }
     for (; i < count; ++i) {
         even[i] = row[2 * i];
@@ -376,9 +373,7 @@ void Pack8x4(const std::uint8_t* const planes[4], std::uint8_t* pixels, std::siz
         Store(to + 2 * VectorBytes, _mm_unpacklo_epi16(abHigh, cdHigh));
         Store(to + 3 * VectorBytes, _mm_unpackhi_epi16(abHigh, cdHigh));
     }
-    for (; i < count; ++i) {
-        for (std::size_t c = 0; c < 4; ++c) pixels[4 * i + c] = planes[c][i];
-    }
+    PackOneByOne<4>(planes, pixels, i, count);
 }
 
 void Add8(const std::uint8_t* source, std::uint8_t* samples, std::size_t count) {
@@ -424,24 +419,21 @@ void ShiftRight16(std::int32_t shift, Word* samples, std::size_t count) {
     }
 }
 
+// Without a gather, lookups are one read of a table per sample whatever the vectors do.
+
 void Lookup8x1(const std::uint8_t* tables, std::uint8_t* samples, std::size_t count) {
     for (std::size_t i = 0; i < count; ++i) samples[i] = tables[samples[i]];
 }
 
 void Lookup8x3(const std::uint8_t* tables, std::uint8_t* samples, std::size_t count) {
     for (std::uint8_t* const end = samples + 3 * count; samples != end; samples += 3) {
-        samples[0] = tables[samples[0]];
-        samples[1] = tables[256 + samples[1]];
-        samples[2] = tables[512 + samples[2]];
+        for (std::size_t c = 0; c < 3; ++c) samples[c] = tables[256 * c + samples[c]];
     }
 }
 
 void Lookup8x4(const std::uint8_t* tables, std::uint8_t* samples, std::size_t count) {
     for (std::uint8_t* const end = samples + 4 * count; samples != end; samples += 4) {
-        samples[0] = tables[samples[0]];
-        samples[1] = tables[256 + samples[1]];
-        samples[2] = tables[512 + samples[2]];
-        samples[3] = tables[768 + samples[3]];
+        for (std::size_t c = 0; c < 4; ++c) samples[c] = tables[256 * c + samples[c]];
     }
 }
 
@@ -451,9 +443,7 @@ void Lookup16x1(const std::uint16_t* tables, Word* samples, std::size_t count) {
 
 void Lookup16x3(const std::uint16_t* tables, Word* samples, std::size_t count) {
     for (Word* const end = samples + 3 * count; samples != end; samples += 3) {
-        samples[0].value = tables[samples[0].value];
-        samples[1].value = tables[65536 + samples[1].value];
-        samples[2].value = tables[131072 + samples[2].value];
+        for (std::size_t c = 0; c < 3; ++c) samples[c].value = tables[65536 * c + samples[c].value];
     }
 }
 
@@ -509,11 +499,8 @@ void CubicColumn8(const float* const rows[4], const CubicWeights& weights, std::
                   std::size_t count) {
     std::size_t i = 0;
     for (; i + VectorBytes <= count; i += VectorBytes) {
-        const __m128i low =
-            _mm_packs_epi32(MixCubic(rows, i, weights), MixCubic(rows, i + 4, weights));
-        const __m128i high =
-            _mm_packs_epi32(MixCubic(rows, i + 8, weights), MixCubic(rows, i + 12, weights));
-        Store(output + i, _mm_packus_epi16(low, high));
+        const __m128i low = MixCubicWords(rows, i, weights);
+        Store(output + i, _mm_packus_epi16(low, MixCubicWords(rows, i + VectorWords, weights)));
     }
     for (; i < count; ++i) {
         output[i] = static_cast<std::uint8_t>(MixCubicOnce(rows, i, weights, 255));
@@ -522,10 +509,13 @@ void CubicColumn8(const float* const rows[4], const CubicWeights& weights, std::
 
 void CubicColumn16(const float* const rows[4], const CubicWeights& weights, Word* output,
                    std::size_t count) {
+    // Packed as signed words, which holds them within 0 to 65535.
+    const __m128i middle = _mm_set1_epi32(32768);
     std::size_t i = 0;
     for (; i + VectorWords <= count; i += VectorWords) {
-        const __m128i low = MixCubic(rows, i, weights);
-        Store(output + i, PackUnsigned(low, MixCubic(rows, i + VectorFloats, weights)));
+        const __m128i low = _mm_sub_epi32(MixCubic(rows, i, weights), middle);
+        const __m128i high = _mm_sub_epi32(MixCubic(rows, i + VectorFloats, weights), middle);
+        Store(output + i, FlipWords(_mm_packs_epi32(low, high)));
     }
     for (; i < count; ++i) {
         output[i].value = static_cast<std::uint16_t>(MixCubicOnce(rows, i, weights, 65535));

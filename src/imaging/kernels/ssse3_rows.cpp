@@ -180,27 +180,24 @@ void LinearRow16(const Word* row, const LinearPlan& plan, std::uint16_t* output)
     }
 }
 
-struct FourSamples {
-    __m128i a;
-    __m128i c;
-    __m128i d;
-    __m128i e;
+/// The first of four samples and their differences, of four outputs. Differences of whole samples
+/// are exact in single precision: they are taken of whole numbers and converted.
+struct Differences {
+    __m128i start;
+    __m128i first;
+    __m128i second;
+    __m128i third;
 };
 
-// Differences of whole samples are exact in single precision: they are taken of whole numbers and
-// converted.
-
-inline void StoreCubic(const FourSamples& samples, const CubicPlan& plan, std::size_t i,
+inline void StoreCubic(const Differences& differences, const CubicPlan& plan, std::size_t i,
                        float* output) {
-    const __m128i first = _mm_sub_epi32(samples.c, samples.a);
-    const __m128i middle = _mm_sub_epi32(samples.d, samples.c);
-    const __m128i last = _mm_sub_epi32(samples.e, samples.d);
-    const __m128i second = _mm_sub_epi32(middle, first);
-    const __m128i third = _mm_sub_epi32(_mm_sub_epi32(last, middle), second);
-    __m128 value = _mm_cvtepi32_ps(samples.a);
-    value = _mm_add_ps(value, _mm_mul_ps(_mm_loadu_ps(plan.first + i), _mm_cvtepi32_ps(first)));
-    value = _mm_add_ps(value, _mm_mul_ps(_mm_loadu_ps(plan.second + i), _mm_cvtepi32_ps(second)));
-    value = _mm_add_ps(value, _mm_mul_ps(_mm_loadu_ps(plan.third + i), _mm_cvtepi32_ps(third)));
+    const __m128 first = _mm_cvtepi32_ps(differences.first);
+    const __m128 second = _mm_cvtepi32_ps(differences.second);
+    const __m128 third = _mm_cvtepi32_ps(differences.third);
+    __m128 value = _mm_cvtepi32_ps(differences.start);
+    value = _mm_add_ps(value, _mm_mul_ps(_mm_loadu_ps(plan.first + i), first));
+    value = _mm_add_ps(value, _mm_mul_ps(_mm_loadu_ps(plan.second + i), second));
+    value = _mm_add_ps(value, _mm_mul_ps(_mm_loadu_ps(plan.third + i), third));
     _mm_storeu_ps(output + i, value);
 }
 
@@ -209,30 +206,39 @@ inline __m128i PlaceBytes(const std::int32_t* places) {
     return _mm_add_epi8(Take(Load(places), SpreadShuffle), _mm_set1_epi32(0x03020100));
 }
 
-inline __m128i LoadSamples(const std::uint8_t* from) {
-    return LoadHalf(from);
+constexpr std::int32_t JoinFactors(std::int32_t a, std::int32_t c, std::int32_t d, std::int32_t e) {
+    return (a & 0xFF) | (c & 0xFF) << 8 | (d & 0xFF) << 16 | (e & 0xFF) << 24;
 }
 
-inline __m128i LoadSamples(const Word* from) {
-    return Load(from);
+/// Of each output's four bytes the sum by the factors, the first one lowest.
+inline __m128i SumBytes(__m128i bytes, std::int32_t factors) {
+    const __m128i pairSums = _mm_maddubs_epi16(bytes, _mm_set1_epi32(factors));
+    return _mm_madd_epi16(pairSums, _mm_set1_epi16(1));
 }
 
-inline FourSamples TakeSamples(const std::uint8_t* /*row*/, __m128i group,
-                               const std::int32_t* places) {
-    const __m128i low = _mm_set1_epi32(0xFF);
-    const __m128i quads = _mm_shuffle_epi8(group, PlaceBytes(places));
-    return {_mm_and_si128(quads, low), _mm_and_si128(_mm_srli_epi32(quads, 8), low),
-            _mm_and_si128(_mm_srli_epi32(quads, 16), low), _mm_srli_epi32(quads, 24)};
+/// `group` begins the eight samples among which the outputs' samples have their places.
+inline Differences TakeDifferences(const std::uint8_t* group, const std::int32_t* places) {
+    const __m128i bytes = _mm_shuffle_epi8(LoadHalf(group), PlaceBytes(places));
+    return {_mm_and_si128(bytes, _mm_set1_epi32(0xFF)), SumBytes(bytes, JoinFactors(-1, 1, 0, 0)),
+            SumBytes(bytes, JoinFactors(1, -2, 1, 0)), SumBytes(bytes, JoinFactors(-1, 3, -3, 1))};
 }
 
-inline FourSamples TakeSamples(const Word* /*row*/, __m128i group, const std::int32_t* places) {
+inline Differences TakeDifferences(const Word* group, const std::int32_t* places) {
+    const __m128i words = Load(group);
     const __m128i low = _mm_set1_epi32(0xFFFF);
     const __m128i spread = Take(Load(places), SpreadShuffle);
     const __m128i at = _mm_add_epi8(_mm_add_epi8(spread, spread), _mm_set1_epi32(0x03020100));
-    const __m128i ac = _mm_shuffle_epi8(group, at);
-    const __m128i de = _mm_shuffle_epi8(group, _mm_add_epi8(at, _mm_set1_epi8(4)));
-    return {_mm_and_si128(ac, low), _mm_srli_epi32(ac, 16), _mm_and_si128(de, low),
-            _mm_srli_epi32(de, 16)};
+    const __m128i ac = _mm_shuffle_epi8(words, at);
+    const __m128i de = _mm_shuffle_epi8(words, _mm_add_epi8(at, _mm_set1_epi8(4)));
+    const __m128i a = _mm_and_si128(ac, low);
+    const __m128i c = _mm_srli_epi32(ac, 16);
+    const __m128i d = _mm_and_si128(de, low);
+    const __m128i e = _mm_srli_epi32(de, 16);
+    const __m128i first = _mm_sub_epi32(c, a);
+    const __m128i middle = _mm_sub_epi32(d, c);
+    const __m128i second = _mm_sub_epi32(middle, first);
+    const __m128i last = _mm_sub_epi32(_mm_sub_epi32(e, d), middle);
+    return {a, first, second, _mm_sub_epi32(last, second)};
 }
 
 inline float ToSingle(std::uint8_t sample) {
@@ -257,11 +263,11 @@ float MixOnce(const Sample* from, const CubicWeights& weights) {
 template <typename Sample>
 void CubicRow(const Sample* row, const CubicPlan& plan, float* output) {
     for (std::size_t group = 0; group < plan.groupCount; ++group) {
-        const __m128i samples = LoadSamples(row + plan.bases[group]);
+        const Sample* const samples = row + plan.bases[group];
         const std::size_t i = group * GroupOutputs;
         const std::size_t next = i + VectorFloats;
-        StoreCubic(TakeSamples(row, samples, plan.places + i), plan, i, output);
-        StoreCubic(TakeSamples(row, samples, plan.places + next), plan, next, output);
+        StoreCubic(TakeDifferences(samples, plan.places + i), plan, i, output);
+        StoreCubic(TakeDifferences(samples, plan.places + next), plan, next, output);
     }
     for (std::size_t i = plan.groupCount * GroupOutputs; i < plan.count; ++i) {
         const auto& [index, weights] = plan.positions[i];
