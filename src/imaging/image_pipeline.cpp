@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "imaging/ex_image.h"
+#include "imaging/kernels/kernel_selection.h"
 
 namespace ZV {
 namespace {
@@ -46,6 +47,10 @@ FilterResult PassInputOn(const ZInImageBufferStruct& in, ZOutImageBufferStruct& 
 }
 
 }  // namespace
+
+ZImagePipeline::ZImagePipeline() {
+    SelectKernels();
+}
 
 ZImagePipeline::~ZImagePipeline() = default;
 

@@ -17,7 +17,8 @@ class ZExImage;
 /// One call at a time: it has no lock of its own.
 class ZENTARA_API ZImagePipeline : public ZObject {
   public:
-    ZImagePipeline() = default;
+    /// Chooses the form of the pixel kernels.
+    ZImagePipeline();
     ZImagePipeline(const ZImagePipeline&) = delete;
     ZImagePipeline& operator=(const ZImagePipeline&) = delete;
     virtual ~ZImagePipeline();
