@@ -854,6 +854,59 @@ ZENTARA_API ZentaraResult Zentara_WhiteBalance(Zentara_Settings* settings, uint3
 ZENTARA_API ZentaraResult Zentara_AutoExpose(Zentara_Settings* settings, uint32_t x, uint32_t y,
                                              uint32_t width, uint32_t height);
 
+/* ---- Colours of frames that were taken before ---- */
+
+/**
+ * Finishes a frame that was taken with post-processing off: pixel ratio, colours of the mosaic and
+ * white balance, with the algorithm and the format of `settings` and the present scales of the
+ * white balance. Raw and monochrome frames are copied instead, their format stays.
+ *
+ * `inFrame` is a frame as it was delivered: its private words name the camera whose filters work,
+ * which must be open; `handle` is tested and no more. The pixels of `inFrame` may be changed on the
+ * way. `outFrame` may be the same record or share its buffer. Format and algorithm stay in force
+ * for what the camera delivers, until settings are sent or the next call of this kind.
+ *
+ * Copying, `outFrame` gets a new buffer of malloc if it has none, or if bufferSize is below the
+ * frame's size: the old one is then given to free, so it must have come from malloc. bufferSize
+ * becomes the size in both cases. All public fields follow, the private words do not.
+ *
+ * Finishing, `outFrame` needs a buffer for the largest image on the way, which is the result or the
+ * frame itself; a bufferSize of 0 says that it is large enough. It takes bits, format, width,
+ * height and size, its other fields stay. What goes wrong in the filters is not told: 0 is returned
+ * and the record is filled all the same. So it is for a format without three colours (0 to 5, the
+ * pixels are the mosaic), for whole planes (6, 7) and for a frame larger than the sensor. An
+ * algorithm above 4 keeps the one in force.
+ *
+ * 8 not loaded; 2 `handle`, `inFrame` or `outFrame` null; 3 `settings` null or without its magic
+ * number; 9 not a camera, not open, or open in another process. Copying: 2 `inFrame` has no buffer,
+ * or one below its size (bufferSize 0 says nothing); 16 there is no memory. Finishing: the failure
+ * of Zentara_GetParam for the format; 2 an image of this format would be empty; 9 the camera of
+ * `inFrame` is not open; 2 `inFrame` has no buffer, or one below its size; 2 the algorithm is 0;
+ * 2 `outFrame` has no buffer; 18 it is too small. The last three leave the format, and the last two
+ * the algorithm, in force.
+ */
+ZENTARA_API ZentaraResult Zentara_PostProcessSingleFrame(ZentaraHandle handle,
+                                                         Zentara_Settings* settings,
+                                                         const Zentara_Frame* inFrame,
+                                                         Zentara_Frame* outFrame);
+
+/**
+ * Makes the colours of a mosaic frame: `inFrame` as it was delivered, `outFrame` with its buffer
+ * and with the wanted format (8 to 12; RGB48 for samples of 16 bits, the others for bytes).
+ *
+ * `algorithm` is one of zbayer...; one above 4 keeps the one in force. `outFrame` takes width,
+ * height, bits and size; its other fields stay. Whatever the filter does not take (another
+ * `inFrame` than a mosaic, another format) gives 0 all the same, with no pixels written, and width
+ * and height as they were. Format and algorithm stay in force for what the camera delivers. With
+ * algorithm 0 the format alone is set and nothing else happens.
+ *
+ * 8 not loaded; 2 `inFrame` or `outFrame` null; 9 the camera of `inFrame` is not open; 2 `inFrame`
+ * has no buffer, or one below its size (bufferSize 0 says nothing); 2 `outFrame` has no buffer; 18
+ * its bufferSize is not 0 and too small. The last two leave format and algorithm in force.
+ */
+ZENTARA_API ZentaraResult Zentara_BayerToRgb(uint32_t algorithm, const Zentara_Frame* inFrame,
+                                             Zentara_Frame* outFrame);
+
 /* ---- Image helpers: need no loaded library, reentrant ---- */
 
 /** 1 if samples of `format` have 16 bits (1, 3, 5, 7, 10), else 0. */
