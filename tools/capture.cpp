@@ -9,6 +9,7 @@
 #include <utility>
 
 #include "models/sensor_table.h"
+#include "output.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -88,6 +89,12 @@ CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings
     image.pixelSizeMicrometres =
         ZV::GetSensorPixelSize(camera.GetInfo(zinfCcd).value_or(0)) / NanometresPerMicrometre;
     return facts;
+}
+
+ExitCode CheckImageName(const std::string& path) {
+    if (GetImageKind(path) != ImageKind::Unknown) return ExitDone;
+    PrintError(fmt::format("{}: the ending must be .fits, .tiff, .png or .raw", path));
+    return ExitWrongUse;
 }
 
 bool IsWritable(const Zentara_Frame& frame) {

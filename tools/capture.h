@@ -29,6 +29,9 @@ struct CaptureFacts {
 /// From an open camera and the block of the settings in force.
 CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings);
 
+/// Says on standard error when the ending of a name is that of no kind of file.
+ExitCode CheckImageName(const std::string& path);
+
 /// True for a frame with pixels in a format that has a number.
 bool IsWritable(const Zentara_Frame& frame);
 

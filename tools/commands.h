@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "exit_codes.h"
+#include "measure.h"
 #include "settings_options.h"
 
 namespace ZentaraProgram {
@@ -20,7 +21,13 @@ struct GrabOptions {
     std::string output;
     SettingsOptions settings;
     double timeoutSeconds = 60;
-    bool mayOverwrite = false;
+    bool isBalanced = false;  ///< The white balance is measured first.
+    MeasureOptions measure;   ///< Its region.
+};
+
+struct MeasureCommandOptions {
+    MeasureOptions measure;
+    SettingsOptions settings;
 };
 
 struct StreamOptions {
@@ -54,6 +61,9 @@ ExitCode RunSave(const CommonOptions& common, const std::string& file,
                  const SettingsOptions& options);
 ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options);
 ExitCode RunStream(const CommonOptions& common, const StreamOptions& options);
+/// Measures, and prints what came of it.
+ExitCode RunMeasure(const CommonOptions& common, Measurement measurement,
+                    const MeasureCommandOptions& options);
 ExitCode RunHistogram(const CommonOptions& common, const HistogramOptions& options);
 
 }  // namespace ZentaraProgram

@@ -3,6 +3,7 @@
 #include <nlohmann/json.hpp>
 #include <string>
 
+#include "capture.h"
 #include "commands.h"
 #include "grab.h"
 #include "output.h"
@@ -40,19 +41,26 @@ ExitCode SaveImage(const CommonOptions& common, const GrabOptions& options, cons
     return ExitDamaged;
 }
 
-ExitCode CheckOutput(const GrabOptions& options) {
-    if (GetImageKind(options.output) == ImageKind::Unknown) {
-        PrintError(
-            fmt::format("{}: the ending must be .fits, .tiff, .png or .raw", options.output));
-        return ExitWrongUse;
-    }
-    return ExitDone;
+ExitCode CheckOptions(const GrabOptions& options) {
+    if (const ExitCode checked = CheckImageName(options.output); checked != ExitDone)
+        return checked;
+    const std::string problem = FindMeasureProblem(options.measure);
+    if (problem.empty() && (options.isBalanced || options.measure.region.empty())) return ExitDone;
+    PrintError(problem.empty() ? "--region goes with --white-balance" : problem);
+    return ExitWrongUse;
+}
+
+ExitCode BalanceWhite(const GrabOptions& options, Session* session, SettingsBlock* settings) {
+    if (!options.isBalanced) return ExitDone;
+    MeasureOptions measure = options.measure;
+    measure.timeoutSeconds = options.timeoutSeconds;
+    return Measure(Measurement::WhiteBalance, measure, session, settings);
 }
 
 }  // namespace
 
 ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options) {
-    if (const ExitCode checked = CheckOutput(options); checked != ExitDone) return checked;
+    if (const ExitCode checked = CheckOptions(options); checked != ExitDone) return checked;
     Session session;
     SentSettings settings;
     const ExitCode prepared =
@@ -60,6 +68,8 @@ ExitCode RunGrab(const CommonOptions& common, const GrabOptions& options) {
     if (prepared != ExitDone) return prepared;
 
     TellMended(settings, settings.sent);
+    const ExitCode balanced = BalanceWhite(options, &session, &settings.sent);
+    if (balanced != ExitDone) return balanced;
     Image image;
     const ExitCode taken = TakeImage(&session, settings.sent, options.timeoutSeconds, &image);
     return taken == ExitDone ? SaveImage(common, options, image) : taken;

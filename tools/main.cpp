@@ -30,11 +30,19 @@ constexpr const char* PreflightNote =
     "leaves that mode and enters it again to be asked for the limits of the standard mode: that\n"
     "stops a stream.";
 
+constexpr const char* MeasureNote =
+    "The camera takes images of its own for it. What was measured lasts until cameras are listed "
+    "again;\n"
+    "give it to `zentara grab` and `zentara stream` with --set, or let `zentara grab "
+    "--white-balance`\n"
+    "measure itself.";
+
 struct Arguments {
     CommonOptions common;
     GrabOptions grab;
     StreamOptions stream;
     HistogramOptions histogram;
+    MeasureCommandOptions measure;
     SettingsOptions settings;
     std::string file;
     std::vector<std::string> words;  ///< Keys or assignments, with the camera's number before them.
@@ -83,6 +91,11 @@ void AddTimeout(CLI::App* command, double* seconds, const char* meaning) {
         ->check(CLI::Range(0.001, 1e6));
 }
 
+void AddRegion(CLI::App* command, std::string* region) {
+    command->add_option("--region", *region,
+                        "Where to measure: X,Y,WxH in pixels of the image; else all of it");
+}
+
 void AddQuestions(CLI::App& app, Arguments* arguments) {
     constexpr const char* Words = "Number of the camera, then names; without names all";
     AddWords(app.add_subcommand("info", "Tell what a camera is and can do"), arguments, "keys",
@@ -125,6 +138,9 @@ void AddGrab(CLI::App& app, Arguments* arguments) {
         ->required();
     AddTimeout(grab, &arguments->grab.timeoutSeconds, "Longest wait for the image, seconds");
     AddColour(grab, &arguments->grab.settings.colour);
+    grab->add_flag("--white-balance", arguments->grab.isBalanced,
+                   "Measure the white balance first");
+    AddRegion(grab, &arguments->grab.measure.region);
     AddSettings(grab, &arguments->grab.settings);
     grab->footer(SettingsNote);
 }
@@ -147,6 +163,21 @@ void AddStream(CLI::App& app, Arguments* arguments) {
     AddColour(stream, &options->settings.colour);
     AddSettings(stream, &options->settings);
     stream->footer(SettingsNote);
+}
+
+void AddMeasurements(CLI::App& app, Arguments* arguments) {
+    CLI::App* balance =
+        app.add_subcommand("white-balance", "Measure which gains make the mean of a region grey");
+    CLI::App* exposure = app.add_subcommand(
+        "auto-expose", "Find the exposure that brings a region just below full scale");
+    MeasureCommandOptions* options = &arguments->measure;
+    for (CLI::App* command : {balance, exposure}) {
+        AddCamera(command, &arguments->common);
+        AddRegion(command, &options->measure.region);
+        AddTimeout(command, &options->measure.timeoutSeconds, "Longest time for it, seconds");
+        AddSettings(command, &options->settings);
+        command->footer(MeasureNote);
+    }
 }
 
 void AddHistogram(CLI::App& app, Arguments* arguments) {
@@ -181,7 +212,7 @@ bool TakeCamera(Arguments* arguments) {
 }
 
 ExitCode RunSetOfWords(const Arguments& arguments) {
-    if (!arguments.words.empty()) return RunSet(arguments.common, {{}, arguments.words, {}});
+    if (!arguments.words.empty()) return RunSet(arguments.common, {{}, arguments.words, {}, {}});
     PrintError("there is nothing to set; KEY=VALUE is wanted");
     return ExitWrongUse;
 }
@@ -204,9 +235,15 @@ const std::vector<CommandRow>& GetCommands() {
          [](const Arguments& a) { return RunSave(a.common, a.file, a.settings); }},
         {{"settings", "load"},
          [](const Arguments& a) {
-             return RunSet(a.common, {a.file, {}, {}});
+             return RunSet(a.common, {a.file, {}, {}, {}});
          }},
         {{"grab"}, [](const Arguments& a) { return RunGrab(a.common, a.grab); }},
+        {{"white-balance"},
+         [](const Arguments& a) {
+             return RunMeasure(a.common, Measurement::WhiteBalance, a.measure);
+         }},
+        {{"auto-expose"},
+         [](const Arguments& a) { return RunMeasure(a.common, Measurement::Exposure, a.measure); }},
         {{"histogram"}, [](const Arguments& a) { return RunHistogram(a.common, a.histogram); }},
         {{"stream"}, [](const Arguments& a) { return RunStream(a.common, a.stream); }},
     };
@@ -258,6 +295,7 @@ ExitCode Run(int count, char** values) {
     AddSettingsFiles(app, &arguments);
     AddGrab(app, &arguments);
     AddStream(app, &arguments);
+    AddMeasurements(app, &arguments);
     AddHistogram(app, &arguments);
     try {
         app.parse(count, values);

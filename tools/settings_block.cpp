@@ -7,6 +7,8 @@
 #include <cstring>
 #include <limits>
 
+#include "measure.h"
+
 namespace ZentaraProgram {
 namespace {
 
@@ -90,6 +92,14 @@ ZentaraResult SettingsBlock::Send(const Camera& camera) {
 
 ZentaraResult SettingsBlock::Preflight(const Camera& camera) {
     return Zentara_PreflightSettings(camera.GetHandle(), &block);
+}
+
+ZentaraResult SettingsBlock::BalanceWhite(const Region& region) {
+    return Zentara_WhiteBalance(&block, region.x, region.y, region.width, region.height);
+}
+
+ZentaraResult SettingsBlock::Expose(const Region& region) {
+    return Zentara_AutoExpose(&block, region.x, region.y, region.width, region.height);
 }
 
 std::optional<SettingValue> SettingsBlock::Get(const Setting& setting) const {

@@ -9,6 +9,8 @@
 
 namespace ZentaraProgram {
 
+struct Region;
+
 /// What a camera allows for a setting: a list, or a least and a greatest value, or all there is.
 struct SettingLimits {
     bool isList = false;
@@ -27,6 +29,11 @@ class SettingsBlock {
     ZentaraResult Send(const Camera& camera);
     /// Mends the block as a send would.
     ZentaraResult Preflight(const Camera& camera);
+
+    /// Measures the white balance over a region and sends it; the block then holds the new gains.
+    ZentaraResult BalanceWhite(const Region& region);
+    /// Looks for the exposure of a region and sends it; the block then holds the new exposure.
+    ZentaraResult Expose(const Region& region);
 
     /// Nothing when the camera does not have it, or when it cannot be read.
     [[nodiscard]] std::optional<SettingValue> Get(const Setting& setting) const;

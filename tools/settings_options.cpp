@@ -54,7 +54,11 @@ ExitCode TellProblems(const std::vector<std::string>& problems) {
 
 ExitCode ReadEdits(const SettingsOptions& options, std::vector<SettingEdit>* edits) {
     std::vector<std::string> problems;
-    if (!options.file.empty()) *edits = ReadSettingsFile(options.file, &problems);
+    *edits = options.first;
+    if (!options.file.empty()) {
+        const auto stored = ReadSettingsFile(options.file, &problems);
+        edits->insert(edits->end(), stored.begin(), stored.end());
+    }
     for (const std::string& assignment : options.assignments) {
         SettingEdit edit;
         const std::string problem = ReadAssignment(assignment, &edit);

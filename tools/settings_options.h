@@ -9,12 +9,14 @@
 
 namespace ZentaraProgram {
 
-/// Settings that a command line asks for: those of a file, then those of --set, then those that
+/// Settings that a command line asks for: those that it implies, those of a file, then those of
+/// --set, then those that
 /// --colour and its like stand for.
 struct SettingsOptions {
     std::string file;
     std::vector<std::string> assignments;  ///< "exposure=250ms"
     ColourOptions colour;
+    std::vector<SettingEdit> first;  ///< What the command itself asks for, before all others.
 };
 
 /// Checks all that can be checked without a camera; says on standard error what is wrong.

@@ -278,11 +278,7 @@ void Report(const CommonOptions& common, const StreamSums& sums) {
 }
 
 ExitCode CheckOptions(const StreamOptions& options) {
-    if (!options.output.empty() && GetImageKind(options.output) == ImageKind::Unknown) {
-        PrintError(
-            fmt::format("{}: the ending must be .fits, .tiff, .png or .raw", options.output));
-        return ExitWrongUse;
-    }
+    if (!options.output.empty() && CheckImageName(options.output) != ExitDone) return ExitWrongUse;
     if (options.count == 0 && options.durationSeconds <= 0) {
         PrintError("a stream needs --count or --duration");
         return ExitWrongUse;

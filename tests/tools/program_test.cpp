@@ -58,7 +58,9 @@ TEST(Program, HelpIsPrintedOnStandardOutputAndSucceeds) {
                                                       {"settings", "load", "--help"},
                                                       {"grab", "--help"},
                                                       {"stream", "--help"},
-                                                      {"histogram", "--help"}}) {
+                                                      {"histogram", "--help"},
+                                                      {"white-balance", "--help"},
+                                                      {"auto-expose", "--help"}}) {
         const ProgramResult result = RunProgram(arguments);
 
         EXPECT_EQ(0, result.exitCode);
