@@ -15,8 +15,8 @@
 #include <tuple>
 
 #include "imaging/auto_white_balance.h"
-#include "imaging/kernels/kernel_judge.h"
 #include "imaging/kernels/kernel_selection.h"
+#include "imaging/kernels/kernels.h"
 #include "imaging/scripted_camera.h"
 
 namespace ZV::Testing {
@@ -122,9 +122,9 @@ class KernelExpectation {
         std::uint8_t* plane = pixels.data();
         for (const Table* table : {&red, &green, &blue}) {
             const KernelStatus status =
-                isDeep ? Judge::LookupInPlace16x1(plane, 2 * size.width, size,
-                                                  (*table)->levels16.data(), I(), 65536)
-                       : Judge::LookupInPlace8x1(plane, size.width, size, Get8(*table), I(), 256);
+                isDeep ? LookupInPlace16x1(plane, 2 * size.width, size, (*table)->levels16.data(),
+                                           I(), 65536)
+                       : LookupInPlace8x1(plane, size.width, size, Get8(*table), I(), 256);
             ASSERT_EQ(status, KernelOk);
             plane += pixels.size() / 3;
         }
@@ -134,26 +134,24 @@ class KernelExpectation {
                                               blue->levels16.data()};
         const std::int32_t* const levels[] = {I(), I(), I()};
         const std::int32_t counts[] = {65536, 65536, 65536};
-        ASSERT_EQ(
-            Judge::LookupInPlace16x3(pixels.data(), 6 * size.width, size, values, levels, counts),
-            KernelOk);
+        ASSERT_EQ(LookupInPlace16x3(pixels.data(), 6 * size.width, size, values, levels, counts),
+                  KernelOk);
     }
     void Balance3(Bytes& pixels, KernelSize size, const std::int32_t* first,
                   const std::int32_t* second, const std::int32_t* third) const {
         const std::int32_t* const values[] = {first, second, third};
         const std::int32_t* const levels[] = {I(), I(), I()};
         const std::int32_t counts[] = {256, 256, 256};
-        ASSERT_EQ(
-            Judge::LookupInPlace8x3(pixels.data(), 3 * size.width, size, values, levels, counts),
-            KernelOk);
+        ASSERT_EQ(LookupInPlace8x3(pixels.data(), 3 * size.width, size, values, levels, counts),
+                  KernelOk);
     }
     void Balance4(Bytes& pixels, KernelSize size,
                   const std::array<const std::int32_t*, 4>& values) const {
         const std::int32_t* const levels[] = {I(), I(), I(), I()};
         const std::int32_t counts[] = {256, 256, 256, 256};
-        ASSERT_EQ(Judge::LookupInPlace8x4(pixels.data(), 4 * size.width, size, values.data(),
-                                          levels, counts),
-                  KernelOk);
+        ASSERT_EQ(
+            LookupInPlace8x4(pixels.data(), 4 * size.width, size, values.data(), levels, counts),
+            KernelOk);
     }
 
     Table red;
