@@ -47,6 +47,12 @@ struct HistogramOptions {
     double timeoutSeconds = 60;
 };
 
+struct ProcessOptions {
+    std::string file;
+    std::string output;
+    SettingsOptions settings;
+};
+
 ExitCode RunList(const CommonOptions& common);
 /// Without keys: all that there is.
 ExitCode RunInfo(const CommonOptions& common, const std::vector<std::string>& keys);
@@ -64,6 +70,8 @@ ExitCode RunStream(const CommonOptions& common, const StreamOptions& options);
 /// Measures, and prints what came of it.
 ExitCode RunMeasure(const CommonOptions& common, Measurement measurement,
                     const MeasureCommandOptions& options);
+/// Makes a finished image of a stored frame.
+ExitCode RunProcess(const CommonOptions& common, const ProcessOptions& options);
 ExitCode RunHistogram(const CommonOptions& common, const HistogramOptions& options);
 
 }  // namespace ZentaraProgram

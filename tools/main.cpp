@@ -30,6 +30,15 @@ constexpr const char* PreflightNote =
     "leaves that mode and enters it again to be asked for the limits of the standard mode: that\n"
     "stops a stream.";
 
+constexpr const char* ProcessNote =
+    "The library finishes frames by the camera behind them, so a camera has to be there: that of "
+    "--camera.\n"
+    "Its model and its sensor decide, whatever camera took the frame; a note tells when the models "
+    "differ.\n"
+    "A frame of a simulated camera is processed with --simulation. The gains are those of the "
+    "frame, "
+    "unless\n"
+    "--load or --set gives others; what else is set does not matter.";
 constexpr const char* MeasureNote =
     "The camera takes images of its own for it. What was measured lasts until cameras are listed "
     "again;\n"
@@ -42,6 +51,7 @@ struct Arguments {
     GrabOptions grab;
     StreamOptions stream;
     HistogramOptions histogram;
+    ProcessOptions process;
     MeasureCommandOptions measure;
     SettingsOptions settings;
     std::string file;
@@ -75,14 +85,18 @@ void AddSettings(CLI::App* command, SettingsOptions* settings) {
         ->allow_extra_args(false);
 }
 
-void AddColour(CLI::App* command, ColourOptions* colour) {
-    command->add_flag("--colour,--color", colour->isColour,
-                      "Three colours, made and balanced by post-processing");
+void AddFormat(CLI::App* command, ColourOptions* colour) {
     command->add_option(
         "--format", colour->format,
         "Format of the images: rgb24, rgb48, bgr24, rgb-planes, bayer8, mono16 ...");
     command->add_option("--bayer", colour->algorithm,
                         "How a mosaic becomes colours: average, fast or bicubic");
+}
+
+void AddColour(CLI::App* command, ColourOptions* colour) {
+    command->add_flag("--colour,--color", colour->isColour,
+                      "Three colours, made and balanced by post-processing");
+    AddFormat(command, colour);
 }
 
 void AddTimeout(CLI::App* command, double* seconds, const char* meaning) {
@@ -180,6 +194,21 @@ void AddMeasurements(CLI::App& app, Arguments* arguments) {
     }
 }
 
+void AddProcess(CLI::App& app, Arguments* arguments) {
+    ProcessOptions* options = &arguments->process;
+    CLI::App* process =
+        app.add_subcommand("process", "Make a finished image of a frame that was stored raw");
+    AddCommon(process, &arguments->common);
+    process->add_option("file", options->file, "FITS file of grab or stream")->required();
+    process->add_option("-o,--output", options->output, "File: .fits, .tiff, .png or .raw")
+        ->required();
+    process->add_option("--camera", arguments->common.camera, "Number of the camera in the list")
+        ->default_val(0);
+    AddFormat(process, &options->settings.colour);
+    AddSettings(process, &options->settings);
+    process->footer(ProcessNote);
+}
+
 void AddHistogram(CLI::App& app, Arguments* arguments) {
     HistogramOptions* options = &arguments->histogram;
     CLI::App* histogram =
@@ -244,6 +273,7 @@ const std::vector<CommandRow>& GetCommands() {
          }},
         {{"auto-expose"},
          [](const Arguments& a) { return RunMeasure(a.common, Measurement::Exposure, a.measure); }},
+        {{"process"}, [](const Arguments& a) { return RunProcess(a.common, a.process); }},
         {{"histogram"}, [](const Arguments& a) { return RunHistogram(a.common, a.histogram); }},
         {{"stream"}, [](const Arguments& a) { return RunStream(a.common, a.stream); }},
     };
@@ -296,6 +326,7 @@ ExitCode Run(int count, char** values) {
     AddGrab(app, &arguments);
     AddStream(app, &arguments);
     AddMeasurements(app, &arguments);
+    AddProcess(app, &arguments);
     AddHistogram(app, &arguments);
     try {
         app.parse(count, values);

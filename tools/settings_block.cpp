@@ -102,6 +102,11 @@ ZentaraResult SettingsBlock::Expose(const Region& region) {
     return Zentara_AutoExpose(&block, region.x, region.y, region.width, region.height);
 }
 
+ZentaraResult SettingsBlock::ProcessFrame(const Camera& camera, const Zentara_Frame& in,
+                                          Zentara_Frame* out) {
+    return Zentara_PostProcessSingleFrame(camera.GetHandle(), &block, &in, out);
+}
+
 std::optional<SettingValue> SettingsBlock::Get(const Setting& setting) const {
     return GetFamily(setting).get(block, setting.parameter->key);
 }

@@ -35,6 +35,9 @@ class SettingsBlock {
     /// Looks for the exposure of a region and sends it; the block then holds the new exposure.
     ZentaraResult Expose(const Region& region);
 
+    /// Finishes a frame of the record's camera with the algorithm and the format of the block.
+    ZentaraResult ProcessFrame(const Camera& camera, const Zentara_Frame& in, Zentara_Frame* out);
+
     /// Nothing when the camera does not have it, or when it cannot be read.
     [[nodiscard]] std::optional<SettingValue> Get(const Setting& setting) const;
     ZentaraResult Set(const Setting& setting, SettingValue value);

@@ -60,6 +60,7 @@ TEST(Program, HelpIsPrintedOnStandardOutputAndSucceeds) {
                                                       {"stream", "--help"},
                                                       {"histogram", "--help"},
                                                       {"white-balance", "--help"},
+                                                      {"process", "--help"},
                                                       {"auto-expose", "--help"}}) {
         const ProgramResult result = RunProgram(arguments);
 
