@@ -18,6 +18,7 @@ constexpr std::uint8_t AlphaLevel = 255;
 // Pixels that are finished and packed at a time: their samples stay in the first cache.
 constexpr std::size_t ChunkPixels = 1024;
 constexpr std::size_t RowAlignment = 64;
+constexpr std::size_t LineBytes = 64;
 
 struct PatternRow {
     std::uint32_t colourPattern;
@@ -342,6 +343,15 @@ class ImageWriter {
         pack(planes, pixels, count);
     }
 
+    /// Fetches the lines that a later Write of packed pixels fills.
+    void Announce(std::size_t row, std::size_t from, std::size_t count) const {
+        if (format.isPlanar) return;
+        const auto* line = reinterpret_cast<const std::uint8_t*>(
+            GetRow(row) + from * format.samplesPerPixel);
+        const auto* const end = line + count * format.samplesPerPixel * sizeof(Sample);
+        for (; line < end; line += LineBytes) __builtin_prefetch(line, /*rw=*/1);
+    }
+
     /// The pixels of the row from `from` on repeat the one before.
     void RepeatPixel(std::size_t row, std::size_t from) {
         ForEachRun(row, [&](Sample* run, std::size_t step) {
@@ -394,6 +404,7 @@ void WriteRow(const Enlarger& enlarger, ImageWriter<Sample>& writer, const Chunk
               std::size_t row, std::size_t width) {
     for (std::size_t from = 0; from < width; from += ChunkPixels) {
         const std::size_t count = std::min(ChunkPixels, width - from);
+        writer.Announce(row, from, count);
         std::array<const Sample*, ChannelCount> channels;
         for (std::size_t channel = 0; channel < ChannelCount; ++channel) {
             channels[channel] = enlarger.Finish(channel, from, count, room[channel]);
