@@ -22,19 +22,9 @@ struct KernelForm {
 
 /// Within an index, the better form further down.
 constexpr std::array KernelForms{
-    KernelForm{PlainRowKernels, 0, HasBaseline},
-#ifdef ZENTARA_HAS_SSE2_ROWS
-    KernelForm{SSE2RowKernels, 1, HasSSE2},
-#endif
-#ifdef ZENTARA_HAS_SSSE3_ROWS
-    KernelForm{SSSE3RowKernels, 2, HasSSSE3},
-#endif
-#ifdef ZENTARA_HAS_AVX2_ROWS
-    KernelForm{AVX2RowKernels, 2, HasAVX2},
-#endif
-#ifdef ZENTARA_HAS_AVX512_ROWS
+    KernelForm{PlainRowKernels, 0, HasBaseline}, KernelForm{SSE2RowKernels, 1, HasSSE2},
+    KernelForm{SSSE3RowKernels, 2, HasSSSE3},    KernelForm{AVX2RowKernels, 2, HasAVX2},
     KernelForm{AVX512RowKernels, 2, HasAVX512},
-#endif
 };
 
 // Words that every kernel reads and any thread may write; each form is good for all of them.

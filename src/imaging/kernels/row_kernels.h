@@ -129,7 +129,7 @@ struct RowKernels {
     void (*addHalves16)(const Word* first, const Word* second, Word* output, std::size_t count);
 };
 
-/// The forms. A form that this build lacks is not declared in its table, see kernel_selection.h.
+/// The forms; which of them the processor has, kernel_selection.h tells.
 extern const RowKernels PlainRowKernels;  ///< No instruction beyond the baseline; the reference.
 extern const RowKernels SSE2RowKernels;
 extern const RowKernels SSSE3RowKernels;
