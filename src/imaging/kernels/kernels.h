@@ -92,8 +92,8 @@ ZENTARA_API KernelStatus ShiftRightPlane16(std::int32_t count, void* plane, std:
 /// within the samples' range. Samples below the first level and from the last one upward stay. Of
 /// repeated levels the last counts; levels beyond the samples' range are cut; falling levels give
 /// some sample in range.
-/// KernelNullPointer (each channel's tables too), KernelBadSize, KernelBadStep, KernelBadLevels; for
-/// 16-bit images of more than 6400 pixels KernelNoMemory.
+/// KernelNullPointer (each channel's tables too), KernelBadSize, KernelBadStep, KernelBadLevels;
+/// for 16-bit images of more than 6400 pixels KernelNoMemory.
 ZENTARA_API KernelStatus LookupInPlace8x4(void* image, std::int32_t rowBytes, KernelSize size,
                                           const std::int32_t* const values[4],
                                           const std::int32_t* const levels[4],
