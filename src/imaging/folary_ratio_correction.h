@@ -8,12 +8,22 @@
 
 namespace ZV {
 
-/// Corrects the pixel ratio of a `Folary` mosaic. `Process` declines until it is built.
+/// Corrects the pixel ratio of a `Folary` mosaic, which is binned down its columns alone, and keeps
+/// it a mosaic. Images of every other model are declined. No state between frames.
 class ZENTARA_API ZFolaryRatioCorrection : public ZImageFilter {
   public:
     explicit ZFolaryRatioCorrection(std::uint16_t outputFormat);
     ~ZFolaryRatioCorrection() override;
 
+    /// A binned frame is reduced across by its binning mode. A frame of real-time video is reduced
+    /// by what its sensor asks for and doubled down. The image format is not looked at; a bit depth
+    /// of 8 means samples of a byte, every other one words. `in->data` is only read and may be
+    /// `out->data`.
+    ///
+    /// In this order: `FilterDeclined` for another model, for a frame that is neither binned nor
+    /// real-time video, and for real-time video of a sensor that is neither 2048 nor 2560 wide;
+    /// `FilterFailed` for a frame with fewer bytes than its size asks for, and for an output that
+    /// does not hold the result.
     FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
     /// Does nothing. `FilterDone`.
     FilterResult Init(std::uint32_t width, std::uint32_t height) override;
@@ -21,6 +31,10 @@ class ZENTARA_API ZFolaryRatioCorrection : public ZImageFilter {
     FilterResult SetOutputFormat(std::uint32_t format) override;
 
   private:
+    FilterResult CorrectHorizontalRatio(const ZInImageBufferStruct& in,
+                                        ZOutImageBufferStruct& out) const;
+    FilterResult CorrectRTV(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out) const;
+
     std::atomic<std::uint32_t> outputFormat;
 };
 
