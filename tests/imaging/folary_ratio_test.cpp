@@ -13,12 +13,15 @@
 #include "imaging/horizontal_reduction.h"
 #include "imaging/image_fixture.h"
 #include "imaging/image_pipeline.h"
-#include "imaging/row_zoom.h"
 #include "models/folary.h"
+#include "support/ratio_judge.h"
 
 namespace ZV::Testing {
 namespace {
 
+using Test::JudgeReduction;
+using Test::JudgeZoomFill;
+using Test::JudgeZoomSpread;
 using Samples = std::vector<std::uint32_t>;
 
 constexpr std::uint8_t Untouched = 0xA5;
@@ -50,21 +53,6 @@ Samples MakeRandom(std::size_t count, std::uint32_t sampleBytes, std::uint32_t s
         sample = static_cast<std::uint32_t>(random() & (sampleBytes == 1 ? 0xFF : 0xFFFF));
     }
     return samples;
-}
-
-/// Column by column, by the definition.
-Samples Reduce(const Samples& samples, std::size_t width, std::size_t height, std::size_t factor) {
-    const std::size_t reducedWidth = (width - width % (2 * factor)) / factor;
-    Samples reduced;
-    for (std::size_t row = 0; row < height; ++row) {
-        for (std::size_t column = 0; column < reducedWidth; ++column) {
-            const std::size_t first = row * width + column / 2 * 2 * factor + column % 2;
-            std::uint32_t sum = 0;
-            for (std::size_t n = 0; n < factor; ++n) sum += samples[first + 2 * n];
-            reduced.push_back(factor == 2 ? sum >> 1 : factor == 3 ? sum / 3 : sum >> 2);
-        }
-    }
-    return reduced;
 }
 
 class FolaryRatio : public testing::Test {
@@ -153,7 +141,7 @@ TEST_P(Reduction, GivesTheTruncatedMeansOfEachColourForEveryWidth) {
 
             ASSERT_EQ(FilterDone, Process());
 
-            const Samples expected = Reduce(samples, width, height, factor);
+            const Samples expected = JudgeReduction(samples, width, factor);
             ASSERT_EQ(expected.size() / height, out.width);
             ASSERT_EQ(height, out.height);
             ASSERT_EQ(expected.size() * sampleBytes, out.imageSize);
@@ -177,7 +165,7 @@ TEST_P(Reduction, HoldsForTheGreatestSamplesAndAtOddAddressesAndInPlace) {
 
         ReduceRows(bytes.data() + 1, Width, Height, factor, sampleBytes, bytes.data() + 1);
 
-        const Bytes expected = Spell(Reduce(samples, Width, Height, factor), sampleBytes);
+        const Bytes expected = Spell(JudgeReduction(samples, Width, factor), sampleBytes);
         EXPECT_EQ(0, std::memcmp(expected.data(), bytes.data() + 1, expected.size()));
         EXPECT_EQ(Untouched, bytes[0]);
     }
@@ -283,13 +271,15 @@ class RealTimeVideo : public FolaryRatio,
                         std::uint32_t pattern) {
         const std::uint32_t factor = std::get<0>(GetParam()).factor;
         const std::uint32_t sampleBytes = std::get<1>(GetParam()) == 8 ? 1 : 2;
-        const Bytes reduced = Spell(Reduce(samples, width, height, factor), sampleBytes);
         const std::uint32_t reducedWidth = CalculateReducedWidth(width, factor);
-        Bytes zoomed = reduced;
-        zoomed.resize(2 * reduced.size());
-        ZoomSpreadRows(reduced.data(), zoomed.data(), reducedWidth, height, sampleBytes);
-        ZoomFillRows(pattern, zoomed.data(), reducedWidth, 2 * height, sampleBytes);
-        return zoomed;
+        const Samples reduced = JudgeReduction(samples, width, factor);
+        // What is not computed holds the rows as they were reduced, and zeros behind them.
+        Samples zoomed = JudgeZoomSpread(reduced, reducedWidth, 0);
+        for (std::size_t i = 0; i < reduced.size(); ++i) {
+            const std::size_t row = i / reducedWidth % 4;
+            if (row == 1 || row == 2) zoomed[i] = reduced[i];
+        }
+        return Spell(JudgeZoomFill(zoomed, reducedWidth, 2 * height, pattern), sampleBytes);
     }
 };
 
@@ -437,7 +427,7 @@ TEST_F(FolaryRatio, ShrinksTheImageOfItsPipeline) {
     EXPECT_EQ(12U, image.GetWidth());
     EXPECT_EQ(10U, image.GetHeight());
     EXPECT_EQ(std::uint32_t{Bayer8}, image.GetImageFormat());
-    EXPECT_EQ(Spell(Reduce(samples, 40, 10, 3), 1), GetPixels(image));
+    EXPECT_EQ(Spell(JudgeReduction(samples, 40, 3), 1), GetPixels(image));
 }
 
 }  // namespace
