@@ -907,6 +907,24 @@ ZENTARA_API ZentaraResult Zentara_PostProcessSingleFrame(ZentaraHandle handle,
 ZENTARA_API ZentaraResult Zentara_BayerToRgb(uint32_t algorithm, const Zentara_Frame* inFrame,
                                              Zentara_Frame* outFrame);
 
+/**
+ * Doubles the height of a mosaic frame, which stays a mosaic of the same pattern: two rows of
+ * `inFrame` and two computed from samples of the same colour make four. Computed rows of frames
+ * below 5 columns, or 6 rows of output, keep what the buffer held.
+ *
+ * The client fills height, twice that of `inFrame`, pBuffer and bufferSize of `outFrame`; a
+ * bufferSize of 0 leaves the room to the client's word. `outFrame` takes width and bits; size,
+ * format and pattern stay what they were. inFrame->bayerPattern is the pattern: 0 to 3, 5 to 8
+ * count as these, any other as 0.
+ *
+ * 8 not loaded; 1 `algorithm` is not zbayerFast; 2 a frame or its pBuffer null; 0 at once, with
+ * nothing written, when the format of `inFrame` is no mosaic (Zentara_isBayer); 2 the heights do
+ * not fit; 2 the bufferSize of `inFrame`, unless 0, is below its size, or its size below its rows;
+ * 18 the bufferSize of `outFrame` is too small.
+ */
+ZENTARA_API ZentaraResult Zentara_BayerZoomVert(uint32_t algorithm, const Zentara_Frame* inFrame,
+                                                Zentara_Frame* outFrame);
+
 /* ---- Image helpers: need no loaded library, reentrant ---- */
 
 /** 1 if samples of `format` have 16 bits (1, 3, 5, 7, 10), else 0. */
