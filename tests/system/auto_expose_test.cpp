@@ -1,6 +1,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <chrono>
+#include <future>
 #include <string>
 
 #include "support/log_file.h"
@@ -199,6 +201,24 @@ TEST_F(AutoExposure, SurvivesACameraThatVanishesAtAnyRequestAndWorksWhenItIsBack
     }
     ASSERT_ZERR(zerrNone, Expose());
     EXPECT_GE(GrabMaximum(), 200);
+}
+
+TEST_F(AutoExposure, EndsByAnAbortWhenTheCameraVanishesInTheMiddleOfAnImage) {
+    ASSERT_NO_FATAL_FAILURE(Set64(zprm64Exposure, 100000));
+    ASSERT_NO_FATAL_FAILURE(Send());
+    auto running = std::async(
+        std::launch::async, [this] { return Zentara_AutoExpose(&settings, 0, 0, Width, Height); });
+    ASSERT_TRUE(WaitUntil([this] { return CountImages() > 0; }));
+    ASSERT_TRUE(world.Unplug());
+    // A pass that begins behind the end of the device fails by itself.
+    const bool hasEnded = WaitUntil([&] {
+        (void)Zentara_Abort(handle);
+        return running.wait_for(std::chrono::seconds(0)) == std::future_status::ready;
+    });
+    EXPECT_TRUE(hasEnded);
+    EXPECT_ZERR(zerrNone, running.get());
+    ASSERT_NO_FATAL_FAILURE(Reopen());
+    EXPECT_ZERR(zerrNone, Expose()) << "the next call works";
 }
 
 }  // namespace
