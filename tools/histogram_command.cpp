@@ -6,9 +6,9 @@
 #include <string>
 
 #include "commands.h"
-#include "fits_reader.h"
 #include "grab.h"
 #include "histogram.h"
+#include "image_readers.h"
 #include "output.h"
 
 namespace ZentaraProgram {
@@ -22,7 +22,7 @@ bool IsCameraNumber(const std::string& text, std::uint32_t* camera) {
 }
 
 ExitCode ReadFile(const std::string& path, Image* image) {
-    const std::string problem = ReadFits(path, FitsDemand::Pixels, image);
+    const std::string problem = ReadImage(path, image);
     if (problem.empty()) return ExitDone;
     PrintError(fmt::format("{}: {}", path, problem));
     return ExitFailed;

@@ -214,7 +214,8 @@ void AddHistogram(CLI::App& app, Arguments* arguments) {
     CLI::App* histogram =
         app.add_subcommand("histogram", "Show how often each value stands in an image");
     AddCommon(histogram, &arguments->common);
-    histogram->add_option("source", options->source, "Number of a camera, or a FITS file")
+    histogram
+        ->add_option("source", options->source, "Number of a camera, or a FITS, TIFF or PNG file")
         ->default_val("0");
     histogram->add_option("--png", options->picture, "Draw it into a file as well");
     AddTimeout(histogram, &options->timeoutSeconds, "Longest wait for the image, seconds");

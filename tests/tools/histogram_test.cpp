@@ -133,6 +133,22 @@ TEST(HistogramCommand, ShowsAFileAsItShowsTheCamera) {
     EXPECT_EQ(256U, channels[1]["bins"].size());
 }
 
+TEST(HistogramCommand, ShowsEveryKindOfFileAlike) {
+    const TemporaryFolder folder;
+    const std::string raw = folder.GetPath("raw.fits");
+    ASSERT_EQ(0, RunProgram({"grab", "0", "--simulation", "colour", "-o", raw}).exitCode);
+    std::vector<std::string> outputs;
+    for (const char* name : {"a.fits", "a.png", "a.tiff"}) {
+        const std::string path = folder.GetPath(name);
+        ASSERT_EQ(0, RunProgram({"process", raw, "-o", path, "--simulation", "colour"}).exitCode);
+        outputs.push_back(RunProgram({"histogram", path, "--json"}).output);
+    }
+
+    EXPECT_THAT(outputs.front(), HasSubstr("\"green\""));
+    EXPECT_EQ(outputs[0], outputs[1]);
+    EXPECT_EQ(outputs[0], outputs[2]);
+}
+
 TEST(HistogramCommand, DrawsAPicture) {
     const TemporaryFolder folder;
     const std::string path = folder.GetPath("a.png");

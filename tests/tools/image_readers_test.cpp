@@ -1,0 +1,104 @@
+#include "tools/image_readers.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+
+#include "tools/colour_image.h"
+#include "tools/image_samples.h"
+#include "tools/program.h"
+
+namespace ZentaraTest {
+namespace {
+
+using ZentaraProgram::Image;
+using ZentaraProgram::ReadImage;
+
+class ImageReaders : public testing::TestWithParam<const char*> {
+  private:
+    TemporaryFolder folder;
+
+  protected:
+    const std::string path = folder.GetPath("image") + GetParam();
+};
+
+TEST_P(ImageReaders, AnImageComesBackWithItsSamples) {
+    for (const ColourCase& row : ColourCases) {
+        const Image written = MakeColourImage(row);
+        ASSERT_EQ("", ZentaraProgram::WriteImage(path, written));
+        Image read;
+
+        ASSERT_EQ("", ReadImage(path, &read)) << row.name;
+
+        EXPECT_EQ(5U, read.width);
+        EXPECT_EQ(3U, read.height);
+        EXPECT_EQ(row.bytes, read.bytesPerSample);
+        std::vector<std::uint8_t> one, other;
+        const auto expected = ZentaraProgram::GetPixelSamples(written, &one);
+        const auto found = ZentaraProgram::GetPixelSamples(read, &other);
+        EXPECT_TRUE(std::equal(expected.begin(), expected.end(), found.begin(), found.end()));
+    }
+}
+
+TEST_P(ImageReaders, AFileThatIsCutAnywhereIsRefusedOrWhole) {
+    const Image written = MakeColourImage(ColourCases.back());
+    ASSERT_EQ("", ZentaraProgram::WriteImage(path, written));
+    const std::string whole = ReadFile(path);
+    const std::size_t step = std::max<std::size_t>(1, whole.size() / 60);
+    for (std::size_t bytes = 0; bytes < whole.size(); bytes += step) {
+        WriteFile(path, whole.substr(0, bytes));
+        Image read;
+
+        if (!ReadImage(path, &read).empty()) continue;
+        EXPECT_EQ(written.pixels.size(), read.pixels.size()) << bytes;
+    }
+}
+
+TEST_P(ImageReaders, AnyByteOfAFileMayBeWrong) {
+    ASSERT_EQ("", ZentaraProgram::WriteImage(path, MakeColourImage(ColourCases.back())));
+    const std::string whole = ReadFile(path);
+    const std::size_t step = std::max<std::size_t>(1, whole.size() / 100);
+    for (std::size_t at = 0; at < whole.size(); at += step) {
+        for (const char byte : {'\0', '\1', '\x7F', '\xFF'}) {
+            std::string file = whole;
+            file[at] = byte;
+            WriteFile(path, file);
+            Image read;
+
+            if (!ReadImage(path, &read).empty()) continue;
+            EXPECT_EQ(
+                std::size_t{read.width} * read.height * read.GetChannels() * read.bytesPerSample,
+                read.pixels.size());
+        }
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Endings, ImageReaders, testing::Values(".fits", ".png", ".tiff"),
+                         [](const testing::TestParamInfo<const char*>& tested) {
+                             return std::string(tested.param + 1);
+                         });
+
+TEST(ImageReadersDoor, AnEndingThatSaysNothingAndAMissingFileAreTold) {
+    const TemporaryFolder folder;
+    Image read;
+
+    EXPECT_THAT(ReadImage(folder.GetPath("a.raw"), &read), testing::HasSubstr("ending"));
+    EXPECT_EQ("there is no such file", ReadImage(folder.GetPath("a.png"), &read));
+}
+
+TEST(PrepareImage, OnlyImagesOfCamerasHaveRoom) {
+    Image image;
+
+    EXPECT_TRUE(ZentaraProgram::PrepareImage(4008, 2672, 3, 2, &image));
+    EXPECT_EQ(4008U * 2672 * 6, image.pixels.size());
+    EXPECT_FALSE(ZentaraProgram::PrepareImage(0, 1, 1, 1, &image));
+    EXPECT_FALSE(ZentaraProgram::PrepareImage(1, 65536, 1, 1, &image));
+    EXPECT_FALSE(ZentaraProgram::PrepareImage(65535, 65535, 3, 2, &image));
+    EXPECT_FALSE(ZentaraProgram::PrepareImage(1, 1, 2, 1, &image));
+    EXPECT_FALSE(ZentaraProgram::PrepareImage(1, 1, 1, 4, &image));
+    EXPECT_EQ(4008U, image.width);
+}
+
+}  // namespace
+}  // namespace ZentaraTest

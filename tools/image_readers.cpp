@@ -1,0 +1,62 @@
+#include "image_readers.h"
+
+#include <algorithm>
+#include <array>
+#include <filesystem>
+
+#include "fits_reader.h"
+#include "zentara/zentara.h"
+
+namespace ZentaraProgram {
+namespace {
+
+std::string ReadFitsPixels(const std::string& path, Image* image) {
+    return ReadFits(path, FitsDemand::Pixels, image);
+}
+
+struct ReaderRow {
+    ImageKind kind;
+    std::string (*read)(const std::string&, Image*);
+};
+constexpr std::array Readers{
+    ReaderRow{ImageKind::Fits, &ReadFitsPixels},
+    ReaderRow{ImageKind::Png, &ReadPng},
+    ReaderRow{ImageKind::Tiff, &ReadTiff},
+};
+
+}  // namespace
+
+std::string ReadImage(const std::string& path, Image* image) {
+    const ImageKind kind = GetImageKind(path);
+    const auto* reader = std::find_if(Readers.begin(), Readers.end(),
+                                      [&](const ReaderRow& row) { return row.kind == kind; });
+    if (reader == Readers.end()) return "the ending of the name is none of .fits, .tiff, .png";
+    std::error_code failure;
+    const auto status = std::filesystem::status(path, failure);
+    if (!std::filesystem::exists(status)) return "there is no such file";
+    if (!std::filesystem::is_regular_file(status)) return "it is no file";
+    return reader->read(path, image);
+}
+
+bool PrepareImage(std::uint64_t width, std::uint64_t height, std::uint32_t channels,
+                  std::uint32_t bytesPerSample, Image* image) {
+    constexpr std::uint64_t GreatestSide = 65535, GreatestBytes = std::uint64_t{1} << 30;
+    const bool isKnown =
+        (channels == 1 || channels == ColourCount) && (bytesPerSample == 1 || bytesPerSample == 2);
+    if (!isKnown || width < 1 || height < 1 || width > GreatestSide || height > GreatestSide)
+        return false;
+    const std::uint64_t bytes = width * height * channels * bytesPerSample;
+    if (bytes > GreatestBytes) return false;
+    const bool isDeep = bytesPerSample == 2;
+    const std::uint32_t grey = isDeep ? zfmtMono16 : zfmtMono8;
+    const std::uint32_t colour = isDeep ? zfmtRGB48 : zfmtRGB24;
+    image->layout = FindPixelFormat(channels == 1 ? grey : colour);
+    image->width = static_cast<std::uint32_t>(width);
+    image->height = static_cast<std::uint32_t>(height);
+    image->bytesPerSample = bytesPerSample;
+    image->bits = 8 * bytesPerSample;
+    image->pixels.assign(bytes, 0);
+    return true;
+}
+
+}  // namespace ZentaraProgram

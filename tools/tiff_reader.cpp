@@ -1,0 +1,57 @@
+#include <tiffio.h>
+
+#include <string>
+
+#include "image_readers.h"
+
+namespace ZentaraProgram {
+namespace {
+
+std::uint16_t ReadShort(TIFF* file, std::uint32_t tag) {
+    std::uint16_t value = 0;
+    return TIFFGetFieldDefaulted(file, tag, &value) == 1 ? value : std::uint16_t{0};
+}
+
+std::uint32_t ReadLong(TIFF* file, std::uint32_t tag) {
+    std::uint32_t value = 0;
+    return TIFFGetField(file, tag, &value) == 1 ? value : 0;
+}
+
+bool ReadRows(TIFF* file, Image* image) {
+    const std::size_t rowBytes = image->pixels.size() / image->height;
+    for (std::uint32_t row = 0; row < image->height; ++row) {
+        if (TIFFReadScanline(file, image->pixels.data() + rowBytes * row, row, 0) != 1)
+            return false;
+    }
+    return true;
+}
+
+std::string ReadOpened(TIFF* file, Image* image) {
+    constexpr std::uint32_t BitsPerByte = 8;
+    const std::uint32_t channels = ReadShort(file, TIFFTAG_SAMPLESPERPIXEL);
+    const std::uint32_t bits = ReadShort(file, TIFFTAG_BITSPERSAMPLE);
+    const bool isPlain = TIFFIsTiled(file) == 0 && bits % BitsPerByte == 0 &&
+                         ReadShort(file, TIFFTAG_SAMPLEFORMAT) == SAMPLEFORMAT_UINT &&
+                         ReadShort(file, TIFFTAG_PLANARCONFIG) == PLANARCONFIG_CONTIG;
+    const bool isRoomy = isPlain && PrepareImage(ReadLong(file, TIFFTAG_IMAGEWIDTH),
+                                                 ReadLong(file, TIFFTAG_IMAGELENGTH), channels,
+                                                 bits / BitsPerByte, image);
+    if (!isRoomy) return "it holds no image of a camera";
+    const auto rowBytes = static_cast<tmsize_t>(image->pixels.size() / image->height);
+    if (TIFFScanlineSize(file) != rowBytes) return "its rows are damaged";
+    return ReadRows(file, image) ? "" : "its pixels are damaged";
+}
+
+}  // namespace
+
+std::string ReadTiff(const std::string& path, Image* image) {
+    TIFFSetErrorHandler(nullptr);
+    TIFFSetWarningHandler(nullptr);
+    TIFF* file = TIFFOpen(path.c_str(), "rm");  // Without a memory map, which a cut file breaks.
+    if (file == nullptr) return "it is no TIFF file, or damaged";
+    std::string problem = ReadOpened(file, image);
+    TIFFClose(file);
+    return problem;
+}
+
+}  // namespace ZentaraProgram
