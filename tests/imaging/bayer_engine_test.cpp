@@ -28,6 +28,11 @@ constexpr PlaneKernels JudgeOfBytes{Judge::ShiftRightPlane8, Judge::AddPlane8, J
 constexpr PlaneKernels JudgeOfWords{Judge::ShiftRightPlane16, Judge::AddPlane16,
                                     Judge::EnlargePlane16, Judge::PackPlanes16x3, nullptr};
 
+constexpr PlaneKernels KernelsOfBytes{ShiftRightPlane8, AddPlane8, EnlargePlane8, PackPlanes8x3,
+                                      PackPlanes8x4};
+constexpr PlaneKernels KernelsOfWords{ShiftRightPlane16, AddPlane16, EnlargePlane16, PackPlanes16x3,
+                                      nullptr};
+
 struct Size {
     std::uint32_t width, height;
 };
@@ -104,6 +109,8 @@ class BayerEngineInEveryForm : public testing::TestWithParam<const char*> {
                            KernelInterpolation interpolation, std::uint32_t format) {
         const BayerRoad road(sampleBytes == 1 ? JudgeOfBytes : JudgeOfWords, sampleBytes);
         const auto expected = road.Run(mosaic, interpolation, format);
+        const BayerRoad ownRoad(sampleBytes == 1 ? KernelsOfBytes : KernelsOfWords, sampleBytes);
+        ASSERT_TRUE(expected == ownRoad.Run(mosaic, interpolation, format));
         GuardedImage image(expected.size());
         std::uint32_t bytes = 0;
         const FilterResult result = RunEngine(engine, sampleBytes, mosaic, interpolation,
