@@ -281,6 +281,81 @@ TEST_F(SingleFrame, MayWriteOverTheFrameItReads) {
     EXPECT_EQ(expected, both.GetImage());
 }
 
+class FolaryFrame : public SingleFrame {
+  protected:
+    FolaryFrame() : SingleFrame("folary") {}
+    void SetUp() override { OpenedCamera::SetUp(); }
+
+    /// A mosaic of 64 x 48 bytes that says it came from this camera.
+    OwnedFrame MakeMosaic() const {
+        OwnedFrame mosaic(64 * 48);
+        for (std::size_t i = 0; i < mosaic.pixels.size(); ++i) {
+            mosaic.pixels[i] = static_cast<std::uint8_t>(i * 7);
+        }
+        mosaic->format = zfmtBayer8;
+        mosaic->bits = 8;
+        mosaic->width = 64;
+        mosaic->height = 48;
+        mosaic->size = 64 * 48;
+        mosaic->privateBinning = 1;
+        std::memcpy(mosaic->privateCamera, &handle, sizeof(handle));
+        return mosaic;
+    }
+};
+
+TEST_F(FolaryFrame, AsksForTheImageThatTheCorrectedMosaicGives) {
+    struct Case {
+        const char* what;
+        std::uint32_t binning, realTime, format, width, height, needed;
+    };
+    const Case cases[] = {
+        {"not binned", 1, 0, zfmtRGB24, 64, 48, 3 * 64 * 48},
+        {"binned by 2", 2, 0, zfmtRGB24, 32, 48, 3 * 32 * 48},
+        {"binned by 3", 3, 0, zfmtXRGB32, 20, 48, 4 * 20 * 48},
+        {"binned by 4, mosaic", 4, 0, zfmtBayer8, 16, 48, 16 * 48},
+        {"real time", 1, 1, zfmtRGB24, 16, 96, 3 * 16 * 96},
+        {"real time, binned", 2, 7, zfmtBayer8, 16, 96, 16 * 96},
+        {"binned by 5", 5, 0, zfmtRGB24, 12, 48, 3 * 12 * 48},
+        {"binned beyond the width", 0xFFFFFFFF, 0, zfmtRGB24, 0, 48, 0},
+        {"not reported", 0, 0, zfmtRGB24, 20, 10, 3 * 20 * 10},
+    };
+    for (const Case& row : cases) {
+        SCOPED_TRACE(row.what);
+        OwnedFrame mosaic = MakeMosaic();
+        mosaic->privateBinning = row.binning;
+        mosaic->privateRealTime = row.realTime;
+        OwnedFrame exact(std::max(row.needed, 1U)), oneLess(std::max(row.needed, 2U) - 1);
+        exact->width = oneLess->width = 20;
+        exact->height = oneLess->height = 10;
+
+        EXPECT_ZERR(row.needed > 1 ? zerrBufferTooSmall : zerrNone,
+                    Process(row.format, zbayerFast, mosaic, oneLess));
+        EXPECT_ZERR(zerrNone, Process(row.format, zbayerFast, mosaic, exact));
+
+        EXPECT_EQ(row.width, exact->width);
+        EXPECT_EQ(row.height, exact->height);
+        EXPECT_EQ(row.format, exact->format);
+        EXPECT_EQ(Zentara_CalcImageSize(row.format, row.width, row.height), exact->size);
+    }
+}
+
+TEST_F(FolaryFrame, SizesThatLieComeBack) {
+    for (const std::uint32_t side : {65535U, 65536U, 0x80000000U, 0xFFFFFFFFU}) {
+        for (const std::uint32_t realTime : {0U, 1U}) {
+            OwnedFrame mosaic = MakeMosaic();
+            mosaic->width = mosaic->height = side;
+            mosaic->privateBinning = 2;
+            mosaic->privateRealTime = realTime;
+            OwnedFrame target(4096);
+            const ZentaraResult result = Process(zfmtRGB24, zbayerAverage, mosaic, target);
+            EXPECT_ZERR(zerrBufferTooSmall, result) << side;
+            target->bufferSize = 0;
+            EXPECT_ZERR(zerrNone, Process(zfmtRGB24, zbayerAverage, mosaic, target)) << side;
+            EXPECT_TRUE(target.IsUntouchedFrom(0)) << side;
+        }
+    }
+}
+
 // ---- Raw and monochrome frames are copied ----
 
 /// A frame whose buffer is of the C allocator, as a copy may give it back.
