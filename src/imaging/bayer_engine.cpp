@@ -346,8 +346,8 @@ class ImageWriter {
     /// Fetches the lines that a later Write of packed pixels fills.
     void Announce(std::size_t row, std::size_t from, std::size_t count) const {
         if (format.isPlanar) return;
-        const auto* line = reinterpret_cast<const std::uint8_t*>(
-            GetRow(row) + from * format.samplesPerPixel);
+        const auto* line =
+            reinterpret_cast<const std::uint8_t*>(GetRow(row) + from * format.samplesPerPixel);
         const auto* const end = line + count * format.samplesPerPixel * sizeof(Sample);
         for (; line < end; line += LineBytes) __builtin_prefetch(line, /*rw=*/1);
     }
