@@ -814,7 +814,8 @@ ZENTARA_API ZentaraResult Zentara_SetFrameBuffers(ZentaraHandle handle, Zentara_
  * and height are cut to the image's, `x` and `y` are not looked at: a row that is too long goes on
  * in the row below, and what lies beyond the image counts as black. At the end the block goes to
  * the camera as by Zentara_SendSettingsToCam, whose result is not looked at, so `settings` should
- * be what the camera was last sent.
+ * be what the camera was last sent. A call waits for one that is under way on the same camera.
+ * Never call either from a callback.
  */
 
 /**

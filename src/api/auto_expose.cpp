@@ -1,3 +1,5 @@
+#include <mutex>
+
 #include "api/camera_context.h"
 #include "api/exported_call.h"
 #include "api/measuring_calls.h"
@@ -14,6 +16,7 @@ ZentaraResult AutoExpose(const char* function, const MeasuringRequest& request) 
     const ZentaraResult checked = CheckRequest(request, &target);
     if (checked != zerrNone) return checked;
 
+    const std::lock_guard hold(target.context->measuringMutex);
     ZCamera& camera = *target.camera;
     // Kept: a failed iteration goes on with the exposure that it has left.
     (void)target.context->autoExposure->CalculateExposure(request.x, request.y, request.width,

@@ -76,6 +76,7 @@ struct CameraContext {
     EventService* services = nullptr;        ///< What threads serve now. Guarded by queueMutex.
     std::condition_variable serviceChanged;  ///< A service has ended or moved on.
     mutable std::mutex settingsMutex;
+    std::mutex measuringMutex;  ///< One white balance or auto exposure at a time, waits included.
     std::mutex postMutex;  ///< One run of `postPipeline` at a time: a grab and a delivery may meet.
 };
 

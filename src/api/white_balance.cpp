@@ -1,3 +1,5 @@
+#include <mutex>
+
 #include "api/camera_context.h"
 #include "api/exported_call.h"
 #include "api/measuring_calls.h"
@@ -84,6 +86,7 @@ ZentaraResult WhiteBalance(const char* function, const MeasuringRequest& request
         return zerrNone;
     }
 
+    const std::lock_guard hold(target.context->measuringMutex);
     ZAutoWhiteBalance& balance = *target.context->whiteBalance;
     const ZentaraResult measured = TranslateCameraResult(
         balance.Preprocess(request.x, request.y, request.width, request.height, target.camera));

@@ -377,6 +377,14 @@ TEST_F(WhiteBalance, RefusesGreyWorldOverNothing) {
     EXPECT_EQ(pixels, Bytes(24, 100));
 }
 
+TEST_F(WhiteBalance, TheScaleInForceCostsNoNewTables) {
+    const auto table = filter->GetRedTable();
+    filter->SetRedScale(filter->GetRedScale());
+    EXPECT_EQ(filter->GetRedTable(), table);
+    filter->SetRedScale(1.161F);
+    EXPECT_NE(filter->GetRedTable(), table);
+}
+
 TEST_F(WhiteBalance, AFrameIsNeverBalancedHalfByOneScaleAndHalfByAnother) {
     SetScales(0.25F, 1.0F, 1.0F);
     std::atomic<bool> mayEnd{false};

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <future>
 #include <string>
 
 #include "support/log_file.h"
@@ -274,6 +275,17 @@ TEST_F(MosaicUnderWarmLight, SurvivesACameraThatVanishesAndWorksWhenItIsBack) {
         ASSERT_NO_FATAL_FAILURE(ExposeFor(2000000));
     }
     EXPECT_ZERR(zerrNone, BalanceOverGreys());
+}
+
+TEST_F(MosaicUnderWarmLight, IsBalancedAndExposedByTwoThreadsOneAfterTheOther) {
+    ASSERT_NO_FATAL_FAILURE(ExposeForBand());
+    Zentara_Settings other = settings;
+    auto exposing = std::async(std::launch::async, [&] {
+        return Zentara_AutoExpose(&other, 0, 0, ChartWidth, ChartHeight);
+    });
+    EXPECT_ZERR(zerrNone, BalanceOverGreys());
+    EXPECT_ZERR(zerrNone, Finish([&] { return exposing.get(); }));
+    EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3, 0.1);
 }
 
 class MosaicOfAutoExposure : public ChartCamera, public testing::WithParamInterface<std::uint64_t> {
