@@ -95,6 +95,8 @@ constexpr JsonKey<CameraScenario> SensorKeys[] = {
     {"darkCurrent",
      [](const JsonNode& n, CameraScenario* c) { n.Get(&c->sensor.darkCurrentAt20, 0, 1e9); }},
     {"noise", [](const JsonNode& n, CameraScenario* c) { n.Get(&c->sensor.hasNoise); }},
+    {"videoBinning",
+     [](const JsonNode& n, CameraScenario* c) { n.Get(&c->sensor.videoBinning, 1, 16); }},
 };
 
 void ReadSceneKind(const JsonNode& node, SceneDescription* scene) {

@@ -26,6 +26,8 @@ struct SensorDescription {
     /// Binning adds pixels of one place of the mosaic's cell, so that a binned image is a mosaic of
     /// the same pattern (the cameras of two fields). Otherwise it adds neighbours of all colours.
     bool binsWithinMosaic = false;
+    /// Rows that are added to one in real-time video, by cameras that have it.
+    std::uint32_t videoBinning = 1;
 };
 
 /// Settings in force for one exposure, decoded from the control registers.

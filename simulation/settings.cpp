@@ -128,7 +128,9 @@ BinningState GetSeparateBinning(const Request& request) {
 
 // Rows are added, columns never: the image keeps its width.
 BinningState GetVerticalBinning(const Request& request) {
-    const std::uint32_t mode = request.Control(ControlVerticalBinningMinusOne) + 1;
+    const bool isVideo = request.Control(ControlRtvMode) != 0;
+    const std::uint32_t mode = (request.Control(ControlVerticalBinningMinusOne) + 1) *
+                               (isVideo ? request.camera.sensor.videoBinning : 1);
     return {1, mode, request.Config(ConfigSensorWidth) / (2 * mode) * mode * 2,
             request.Config(ConfigSensorHeight) / mode & ~1u};
 }

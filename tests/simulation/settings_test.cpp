@@ -87,6 +87,18 @@ TEST(Settings, FolaryBinsRowsAloneAndSendsTwoFieldsOutsideRealTimeVideo) {
     EXPECT_FALSE(registers.Set(ControlRtvMode, 1).Decode().isInterlaced);
 }
 
+TEST(Settings, RealTimeVideoOfFolaryAddsTheRowsThatTheScenarioSays) {
+    Registers registers("Folary");
+    registers.camera.sensor.videoBinning = 8;
+    registers.SetRoi(0, 0, 2560, 240);
+
+    EXPECT_EQ(1u, registers.Decode().exposure.binningY);
+    EXPECT_EQ(8u, registers.Set(ControlRtvMode, 1).Decode().exposure.binningY);
+    EXPECT_EQ(1u, registers.Decode().exposure.binningX);
+    EXPECT_EQ(2560u, registers.Decode().exposure.width);
+    EXPECT_EQ(240u, registers.Decode().exposure.height);
+}
+
 TEST(Settings, TheDepthCodesAre8TheMaximum12And14) {
     Registers registers("SolvaneH1");
 
