@@ -1,5 +1,7 @@
 #include "imaging/horizontal_reduction.h"
 
+#include <emmintrin.h>
+
 #include <bit>
 #include <cstddef>
 #include <cstring>
@@ -40,7 +42,34 @@ void ReduceGroups(const std::uint8_t* row, std::uint8_t* reduced, std::size_t gr
 // Each of the following takes what it can and leaves the last groups of a row to ReduceGroups. All
 // of a group is read before any of it is written, so that a row may be reduced in place.
 
+/// The first words of the groups of both blocks.
+__m128i TakeFirstWords(__m128i lower, __m128i upper) {
+    return _mm_packs_epi32(_mm_srai_epi32(_mm_slli_epi32(lower, 16), 16),
+                           _mm_srai_epi32(_mm_slli_epi32(upper, 16), 16));
+}
+
+__m128i TakeSecondWords(__m128i lower, __m128i upper) {
+    return _mm_packs_epi32(_mm_srai_epi32(lower, 16), _mm_srai_epi32(upper, 16));
+}
+
+/// Eight groups of four bytes.
+void HalveBlock(const std::uint8_t* row, std::uint8_t* reduced) {
+    const __m128i lower = _mm_loadu_si128(reinterpret_cast<const __m128i*>(row));
+    const __m128i upper = _mm_loadu_si128(reinterpret_cast<const __m128i*>(row + 16));
+    const __m128i first = TakeFirstWords(lower, upper);
+    const __m128i second = TakeSecondWords(lower, upper);
+    const __m128i differences =
+        _mm_and_si128(_mm_srli_epi16(_mm_xor_si128(first, second), 1), _mm_set1_epi8(0x7F));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(reduced),
+                     _mm_add_epi8(_mm_and_si128(first, second), differences));
+}
+
 void HalveBytes(const std::uint8_t* row, std::uint8_t* reduced, std::size_t groups) {
+    for (; groups >= 8; groups -= 8) {
+        HalveBlock(row, reduced);
+        row += 32;
+        reduced += 16;
+    }
     constexpr std::uint64_t HalfMask = 0x00007F7F00007F7F;
     for (; groups >= 2; groups -= 2) {
         const auto first = Load<std::uint64_t>(row);
