@@ -124,13 +124,26 @@ class RowCarver {
     std::uint8_t* next;
 };
 
-/// Bytes of scratch that a frame of this width takes at most: with words and the cubic form.
-std::uint64_t MeasureScratch(std::uint64_t width) {
-    const std::uint64_t source = RowCarver::Measure(width * sizeof(Word));
-    const std::uint64_t quarters = 5 * RowCarver::Measure(width / 2 * sizeof(Word));
-    const std::uint64_t enlarged = 4 * ChannelCount * RowCarver::Measure(width * sizeof(float));
-    const std::uint64_t chunks = 4 * RowCarver::Measure(ChunkPixels * sizeof(Word));
-    return RowAlignment + source + quarters + enlarged + chunks;
+/// Bytes of scratch for the rows that an enlarging has in use.
+std::uint64_t MeasureEnlarged(std::uint64_t width, KernelInterpolation interpolation,
+                              std::size_t sampleBytes) {
+    if (interpolation == InterpolateCubic) {
+        return 4 * ChannelCount * RowCarver::Measure(width * sizeof(float));
+    }
+    if (interpolation == InterpolateLinear) {
+        return 2 * ChannelCount * RowCarver::Measure(width * sizeof(std::uint16_t));
+    }
+    return ChannelCount * RowCarver::Measure(width * sampleBytes);
+}
+
+/// Bytes of scratch that a frame of this width takes; a width of 0 those of a black image.
+std::uint64_t MeasureScratch(std::uint64_t width, KernelInterpolation interpolation,
+                             std::size_t sampleBytes) {
+    const std::uint64_t source = RowCarver::Measure(width * sampleBytes);
+    const std::uint64_t quarters = 5 * RowCarver::Measure(width / 2 * sampleBytes);
+    const std::uint64_t chunks = 4 * RowCarver::Measure(ChunkPixels * sampleBytes);
+    return RowAlignment + source + quarters + MeasureEnlarged(width, interpolation, sampleBytes) +
+           chunks;
 }
 
 /// The rows of the quarter planes, with the greens made one.
@@ -458,14 +471,24 @@ KernelInterpolation FitInterpolation(KernelInterpolation interpolation, std::uin
 bool DoOverlap(const BayerMosaic& mosaic, const BayerTarget& target, std::uint64_t outputBytes) {
     const auto in = reinterpret_cast<std::uintptr_t>(mosaic.data);
     const auto out = reinterpret_cast<std::uintptr_t>(target.data);
-    return in < out + outputBytes && out < in + mosaic.bytes;
+    return mosaic.bytes != 0 && in < out + outputBytes && out < in + mosaic.bytes;
 }
 
 }  // namespace
 
 void BayerEngine::Reserve(std::uint32_t width) {
-    const std::uint64_t bytes = MeasureScratch(width);
+    const std::uint64_t bytes = MeasureScratch(width, InterpolateCubic, sizeof(Word));
     if (scratch.GetBytes() != bytes) (void)scratch.AllocateAhead(bytes);
+}
+
+std::uint64_t BayerEngine::MeasureImage(std::uint32_t width, std::uint32_t height,
+                                        std::uint32_t format, std::size_t sampleBytes) {
+    constexpr std::uint64_t BytesMax = std::numeric_limits<std::uint32_t>::max();
+    const FormatRow* const row = FindFormat(format, sampleBytes);
+    if (row == nullptr) return 0;
+    const std::uint64_t pixels = std::uint64_t{width} * height;
+    const std::uint64_t pixelBytes = row->samplesPerPixel * sampleBytes;
+    return pixels <= BytesMax / pixelBytes ? pixels * pixelBytes : 0;
 }
 
 FilterResult BayerEngine::Run8(const BayerMosaic& mosaic, KernelInterpolation interpolation,
@@ -483,15 +506,16 @@ FilterResult BayerEngine::Run(const BayerMosaic& mosaic, KernelInterpolation int
                               const BayerTarget& target, std::uint32_t* outputBytes) {
     const FormatRow* const format = FindFormat(target.format, sizeof(Sample));
     if (format == nullptr) return FilterUnusableFormat;
+    if (outputBytes == nullptr) return FilterFailed;
     const std::uint64_t pixels = std::uint64_t{mosaic.width} * mosaic.height;
     if (pixels == 0) {
         *outputBytes = 0;
         return FilterDone;
     }
     if (mosaic.data == nullptr || target.data == nullptr) return FilterFailed;
-    if (pixels > std::numeric_limits<std::uint32_t>::max()) return FilterFailed;
-    const std::uint64_t bytes = pixels * format->samplesPerPixel * sizeof(Sample);
-    if (bytes > std::numeric_limits<std::uint32_t>::max()) return FilterFailed;
+    const std::uint64_t bytes =
+        MeasureImage(mosaic.width, mosaic.height, target.format, sizeof(Sample));
+    if (bytes == 0) return FilterFailed;
     if (target.capacity != 0 && bytes > target.capacity) return FilterFailed;
     if (!Prepare(mosaic, interpolation, sizeof(Sample))) return FilterNotInitialised;
 
@@ -532,15 +556,14 @@ void BayerEngine::MakeImage(const BayerMosaic& mosaic, const BayerTarget& target
 
 bool BayerEngine::Prepare(const BayerMosaic& mosaic, KernelInterpolation interpolation,
                           std::size_t sampleBytes) {
-    constexpr auto Greatest = static_cast<std::uint32_t>(std::numeric_limits<std::int32_t>::max());
-    if (mosaic.width > Greatest || mosaic.height > Greatest) return false;
-    const std::uint64_t needed = MeasureScratch(mosaic.width);
-    if (scratch.GetBytes() < needed && !scratch.AllocateAhead(needed)) return false;
-
     const std::uint32_t columns = mosaic.width / 2;
     const std::uint32_t rows = mosaic.height / 2;
     const PositionsKey wanted{static_cast<std::int32_t>(columns), static_cast<std::int32_t>(rows),
                               FitInterpolation(interpolation, columns, rows), sampleBytes};
+    const bool isBlack = columns == 0 || rows == 0;
+    const std::uint64_t needed =
+        MeasureScratch(isBlack ? 0 : mosaic.width, wanted.interpolation, sampleBytes);
+    if (scratch.GetBytes() < needed && !scratch.AllocateAhead(needed)) return false;
     if (wanted == key) return true;
     key = {};
     if (!MakePositions(wanted)) return false;

@@ -36,6 +36,11 @@ struct BayerTarget {
 /// neighbours. A mosaic of a single row or column has no cell, and its image is black.
 class ZENTARA_API BayerEngine {
   public:
+    /// Bytes of the image that the engine for samples of 1 or 2 bytes makes of a mosaic of this
+    /// size: 0 for no pixels, and where it refuses the format or the size.
+    [[nodiscard]] static std::uint64_t MeasureImage(std::uint32_t width, std::uint32_t height,
+                                                    std::uint32_t format, std::size_t sampleBytes);
+
     /// Makes the scratch of frames up to this width, so that none is made for them later. Without
     /// memory the first frame tries again.
     void Reserve(std::uint32_t width);
@@ -43,10 +48,10 @@ class ZENTARA_API BayerEngine {
     /// Makes an image of one byte per sample: formats 6, 8, 9, 11, 12 and 13.
     ///
     /// `*outputBytes` is set when `FilterDone` comes back; a side of 0 gives 0 bytes. Nothing is
-    /// written otherwise: `FilterUnusableFormat`; `FilterFailed` for missing data, an image above
-    /// 32 bits or one above the capacity; `FilterNotInitialised` without memory. Memory is taken
-    /// only when the size of the frames, their depth or the interpolation change, and where the
-    /// mosaic overlaps the image.
+    /// written otherwise: `FilterUnusableFormat`; `FilterFailed` for a null `outputBytes`, missing
+    /// data, an image above 32 bits and one above the capacity; `FilterNotInitialised` without
+    /// memory. Memory is taken only when the size of the frames, their depth or the interpolation
+    /// change, and where the mosaic overlaps the image.
     [[nodiscard]] FilterResult Run8(const BayerMosaic& mosaic, KernelInterpolation interpolation,
                                     const BayerTarget& target, std::uint32_t* outputBytes);
 

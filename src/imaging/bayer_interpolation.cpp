@@ -35,6 +35,11 @@ bool HasEngine(std::uint32_t format) {
     return IsFilterThreeColour(format) && !IsOfPlanes(format);
 }
 
+/// Bytes of a sample in the engine of a format.
+std::size_t GetSampleBytes(std::uint32_t format) {
+    return format == RGB48 ? sizeof(Word) : 1;
+}
+
 BayerMosaic DescribeMosaic(const ZInImageBufferStruct& in) {
     return {in.data, in.imageSize, in.width, in.height, in.colourPattern};
 }
@@ -57,9 +62,8 @@ FilterResult ZBayerInterpolation::Process(ZInImageBufferStruct* in, ZOutImageBuf
     FilterResult result = FilterNotInitialised;
     {
         const std::lock_guard hold(scratchMutex);
-        const std::uint64_t pixels = std::uint64_t{in->width} * in->height;
-        if (pixels > std::uint64_t{width} * height) return FilterNotInitialised;
-        result = format == RGB48
+        if (!IsWithinSensor(*in)) return FilterNotInitialised;
+        result = GetSampleBytes(format) == sizeof(Word)
                      ? engine.Run16(DescribeMosaic(*in), interpolation, target, &outputBytes)
                      : engine.Run8(DescribeMosaic(*in), interpolation, target, &outputBytes);
     }
@@ -71,6 +75,14 @@ FilterResult ZBayerInterpolation::Process(ZInImageBufferStruct* in, ZOutImageBuf
     return FilterDone;
 }
 
+std::uint64_t ZBayerInterpolation::MeasureOutput(const ZInImageBufferStruct& in,
+                                                 std::uint32_t format) const {
+    if (!IsBayer(in.imageFormat) || !IsInitialised() || !HasEngine(format)) return 0;
+    const std::lock_guard hold(scratchMutex);
+    if (!IsWithinSensor(in)) return 0;
+    return BayerEngine::MeasureImage(in.width, in.height, format, GetSampleBytes(format));
+}
+
 FilterResult ZBayerInterpolation::Init(std::uint32_t newWidth, std::uint32_t newHeight) {
     const std::lock_guard hold(scratchMutex);
     width = newWidth;
@@ -78,6 +90,10 @@ FilterResult ZBayerInterpolation::Init(std::uint32_t newWidth, std::uint32_t new
     engine.Reserve(width);
     isInitialised.store(true, std::memory_order_relaxed);
     return FilterDone;
+}
+
+bool ZBayerInterpolation::IsWithinSensor(const ZInImageBufferStruct& in) const {
+    return std::uint64_t{in.width} * in.height <= std::uint64_t{width} * height;
 }
 
 FilterResult ZBayerInterpolation::SetOutputFormat(std::uint32_t format) {

@@ -25,8 +25,13 @@ class ZENTARA_API ZBayerInterpolation : public ZImageFilter {
     /// `FilterDeclined` for an input without a mosaic or an output without three colours;
     /// `FilterNotInitialised` before `Init`; `FilterUnusableFormat` for whole planes (6, 7);
     /// `FilterNotInitialised` for a frame of more pixels than the sensor of `Init`; `FilterFailed`
-    /// for missing data and for an image above the output's capacity. Nothing is written then.
+    /// for missing data, an image above 32 bits and one above the output's capacity;
+    /// `FilterNotInitialised` without memory. Nothing is written then.
     FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
+    /// Bytes that `Process` writes for this input with this format in force, into an output that
+    /// holds them: 0 where it declines or refuses, without memory apart.
+    [[nodiscard]] std::uint64_t MeasureOutput(const ZInImageBufferStruct& in,
+                                              std::uint32_t format) const;
     /// Makes the scratch for a sensor of this size anew. `FilterDone` also without memory: the
     /// first frame tries again.
     FilterResult Init(std::uint32_t width, std::uint32_t height) override;
@@ -44,7 +49,8 @@ class ZENTARA_API ZBayerInterpolation : public ZImageFilter {
     /// The two engines by the format: words for `RGB48`, bytes for 8, 9 and 11 to 13. Every other
     /// format does nothing and gives the low 16 bits of `algorithm` as its result. The caller
     /// vouches for `in`, of `width` times `height` samples, and for `out`. `*outSize` is set with
-    /// `FilterDone`; the other results are those of `BayerEngine`. `bitDepth`, `outPlanes` and
+    /// `FilterDone`, and `FilterFailed` where it is null; the other results are those of
+    /// `BayerEngine`. `bitDepth`, `outPlanes` and
     /// `quarterPlanes` belong to the form of the call; nothing is read or written there.
     FilterResult BayerUsingSSE(const std::uint8_t* in, std::uint32_t width, std::uint32_t height,
                                std::uint32_t bitDepth, std::uint32_t pattern, std::uint8_t* out,
@@ -68,13 +74,16 @@ class ZENTARA_API ZBayerInterpolation : public ZImageFilter {
                                             std::uint32_t interpolation);
 
   private:
+    /// Whether the frame has no more pixels than the sensor. Under scratchMutex.
+    bool IsWithinSensor(const ZInImageBufferStruct& in) const;
+
     std::atomic<std::uint16_t> algorithm;
     std::atomic<std::uint32_t> outputFormat;
     std::atomic<bool> isInitialised{false};
-    std::mutex scratchMutex;   // leaf, of all below
-    BayerEngine engine;        // guarded by scratchMutex
-    std::uint32_t width = 0;   // guarded by scratchMutex
-    std::uint32_t height = 0;  // guarded by scratchMutex
+    mutable std::mutex scratchMutex;  // leaf, of all below
+    BayerEngine engine;               // guarded by scratchMutex
+    std::uint32_t width = 0;          // guarded by scratchMutex
+    std::uint32_t height = 0;         // guarded by scratchMutex
 };
 
 }  // namespace ZV

@@ -10,6 +10,7 @@
 #include "imaging/bayer_road.h"
 #include "imaging/kernels/kernel_judge.h"
 #include "imaging/kernels/kernel_selection.h"
+#include "imaging/pixel_buffer.h"
 
 namespace ZV::Testing {
 namespace {
@@ -134,26 +135,29 @@ class BayerEngineInEveryForm : public testing::TestWithParam<const char*> {
 };
 
 TEST_P(BayerEngineInEveryForm, MakesTheSamplesOfTheKernelsOverWholePlanes) {
-    std::uint32_t seed = 1;
+    // Sizes of a family take turns with the patterns and the formats of both depths.
+    std::uint32_t turn = 0;
     for (const Size& size : ListSizes()) {
         const std::size_t samples = std::size_t{size.width} * size.height;
+        const std::uint32_t pattern = 5 + turn / 6 % 4;
         for (const std::size_t sampleBytes : {1, 2}) {
             // One byte off, so that nothing is aligned by luck.
-            const auto memory = MakeSamples(samples * sampleBytes + 1, ++seed);
-            BayerMosaic mosaic{memory.data() + 1, samples * sampleBytes, size.width, size.height,
-                               5 + seed % 4};
+            const auto memory = MakeSamples(samples * sampleBytes + 1, turn);
+            const BayerMosaic mosaic{memory.data() + 1, samples * sampleBytes, size.width,
+                                     size.height, pattern};
+            const std::uint32_t format =
+                sampleBytes == 1 ? ByteFormats[turn % 6] : WordFormats[turn % 2];
             for (const KernelInterpolation interpolation : Interpolations) {
-                const std::uint32_t format =
-                    sampleBytes == 1 ? ByteFormats[seed % 6] : WordFormats[seed % 2];
                 ASSERT_NO_FATAL_FAILURE(
                     ExpectAsByTheRoad(mosaic, sampleBytes, interpolation, format));
             }
         }
+        ++turn;
     }
 }
 
 TEST_P(BayerEngineInEveryForm, TakesEveryPatternIntoEveryFormat) {
-    for (const Size& size : {Size{38, 22}, Size{39, 23}, Size{5, 4}, Size{2, 2}}) {
+    for (const Size& size : {Size{38, 22}, Size{39, 23}, Size{5, 4}, Size{2, 2}, Size{1031, 8}}) {
         const std::size_t samples = std::size_t{size.width} * size.height;
         const auto memory = MakeSamples(samples * 2, size.width);
         for (const std::uint32_t pattern : {5, 6, 7, 8, 0, 3, 4, 9, 1000}) {
@@ -237,6 +241,46 @@ TEST(BayerEngine, MakesABlackImageOfASingleRowOrColumn) {
     }
 }
 
+TEST(BayerEngine, NeedsNoScratchOfTheFramesWidthForABlackImage) {
+    constexpr std::uint32_t Width = 20'000'000;  // Whose rows would ask for more than a gigabyte.
+    PixelBuffer image;
+    ASSERT_TRUE(image.Allocate(std::uint64_t{3} * Width));
+    const std::uint8_t sample = 77;
+    std::uint32_t bytes = 0;
+    BayerEngine engine;
+
+    EXPECT_EQ(engine.Run8({&sample, 1, Width, 1, 5}, InterpolateCubic,
+                          {image.GetData(), image.GetBytes(), RGB24}, &bytes),
+              FilterDone);
+
+    EXPECT_EQ(bytes, 3 * Width);
+}
+
+TEST(BayerEngine, ReadsNothingOfAMosaicOfNoBytesInsideItsImage) {
+    std::vector<std::uint8_t> image(3 * 8 * 6, Untouched);
+    std::uint32_t bytes = 0;
+    BayerEngine engine;
+
+    EXPECT_EQ(engine.Run8({image.data() + 5, 0, 8, 6, 5}, InterpolateLinear,
+                          {image.data(), image.size(), RGB24}, &bytes),
+              FilterDone);
+
+    EXPECT_EQ(bytes, image.size());
+    EXPECT_EQ(image, std::vector<std::uint8_t>(image.size()));
+}
+
+TEST(BayerEngine, MeasuresTheImageThatItMakesAndNothingForOneThatItRefuses) {
+    EXPECT_EQ(BayerEngine::MeasureImage(31, 23, RGBPlane8, 1), 3U * 31 * 23);
+    EXPECT_EQ(BayerEngine::MeasureImage(31, 23, BGRX32, 1), 4U * 31 * 23);
+    EXPECT_EQ(BayerEngine::MeasureImage(31, 23, RGB48, 2), 6U * 31 * 23);
+    EXPECT_EQ(BayerEngine::MeasureImage(0, 23, RGB24, 1), 0U);
+    EXPECT_EQ(BayerEngine::MeasureImage(31, 23, RGB48, 1), 0U) << "of the other engine";
+    EXPECT_EQ(BayerEngine::MeasureImage(31, 23, Mono8, 1), 0U);
+    EXPECT_EQ(BayerEngine::MeasureImage(0x55555555, 1, RGB24, 1), 0xFFFFFFFFU);
+    EXPECT_EQ(BayerEngine::MeasureImage(0x55555556, 1, RGB24, 1), 0U) << "above 32 bits";
+    EXPECT_EQ(BayerEngine::MeasureImage(0xFFFFFFFF, 0xFFFFFFFF, RGBX32, 1), 0U);
+}
+
 TEST(BayerEngine, MakesAnEmptyImageOfAnEmptyMosaic) {
     BayerEngine engine;
     for (const Size& size : {Size{0, 0}, Size{0, 7}, Size{7, 0}, Size{0xFFFFFFFF, 0}}) {
@@ -266,6 +310,7 @@ TEST(BayerEngine, RefusesWhatItCannotReadOrWriteAndLeavesTheImageAlone) {
     EXPECT_EQ(run({memory.data(), 64, 65536, 65536, 5}, target), FilterFailed);
     EXPECT_EQ(run({memory.data(), 64, 65535, 65535, 5}, {image.GetData(), 0, RGB24}), FilterFailed)
         << "above 32 bits";
+    EXPECT_EQ(engine.Run8(mosaic, InterpolateLinear, target, nullptr), FilterFailed);
     for (const std::uint32_t format : {0U, 5U, 7U, 10U, 14U, 0xFFFFFFFFU}) {
         EXPECT_EQ(run(mosaic, {image.GetData(), 192, format}), FilterUnusableFormat);
     }

@@ -161,6 +161,27 @@ TEST_F(BayerFilter, RefusesMissingDataAndAnImageThatDoesNotFit) {
     EXPECT_EQ(filter.Process(&in, &out), FilterDone) << "vouched for";
 }
 
+TEST_F(BayerFilter, MeasuresWhatItWrites) {
+    for (std::uint32_t format = 0; format < 16; ++format) {
+        (void)filter.SetOutputFormat(format);
+        const bool isDone = filter.Process(&in, &out) == FilterDone;
+        EXPECT_EQ(filter.MeasureOutput(in, format), isDone ? out.imageSize : 0) << format;
+    }
+    EXPECT_EQ(filter.MeasureOutput(in, 0x1000C), 0U);
+    EXPECT_EQ(ZBayerInterpolation(1, RGB24).MeasureOutput(in, RGB24), 0U) << "before Init";
+    in.imageFormat = Mono8;
+    EXPECT_EQ(filter.MeasureOutput(in, RGB24), 0U);
+    in.imageFormat = Bayer16;
+    in.height = Height + 1;
+    EXPECT_EQ(filter.MeasureOutput(in, RGB24), 0U) << "larger than the sensor";
+    (void)filter.Init(0x10000, 0x10000);
+    in.width = in.height = 0x8000;
+    EXPECT_EQ(filter.MeasureOutput(in, RGB24), 3U << 30);
+    EXPECT_EQ(filter.MeasureOutput(in, XRGB32), 0U) << "above 32 bits";
+    in.width = in.height = 0xFFFFFFFF;
+    EXPECT_EQ(filter.MeasureOutput(in, RGB24), 0U);
+}
+
 TEST_F(BayerFilter, MakesAnEmptyImageOfAnEmptyFrame) {
     in.width = 0;
     EXPECT_EQ(filter.Process(&in, &out), FilterDone);
@@ -256,6 +277,25 @@ TEST_F(BayerFilter, ThePublicFormChoosesTheEngineByTheFormatAndNeedsNoInit) {
         EXPECT_EQ(bytes, Pixels * GetThreeColourPixelBytes(format));
         EXPECT_EQ(GetImage(bytes), GetExpected(4, format));
     }
+}
+
+TEST_F(BayerFilter, ThePublicFormsFailWithoutAPlaceForTheSize) {
+    for (const std::uint32_t format : {RGB24, RGB48}) {
+        EXPECT_EQ(filter.BayerUsingSSE(in.data, Width, Height, 8, PatternRGGB, out.data, format,
+                                       nullptr, nullptr, nullptr, 1),
+                  FilterFailed);
+    }
+    EXPECT_EQ(filter.Private_Bayer8BitUsingSSE(in.data, Width, Height, 8, PatternRGGB, out.data,
+                                               RGBPlane8, nullptr, nullptr, nullptr, 1),
+              FilterFailed);
+    EXPECT_EQ(filter.Private_Bayer16BitUsingSSE(in.data, Width, Height, 16, PatternRGGB, out.data,
+                                                RGBPlane16, nullptr, nullptr, nullptr, 1),
+              FilterFailed);
+    EXPECT_EQ(filter.Private_Bayer8BitUsingSSE(nullptr, 0, 0, 8, PatternRGGB, nullptr, RGB24,
+                                               nullptr, nullptr, nullptr, 1),
+              FilterFailed)
+        << "of no pixels";
+    ExpectUntouched();
 }
 
 TEST_F(BayerFilter, KeptThePublicFormGivesTheAlgorithmBackForAFormatWithoutAnEngine) {
