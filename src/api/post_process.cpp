@@ -4,7 +4,6 @@
 #include <array>
 #include <cstdlib>
 #include <cstring>
-#include <limits>
 #include <mutex>
 
 #include "api/exported_call.h"
@@ -22,9 +21,6 @@ namespace ZV {
 
 namespace {
 
-constexpr std::uint32_t CCDWidthOfThirds = 2048;
-constexpr std::uint32_t CCDWidthOfQuarters = 2560;
-
 struct AlgorithmRow {
     std::uint32_t asked;
     std::uint16_t stored;
@@ -36,49 +32,6 @@ constexpr std::array Algorithms{
     AlgorithmRow{zbayerBicubic, zbayerBicubicFaster},
     AlgorithmRow{zbayerBicubicFaster, zbayerBicubicFaster},
 };
-
-/// Size of an image between two steps of the chain.
-struct StepSize {
-    std::uint64_t bytes;
-    std::uint64_t width;
-    std::uint64_t height;
-};
-
-bool IsMosaicOutput(std::uint32_t format) {
-    return IsFilterThreeColour(format) && format != RGBPlane8 && format != RGBPlane16;
-}
-
-/// Held at the greatest number: records lie.
-std::uint64_t Multiply(std::uint64_t first, std::uint64_t second) {
-    constexpr std::uint64_t Greatest = std::numeric_limits<std::uint64_t>::max();
-    return first != 0 && second > Greatest / first ? Greatest : first * second;
-}
-
-std::uint64_t CalculateBayerBytes(const StepSize& size, std::uint32_t outputFormat) {
-    if (!IsMosaicOutput(outputFormat)) return 0;
-    return Multiply(Multiply(size.width, size.height), GetThreeColourPixelBytes(outputFormat));
-}
-
-StepSize ReduceWidth(const ZInImageBufferStruct& in, std::uint64_t divisor, std::uint64_t rows) {
-    const std::uint64_t width = (in.width - in.width % (2 * divisor)) / divisor;
-    return {Multiply(Multiply(width, rows), in.bitDepth == 8 ? 1 : 2), width, rows};
-}
-
-/// What the ratio correction makes of the frame, or the copy where it declines.
-StepSize MeasureRatioStep(const ZInImageBufferStruct& in, const ZOutImageBufferStruct& out) {
-    const StepSize asItCame{in.imageSize, in.width, in.height};
-    if (in.camera == nullptr || in.camera->GetModel() != zmodelFolary) return asItCame;
-    if (in.isRTV) {
-        const std::uint32_t ccdWidth = in.camera->GetCCDWidth();
-        if (ccdWidth != CCDWidthOfThirds && ccdWidth != CCDWidthOfQuarters) return asItCame;
-        return ReduceWidth(in, ccdWidth == CCDWidthOfThirds ? 3 : 4, std::uint64_t{in.height} * 2);
-    }
-    const std::uint32_t binning = in.symmetricalBinningMode;
-    if (binning == 1) return asItCame;
-    // No camera reports it: the output keeps what the client's record says.
-    if (binning == 0) return {0, out.width, out.height};
-    return ReduceWidth(in, binning, in.height);
-}
 
 // ---- A single frame ----
 
@@ -124,7 +77,7 @@ ZentaraResult RunChain(CameraContext& context, ZInImageBufferStruct& in, std::ui
     if (algorithm == 0) return zerrBadParameter;
     SetFilterAlgorithm(*context.bayerFilter, algorithm);
     const ZOutImageBufferStruct asGiven = DescribeOutput(outFrame, format, 0);
-    const std::uint64_t bytes = CalculatePostProcessBytes(in, asGiven, format);
+    const std::uint64_t bytes = CalculatePostProcessBytes(context, in, asGiven, format);
     const ZentaraResult checked = CheckOutput(outFrame, bytes);
     if (checked != zerrNone) return checked;
     *out = DescribeOutput(outFrame, format, bytes);
@@ -198,7 +151,7 @@ BayerOutcome BayerToRgb(std::uint32_t algorithm, const Zentara_Frame* inFrame,
     if (algorithm == 0) return {zerrNone, false};
     SetFilterAlgorithm(filter, algorithm);
     ZInImageBufferStruct in = DescribeFrame(*inFrame, camera);
-    const std::uint64_t bytes = CalculateBayerBytes(in, format);
+    const std::uint64_t bytes = filter.MeasureOutput(in, format);
     const ZentaraResult checked = CheckOutput(*outFrame, bytes);
     if (checked != zerrNone) return {checked};
     ZOutImageBufferStruct out = DescribeOutput(*outFrame, format, bytes);
@@ -243,18 +196,22 @@ ZCamera* FindFrameCamera(const Zentara_Frame& frame) {
     return IsOpen(camera) ? camera : nullptr;
 }
 
-std::uint64_t CalculateBayerBytes(const ZInImageBufferStruct& in, std::uint32_t outputFormat) {
-    if (!IsBayer(in.imageFormat)) return 0;
-    return CalculateBayerBytes(StepSize{in.imageSize, in.width, in.height}, outputFormat);
-}
-
-std::uint64_t CalculatePostProcessBytes(const ZInImageBufferStruct& in,
+std::uint64_t CalculatePostProcessBytes(const CameraContext& context,
+                                        const ZInImageBufferStruct& in,
                                         const ZOutImageBufferStruct& out,
                                         std::uint32_t outputFormat) {
-    const StepSize corrected = MeasureRatioStep(in, out);
-    if (!IsBayer(in.imageFormat)) return corrected.bytes;
+    const RatioOutcome ratio = context.ratioCorrection->Measure(in, out);
+    ZInImageBufferStruct corrected = in;
+    if (ratio.result == FilterDone) {
+        corrected.imageSize = static_cast<std::uint32_t>(ratio.bytes);
+        corrected.width = ratio.width;
+        corrected.height = ratio.height;
+    } else if (ratio.result != FilterDeclined) {
+        return 0;  // The chain ends there.
+    }
     // The white balance works in place.
-    return std::max(corrected.bytes, CalculateBayerBytes(corrected, outputFormat));
+    return std::max(std::uint64_t{corrected.imageSize},
+                    context.bayerFilter->MeasureOutput(corrected, outputFormat));
 }
 
 ZentaraResult CheckOutput(const Zentara_Frame& frame, std::uint64_t bytes) {

@@ -19,14 +19,11 @@ namespace ZV {
 /// The open camera that a frame's record names; null for a record that names none.
 [[nodiscard]] ZCamera* FindFrameCamera(const Zentara_Frame& frame);
 
-/// Bytes that the Bayer filter writes at most for this input with an output format; 0 where it
-/// writes none.
-[[nodiscard]] std::uint64_t CalculateBayerBytes(const ZInImageBufferStruct& in,
-                                                std::uint32_t outputFormat);
-
 /// The most bytes that any step of the post-processing chain writes to an output of the given
-/// width and height: ratio correction, Bayer filter, and the copies between them.
-[[nodiscard]] std::uint64_t CalculatePostProcessBytes(const ZInImageBufferStruct& in,
+/// width and height: ratio correction, Bayer filter, and the copies between them. A step that
+/// refuses the image writes nothing and ends the chain.
+[[nodiscard]] std::uint64_t CalculatePostProcessBytes(const CameraContext& context,
+                                                      const ZInImageBufferStruct& in,
                                                       const ZOutImageBufferStruct& out,
                                                       std::uint32_t outputFormat);
 

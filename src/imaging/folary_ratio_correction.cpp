@@ -41,11 +41,44 @@ bool DoesFit(std::uint64_t bytes, const ZOutImageBufferStruct& out) {
     return out.dataCapacity == 0 || bytes <= out.dataCapacity;
 }
 
-void Describe(std::uint32_t width, std::uint32_t height, std::uint64_t bytes,
-              ZOutImageBufferStruct& out) {
-    out.width = width;
-    out.height = height;
-    out.imageSize = static_cast<std::uint32_t>(bytes);
+/// The number by which columns are reduced; 1 for a frame that is left as it is.
+std::uint32_t FindFactor(const ZInImageBufferStruct& in) {
+    if (!in.isRTV) return in.symmetricalBinningMode;
+    const std::uint32_t factor = FindVideoFactor(in.camera->GetCCDWidth());
+    return factor != 0 ? factor : 1;
+}
+
+/// Kept: no camera reports this mode; it leaves size, width and height of the output as they came.
+bool IsWithoutBinning(const ZInImageBufferStruct& in) {
+    return !in.isRTV && in.symmetricalBinningMode == 0;
+}
+
+void DoubleRows(const ZInImageBufferStruct& in, const RatioOutcome& outcome, std::uint8_t* image) {
+    // Kept: both sides travel as 16 bits, so larger frames are filled by what is left of them.
+    const auto fillWidth = static_cast<std::uint16_t>(outcome.width);
+    const auto fillHeight = static_cast<std::uint16_t>(outcome.height);
+    const bool isFilledWhole = CanZoomFillRows(fillWidth, fillHeight) &&
+                               fillWidth == outcome.width && fillHeight == outcome.height;
+    if (!isFilledWhole) {
+        // What no step writes must not be what the memory held before.
+        const auto half = static_cast<std::size_t>(outcome.bytes / 2);
+        std::memset(image + half, 0, half);
+    }
+    const std::uint32_t sampleBytes = GetSampleBytes(in);
+    ZoomSpreadRows(image, image, outcome.width, in.height, sampleBytes);
+    ZoomFillRows(in.colourPattern, image, fillWidth, fillHeight, sampleBytes);
+}
+
+void MakeImage(const ZInImageBufferStruct& in, const RatioOutcome& outcome,
+               ZOutImageBufferStruct& out) {
+    out.width = outcome.width;
+    out.height = outcome.height;
+    out.imageSize = static_cast<std::uint32_t>(outcome.bytes);
+    if (outcome.bytes == 0) return;
+    // Kept: a factor that nothing is reduced by gives the smaller size all the same, and leaves the
+    // output's bytes as they were.
+    ReduceRows(in.data, in.width, in.height, FindFactor(in), GetSampleBytes(in), out.data);
+    if (in.isRTV) DoubleRows(in, outcome, out.data);
 }
 
 }  // namespace
@@ -56,17 +89,27 @@ ZFolaryRatioCorrection::ZFolaryRatioCorrection(std::uint16_t newOutputFormat)
 ZFolaryRatioCorrection::~ZFolaryRatioCorrection() = default;
 
 FilterResult ZFolaryRatioCorrection::Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) {
-    if (in->camera == nullptr || in->camera->GetModel() != zmodelFolary) return FilterDeclined;
-    if (!in->isRTV && in->symmetricalBinningMode == 1) return FilterDeclined;
-    FilterResult result = FilterDone;
-    if (in->isRTV) {
-        result = CorrectRTV(*in, *out);
-    } else if (in->symmetricalBinningMode > 1) {
-        result = CorrectHorizontalRatio(*in, *out);
+    const RatioOutcome outcome = Measure(*in, *out);
+    if (outcome.result != FilterDone) return outcome.result;
+    if (!IsWithoutBinning(*in)) {
+        if (!DoesFit(outcome.bytes, *out)) return FilterFailed;
+        MakeImage(*in, outcome, *out);
     }
-    // Kept: a binning of 0 leaves size, width and height of the output as they came.
-    if (result == FilterDone) out->imageFormat = in->imageFormat;
-    return result;
+    out->imageFormat = in->imageFormat;
+    return FilterDone;
+}
+
+RatioOutcome ZFolaryRatioCorrection::Measure(const ZInImageBufferStruct& in,
+                                             const ZOutImageBufferStruct& out) const {
+    if (in.camera == nullptr || in.camera->GetModel() != zmodelFolary) return {FilterDeclined};
+    if (IsWithoutBinning(in)) return {FilterDone, out.width, out.height, out.imageSize};
+    const std::uint32_t factor = FindFactor(in);
+    if (factor == 1) return {FilterDeclined};
+    if (!IsWhole(in)) return {FilterFailed};
+    const std::uint32_t width = CalculateReducedWidth(in.width, factor);
+    const std::uint32_t height = in.isRTV ? in.height * 2 : in.height;
+    const std::uint64_t rows = std::uint64_t{in.height} * (in.isRTV ? 2 : 1);
+    return {FilterDone, width, height, width * rows * GetSampleBytes(in)};
 }
 
 FilterResult ZFolaryRatioCorrection::Init(std::uint32_t, std::uint32_t) {
@@ -75,49 +118,6 @@ FilterResult ZFolaryRatioCorrection::Init(std::uint32_t, std::uint32_t) {
 
 FilterResult ZFolaryRatioCorrection::SetOutputFormat(std::uint32_t format) {
     outputFormat.store(format, std::memory_order_relaxed);
-    return FilterDone;
-}
-
-/// Kept: a factor that nothing is reduced by gives the smaller size all the same, and leaves the
-/// output's bytes as they were.
-FilterResult ZFolaryRatioCorrection::CorrectHorizontalRatio(const ZInImageBufferStruct& in,
-                                                            ZOutImageBufferStruct& out) const {
-    if (!IsWhole(in)) return FilterFailed;
-    const std::uint32_t factor = in.symmetricalBinningMode;
-    const std::uint32_t sampleBytes = GetSampleBytes(in);
-    const std::uint32_t width = CalculateReducedWidth(in.width, factor);
-    const std::uint64_t bytes = std::uint64_t{width} * in.height * sampleBytes;
-    if (!DoesFit(bytes, out)) return FilterFailed;
-    if (bytes != 0) ReduceRows(in.data, in.width, in.height, factor, sampleBytes, out.data);
-    Describe(width, in.height, bytes, out);
-    return FilterDone;
-}
-
-FilterResult ZFolaryRatioCorrection::CorrectRTV(const ZInImageBufferStruct& in,
-                                                ZOutImageBufferStruct& out) const {
-    const std::uint32_t factor = FindVideoFactor(in.camera->GetCCDWidth());
-    if (factor == 0) return FilterDeclined;
-    if (!IsWhole(in)) return FilterFailed;
-    const std::uint32_t sampleBytes = GetSampleBytes(in);
-    const std::uint32_t width = CalculateReducedWidth(in.width, factor);
-    const std::uint64_t reducedBytes = std::uint64_t{width} * in.height * sampleBytes;
-    if (!DoesFit(2 * reducedBytes, out)) return FilterFailed;
-    Describe(width, in.height * 2, 2 * reducedBytes, out);
-    if (reducedBytes == 0) return FilterDone;
-
-    ReduceRows(in.data, in.width, in.height, factor, sampleBytes, out.data);
-    // Kept: both sides travel as 16 bits, so larger frames are filled by what is left of them.
-    const auto fillWidth = static_cast<std::uint16_t>(width);
-    const auto fillHeight = static_cast<std::uint16_t>(out.height);
-    const bool isFilledWhole =
-        CanZoomFillRows(fillWidth, fillHeight) && fillWidth == width && fillHeight == out.height;
-    if (!isFilledWhole) {
-        // What no step writes must not be what the memory held before.
-        const auto bytes = static_cast<std::size_t>(reducedBytes);
-        std::memset(out.data + bytes, 0, bytes);
-    }
-    ZoomSpreadRows(out.data, out.data, width, in.height, sampleBytes);
-    ZoomFillRows(in.colourPattern, out.data, fillWidth, fillHeight, sampleBytes);
     return FilterDone;
 }
 

@@ -8,6 +8,14 @@
 
 namespace ZV {
 
+/// What the ratio correction makes of an image.
+struct RatioOutcome {
+    FilterResult result = FilterDone;
+    std::uint32_t width = 0;  ///< With `FilterDone`, as are the next two.
+    std::uint32_t height = 0;
+    std::uint64_t bytes = 0;
+};
+
 /// Corrects the pixel ratio of a `Folary` mosaic, which is binned down its columns alone, and keeps
 /// it a mosaic. Images of every other model are declined. No state between frames.
 class ZENTARA_API ZFolaryRatioCorrection : public ZImageFilter {
@@ -25,16 +33,16 @@ class ZENTARA_API ZFolaryRatioCorrection : public ZImageFilter {
     /// `FilterFailed` for a frame with fewer bytes than its size asks for, and for an output that
     /// does not hold the result.
     FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
+    /// What `Process` would make of this input if the output held it. Nothing is written. The
+    /// output's own size, width and height are those of a frame with a binning mode of 0.
+    [[nodiscard]] RatioOutcome Measure(const ZInImageBufferStruct& in,
+                                       const ZOutImageBufferStruct& out) const;
     /// Does nothing. `FilterDone`.
     FilterResult Init(std::uint32_t width, std::uint32_t height) override;
     /// Stores the format and does nothing with it. `FilterDone`.
     FilterResult SetOutputFormat(std::uint32_t format) override;
 
   private:
-    FilterResult CorrectHorizontalRatio(const ZInImageBufferStruct& in,
-                                        ZOutImageBufferStruct& out) const;
-    FilterResult CorrectRTV(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out) const;
-
     std::atomic<std::uint32_t> outputFormat;
 };
 

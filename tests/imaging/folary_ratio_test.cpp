@@ -396,6 +396,32 @@ TEST_F(FolaryRatio, AnOutputThatDoesNotHoldTheResultIsNotWritten) {
     EXPECT_TRUE(IsUntouched(80));
 }
 
+TEST_F(FolaryRatio, IsMeasuredAsItWillBeMadeWithoutAByteWritten) {
+    Give(MakeRandom(48 * 8, 1, 5), 48, 8);
+    for (const bool isRTV : {false, true}) {
+        for (const std::uint32_t binning : {0U, 1U, 2U, 3U, 4U, 5U, 49U, 0xFFFFFFFFU}) {
+            for (const std::uint32_t size : {48U * 8, 48U * 8 - 1}) {
+                in.isRTV = isRTV;
+                in.symmetricalBinningMode = binning;
+                in.imageSize = size;
+                out.imageSize = 7;
+                out.width = 9;
+                out.height = 11;
+                const Bytes before = output;
+
+                const RatioOutcome outcome = filter.Measure(in, out);
+
+                EXPECT_EQ(before, output);
+                EXPECT_EQ(outcome.result, Process()) << binning << (isRTV ? ", video" : "");
+                if (outcome.result != FilterDone) continue;
+                EXPECT_EQ(outcome.bytes, out.imageSize);
+                EXPECT_EQ(outcome.width, out.width);
+                EXPECT_EQ(outcome.height, out.height);
+            }
+        }
+    }
+}
+
 TEST_F(FolaryRatio, AFrameWithoutPixelsIsCorrectedToNothing) {
     Give({}, 0, 0);
     in.data = nullptr;

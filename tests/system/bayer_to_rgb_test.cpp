@@ -298,19 +298,56 @@ TEST_F(BayerToRgb, AnEmptyFrameGivesAnEmptyImage) {
     EXPECT_EQ(7, pixel);
 }
 
-TEST_F(BayerToRgb, SizesOf65535AndMoreComeBack) {
+TEST_F(BayerToRgb, ASizeThatIsRefusedNeedsNoRoom) {
     OwnedFrame mosaic = GrabMosaic();
-    std::vector<std::uint8_t> room(1 << 20);
-    for (const std::uint32_t side : {65535u, 65536u, 0x7FFFFFFFu, 0xFFFFFFFFu}) {
-        mosaic->width = mosaic->height = side;
-        OwnedFrame target(0);
-        target->format = zfmtRGB24;
-        target->pBuffer = room.data();
-        EXPECT_ZERR(zerrNone, Zentara_BayerToRgb(1, mosaic.Get(), target.Get())) << "vouched for";
-        target->bufferSize = 1 << 20;
-        EXPECT_ZERR(zerrBufferTooSmall, Zentara_BayerToRgb(1, mosaic.Get(), target.Get()));
+    const std::vector<std::uint8_t> untouched(1 << 20, ClientFrame::Untouched);
+    std::vector<std::uint8_t> room = untouched;
+    for (const std::uint32_t side : {65U, 65535U, 65536U, 0x7FFFFFFFU, 0xFFFFFFFFU}) {
+        for (const std::uint32_t bufferSize : {0U, 1U, 1U << 20}) {
+            mosaic->width = mosaic->height = side;
+            OwnedFrame target(0);
+            target->format = zfmtRGB24;
+            target->width = 5;
+            target->height = 7;
+            target->pBuffer = room.data();
+            target->bufferSize = bufferSize;
+
+            EXPECT_ZERR(zerrNone, Zentara_BayerToRgb(1, mosaic.Get(), target.Get())) << side;
+
+            EXPECT_EQ(5u, target->width);
+            EXPECT_EQ(7u, target->height);
+            EXPECT_EQ(105u, target->size);
+        }
     }
-    EXPECT_EQ(std::vector<std::uint8_t>(1 << 20), room);
+    EXPECT_EQ(untouched, room);
+}
+
+TEST_F(BayerToRgb, DoesNotScaleTheColours) {
+    scales[0] = 2000;
+    scales[1] = 500;
+    scales[2] = 1500;
+    Send(zfmtBayer8, zfmtRGB24, zbayerAverage, false);
+    OwnedFrame mosaic = GrabMosaic();
+    for (const std::uint32_t algorithm : MosaicAlgorithms) {
+        OwnedFrame target = MakeTarget(mosaic, zfmtRGB24);
+
+        ASSERT_ZERR(zerrNone, Zentara_BayerToRgb(algorithm, mosaic.Get(), target.Get()));
+
+        const ReferenceColours colours = MakeReferenceColours(ReadMosaic(mosaic), algorithm);
+        EXPECT_EQ(PackReferenceColours(colours, zfmtRGB24), target.GetImage());
+        EXPECT_NE(Finish(mosaic, algorithm, zfmtRGB24), target.GetImage());
+    }
+}
+
+TEST_F(BayerToRgb, AFrameOfNoBytesInsideItsTargetGivesTheColoursOfNoLight) {
+    OwnedFrame mosaic = GrabMosaic();
+    OwnedFrame target = MakeTarget(mosaic, zfmtRGB24);
+    mosaic->pBuffer = target.pixels.data() + 5;
+    mosaic->size = mosaic->bufferSize = 0;
+
+    EXPECT_ZERR(zerrNone, Zentara_BayerToRgb(zbayerAverage, mosaic.Get(), target.Get()));
+
+    EXPECT_EQ(std::vector<std::uint8_t>(target.pixels.size()), target.GetImage());
 }
 
 class LoggedBayerToRgb : public LogFile, public BayerToRgb {};

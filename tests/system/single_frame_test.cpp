@@ -4,43 +4,10 @@
 #include <thread>
 #include <vector>
 
-#include "system/mosaic_camera.h"
+#include "system/single_frame.h"
 
 namespace ZV::Test {
 namespace {
-
-class SingleFrame : public MosaicCamera {
-  protected:
-    explicit SingleFrame(std::string_view scenario = SmallColour) : MosaicCamera(scenario) {}
-
-    Zentara_Settings MakeBlock(std::uint32_t format, std::uint32_t algorithm) {
-        return MakeSettings(zfmtBayer8, format, algorithm, false);
-    }
-    ZentaraResult Process(std::uint32_t format, std::uint32_t algorithm, OwnedFrame& from,
-                          OwnedFrame& to) {
-        Zentara_Settings block = MakeBlock(format, algorithm);
-        return Zentara_PostProcessSingleFrame(handle, &block, from.Get(), to.Get());
-    }
-    static OwnedFrame MakeTarget(OwnedFrame& mosaic, std::uint32_t format) {
-        return OwnedFrame(std::max<std::size_t>(
-            Zentara_CalcImageSize(format, mosaic->width, mosaic->height), mosaic->size));
-    }
-    void ExpectFinished(OwnedFrame& mosaic, std::uint32_t format, std::uint32_t algorithm) {
-        OwnedFrame target = MakeTarget(mosaic, format);
-        ASSERT_ZERR(zerrNone, Process(format, algorithm, mosaic, target));
-        EXPECT_EQ(Finish(mosaic, algorithm, format), target.GetImage())
-            << format << " by " << algorithm;
-        EXPECT_EQ(format, target->format);
-        EXPECT_EQ(mosaic->width, target->width);
-        EXPECT_EQ(mosaic->height, target->height);
-        EXPECT_EQ(mosaic->bits, target->bits);
-        EXPECT_EQ(Zentara_CalcImageSize(format, mosaic->width, mosaic->height), target->size);
-    }
-    static Zentara_Frame GetRecord(OwnedFrame& frame) { return *frame.Get(); }
-    static void ExpectSameRecord(const Zentara_Frame& expected, OwnedFrame& frame) {
-        EXPECT_EQ(0, std::memcmp(&expected, frame.Get(), sizeof(expected)));
-    }
-};
 
 TEST_F(SingleFrame, FinishesBytesByEveryAlgorithmInEveryFormat) {
     OwnedFrame mosaic = GrabMosaic();
@@ -68,6 +35,18 @@ TEST_F(SingleFrame, ScalesTheColoursByTheLastSend) {
 
     ExpectFinished(mosaic, zfmtRGB24, zbayerAverage);
     ExpectFinished(mosaic, zfmtXRGB32, zbayerBicubic);
+}
+
+TEST_F(SingleFrame, WorksForAnOpenCameraAlone) {
+    OwnedFrame mosaic = GrabMosaic();
+    OwnedFrame target = MakeTarget(mosaic, zfmtRGB24);
+    const Zentara_Frame before = GetRecord(target);
+    for (const ZentaraHandle camera : {ZentaraHandle{0}, ZentaraHandle{0x1234}, handle + 8}) {
+        std::memcpy(mosaic->privateCamera, &camera, sizeof(camera));
+        EXPECT_ZERR(zerrBadHandle, Process(zfmtRGB24, zbayerFast, mosaic, target));
+    }
+    ExpectSameRecord(before, target);
+    EXPECT_TRUE(target.IsUntouchedFrom(0));
 }
 
 class FreshCamera : public SingleFrame {
@@ -194,20 +173,74 @@ TEST_F(SingleFrame, AsksForTheLargestImageOnTheWayToTheByte) {
         std::uint32_t inFormat, outFormat, needed;
     };
     constexpr std::uint32_t Pixels = 64 * 48;
-    const Case cases[] = {{zfmtBayer8, zfmtRGB24, 3 * Pixels}, {zfmtBayer8, zfmtXRGB32, 4 * Pixels},
-                          {zfmtBayer8, zfmtRGB48, 6 * Pixels}, {zfmtBayer8, zfmtBayer8, Pixels},
-                          {zfmtBayer8, zfmtRGBPlane8, Pixels}, {zfmtRGB24, zfmtRGB24, Pixels}};
+    const Case cases[] = {
+        {zfmtBayer8, zfmtRGB24, 3 * Pixels},    {zfmtBayer8, zfmtXRGB32, 4 * Pixels},
+        {zfmtBayer8, zfmtRGB48, 6 * Pixels},    {zfmtBayer8, zfmtBayer8, Pixels},
+        {zfmtBayer8, zfmtRGBPlane8, Pixels},    {zfmtRGB24, zfmtRGB24, Pixels},
+        {zfmtBayer16, zfmtRGB48, 6 * Pixels},   {zfmtBayer16, zfmtRGB24, 3 * Pixels},
+        {zfmtBayer16, zfmtBayer16, 2 * Pixels}, {zfmtBayer16, zfmtRGBPlane16, 2 * Pixels},
+    };
     for (const Case& row : cases) {
-        mosaic->format = row.inFormat;
-        OwnedFrame exact(row.needed), oneLess(row.needed - 1);
+        for (const std::uint32_t algorithm : {zbayerFast, zbayerAverage, zbayerBicubic}) {
+            const bool isOfWords = row.inFormat == zfmtBayer16;
+            OwnedFrame from(isOfWords ? 2 * Pixels : Pixels);
+            CopyRecord(mosaic, from);
+            from->format = row.inFormat;
+            from->bits = isOfWords ? 16 : 8;
+            OwnedFrame exact(row.needed), oneLess(row.needed - 1);
 
-        EXPECT_ZERR(zerrBufferTooSmall, Process(row.outFormat, zbayerFast, mosaic, oneLess));
-        EXPECT_ZERR(zerrNone, Process(row.outFormat, zbayerFast, mosaic, exact));
-        EXPECT_TRUE(oneLess.IsUntouchedFrom(0));
-        EXPECT_EQ(0u, oneLess->size);
-        exact->bufferSize = 0;
-        EXPECT_ZERR(zerrNone, Process(row.outFormat, zbayerFast, mosaic, exact)) << "vouched for";
+            EXPECT_ZERR(zerrBufferTooSmall, Process(row.outFormat, algorithm, from, oneLess));
+            EXPECT_ZERR(zerrNone, Process(row.outFormat, algorithm, from, exact));
+            EXPECT_TRUE(oneLess.IsUntouchedFrom(0));
+            EXPECT_EQ(0u, oneLess->size);
+            exact->bufferSize = 0;
+            EXPECT_ZERR(zerrNone, Process(row.outFormat, algorithm, from, exact)) << "vouched for";
+        }
     }
+}
+
+TEST_F(SingleFrame, KeptAFrameLargerThanTheSensorIsCopiedAndNamedAsFinished) {
+    OwnedFrame mosaic = GrabMosaic();
+    const std::uint32_t bytes = mosaic->size;
+    struct Case {
+        std::uint32_t width, height;
+    };
+    for (const Case& row : {Case{65, 48}, Case{65535, 65535}, Case{65536, 65536},
+                            Case{0x80000000, 1}, Case{0xFFFFFFFF, 0xFFFFFFFF}}) {
+        SCOPED_TRACE(row.width);
+        mosaic->width = row.width;
+        mosaic->height = row.height;
+        for (const std::uint32_t room : {bytes, 0U}) {
+            OwnedFrame target(2 * bytes), small(2 * bytes);
+            target->bufferSize = room;
+            small->bufferSize = bytes - 1;
+
+            EXPECT_ZERR(zerrNone, Process(zfmtRGB24, zbayerBicubic, mosaic, target));
+            EXPECT_ZERR(zerrBufferTooSmall, Process(zfmtRGB24, zbayerBicubic, mosaic, small));
+
+            EXPECT_EQ(row.width, target->width);
+            EXPECT_EQ(row.height, target->height);
+            EXPECT_EQ(static_cast<std::uint32_t>(zfmtRGB24), target->format);
+            EXPECT_EQ(
+                static_cast<std::uint32_t>(Zentara_CalcImageSize(zfmtRGB24, row.width, row.height)),
+                target->size);
+            EXPECT_TRUE(
+                std::equal(mosaic.pixels.begin(), mosaic.pixels.end(), target.pixels.begin()));
+            EXPECT_TRUE(target.IsUntouchedFrom(bytes));
+            EXPECT_TRUE(small.IsUntouchedFrom(0));
+        }
+    }
+}
+
+TEST_F(SingleFrame, AFrameOfNoBytesInsideItsTargetGivesTheColoursOfNoLight) {
+    OwnedFrame mosaic = GrabMosaic();
+    OwnedFrame target = MakeTarget(mosaic, zfmtRGB24);
+    mosaic->pBuffer = target.pixels.data() + 5;
+    mosaic->size = mosaic->bufferSize = 0;
+
+    EXPECT_ZERR(zerrNone, Process(zfmtRGB24, zbayerAverage, mosaic, target));
+
+    EXPECT_EQ(std::vector<std::uint8_t>(target.pixels.size()), target.GetImage());
 }
 
 TEST_F(SingleFrame, KeptAnAlgorithmAbove4KeepsTheOneInForceAndRuns) {
@@ -267,6 +300,29 @@ TEST_F(SingleFrame, KeptColoursAreBalancedInTheirOwnFormatAndNamedByTheSettings)
     }
 }
 
+TEST_F(SingleFrame, KeptColoursOfFewerBytesThanTheirSizeAsksForAreCopiedAndNotBalanced) {
+    scales[0] = 2000;
+    Send(zfmtBayer8, zfmtRGB24, zbayerFast, false);
+    OwnedFrame mosaic = GrabMosaic();
+    OwnedFrame colours(3u * 64 * 48 - 1);
+    CopyRecord(mosaic, colours);
+    colours->format = zfmtRGB24;
+    std::fill(colours.pixels.begin(), colours.pixels.end(), std::uint8_t{100});
+    for (const std::uint32_t height : {48U, 49U, 0xFFFFFFFFU}) {
+        colours->height = height;
+        OwnedFrame target(4u * 64 * 48);
+
+        ASSERT_ZERR(zerrNone, Process(zfmtRGB24, zbayerFast, colours, target));
+
+        EXPECT_EQ(height, target->height);
+        EXPECT_EQ(static_cast<std::uint32_t>(Zentara_CalcImageSize(zfmtRGB24, 64, height)),
+                  target->size);
+        EXPECT_TRUE(
+            std::equal(colours.pixels.begin(), colours.pixels.end(), target.pixels.begin()));
+        EXPECT_TRUE(target.IsUntouchedFrom(colours.pixels.size()));
+    }
+}
+
 TEST_F(SingleFrame, MayWriteOverTheFrameItReads) {
     OwnedFrame mosaic = GrabMosaic();
     const auto expected = Finish(mosaic, zbayerAverage, zfmtRGB24);
@@ -279,81 +335,6 @@ TEST_F(SingleFrame, MayWriteOverTheFrameItReads) {
     ASSERT_ZERR(zerrNone, Process(zfmtRGB24, zbayerAverage, both, both));
 
     EXPECT_EQ(expected, both.GetImage());
-}
-
-class FolaryFrame : public SingleFrame {
-  protected:
-    FolaryFrame() : SingleFrame("folary") {}
-    void SetUp() override { OpenedCamera::SetUp(); }
-
-    /// A mosaic of 64 x 48 bytes that says it came from this camera.
-    OwnedFrame MakeMosaic() const {
-        OwnedFrame mosaic(64 * 48);
-        for (std::size_t i = 0; i < mosaic.pixels.size(); ++i) {
-            mosaic.pixels[i] = static_cast<std::uint8_t>(i * 7);
-        }
-        mosaic->format = zfmtBayer8;
-        mosaic->bits = 8;
-        mosaic->width = 64;
-        mosaic->height = 48;
-        mosaic->size = 64 * 48;
-        mosaic->privateBinning = 1;
-        std::memcpy(mosaic->privateCamera, &handle, sizeof(handle));
-        return mosaic;
-    }
-};
-
-TEST_F(FolaryFrame, AsksForTheImageThatTheCorrectedMosaicGives) {
-    struct Case {
-        const char* what;
-        std::uint32_t binning, realTime, format, width, height, needed;
-    };
-    const Case cases[] = {
-        {"not binned", 1, 0, zfmtRGB24, 64, 48, 3 * 64 * 48},
-        {"binned by 2", 2, 0, zfmtRGB24, 32, 48, 3 * 32 * 48},
-        {"binned by 3", 3, 0, zfmtXRGB32, 20, 48, 4 * 20 * 48},
-        {"binned by 4, mosaic", 4, 0, zfmtBayer8, 16, 48, 16 * 48},
-        {"real time", 1, 1, zfmtRGB24, 16, 96, 3 * 16 * 96},
-        {"real time, binned", 2, 7, zfmtBayer8, 16, 96, 16 * 96},
-        {"binned by 5", 5, 0, zfmtRGB24, 12, 48, 3 * 12 * 48},
-        {"binned beyond the width", 0xFFFFFFFF, 0, zfmtRGB24, 0, 48, 0},
-        {"not reported", 0, 0, zfmtRGB24, 20, 10, 3 * 20 * 10},
-    };
-    for (const Case& row : cases) {
-        SCOPED_TRACE(row.what);
-        OwnedFrame mosaic = MakeMosaic();
-        mosaic->privateBinning = row.binning;
-        mosaic->privateRealTime = row.realTime;
-        OwnedFrame exact(std::max(row.needed, 1U)), oneLess(std::max(row.needed, 2U) - 1);
-        exact->width = oneLess->width = 20;
-        exact->height = oneLess->height = 10;
-
-        EXPECT_ZERR(row.needed > 1 ? zerrBufferTooSmall : zerrNone,
-                    Process(row.format, zbayerFast, mosaic, oneLess));
-        EXPECT_ZERR(zerrNone, Process(row.format, zbayerFast, mosaic, exact));
-
-        EXPECT_EQ(row.width, exact->width);
-        EXPECT_EQ(row.height, exact->height);
-        EXPECT_EQ(row.format, exact->format);
-        EXPECT_EQ(Zentara_CalcImageSize(row.format, row.width, row.height), exact->size);
-    }
-}
-
-TEST_F(FolaryFrame, SizesThatLieComeBack) {
-    for (const std::uint32_t side : {65535U, 65536U, 0x80000000U, 0xFFFFFFFFU}) {
-        for (const std::uint32_t realTime : {0U, 1U}) {
-            OwnedFrame mosaic = MakeMosaic();
-            mosaic->width = mosaic->height = side;
-            mosaic->privateBinning = 2;
-            mosaic->privateRealTime = realTime;
-            OwnedFrame target(4096);
-            const ZentaraResult result = Process(zfmtRGB24, zbayerAverage, mosaic, target);
-            EXPECT_ZERR(zerrBufferTooSmall, result) << side;
-            target->bufferSize = 0;
-            EXPECT_ZERR(zerrNone, Process(zfmtRGB24, zbayerAverage, mosaic, target)) << side;
-            EXPECT_TRUE(target.IsUntouchedFrom(0)) << side;
-        }
-    }
 }
 
 // ---- Raw and monochrome frames are copied ----
@@ -460,6 +441,31 @@ TEST_F(CopiedFrame, MayBeTheFrameItselfOrShareItsBuffer) {
     EXPECT_EQ(expected, shared.GetImage());
 }
 
+TEST_F(CopiedFrame, IsRefusedForItsSettingsFirstThenForItsCameraAndThenForItsPixels) {
+    OwnedFrame from = GrabAs(zfmtRaw8);
+    from->pBuffer = nullptr;
+    GrownFrame to(16);
+    Zentara_Settings block = MakeBlock(99, 0);
+    Zentara_Settings corrupt = block;
+    WriteField<std::uint32_t>(corrupt, 252, 0);
+    const auto copy = [&](ZentaraHandle camera, Zentara_Settings* settings) {
+        return Zentara_PostProcessSingleFrame(camera, settings, from.Get(), &to.frame);
+    };
+
+    EXPECT_ZERR(zerrBadSettings, copy(0x1234, nullptr));
+    EXPECT_ZERR(zerrBadSettings, copy(0x1234, &corrupt));
+    EXPECT_ZERR(zerrBadHandle, copy(0x1234, &block));
+    EXPECT_ZERR(zerrBadParameter, copy(handle, &block));
+    EXPECT_EQ(16u, to.frame.bufferSize);
+    EXPECT_EQ(0u, to.frame.size);
+
+    from->pBuffer = from.pixels.data();
+    SetHandleOf(block, 0x1234);
+    from->privateCamera[0] = from->privateCamera[1] = 0x77777777;
+    EXPECT_ZERR(zerrNone, copy(handle, &block)) << "neither block nor frame is asked for a camera";
+    ExpectCopied(from, to);
+}
+
 TEST_F(CopiedFrame, IsRefusedWithoutPixelsToRead) {
     OwnedFrame from = GrabAs(zfmtMono8);
     GrownFrame to(16);
@@ -501,6 +507,26 @@ TEST_F(SingleFrameOfTwoCameras, KeptTheFramesCameraWorksWhateverTheHandle) {
     ASSERT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(second, &other));
     EXPECT_EQ(static_cast<std::uint32_t>(zfmtRGB24), GetWord(other, zprmPostProcessImageFormat));
     EXPECT_ZERR(zerrNone, Zentara_CloseCamera(second));
+}
+
+TEST_F(SingleFrameOfTwoCameras, IsRefusedOnceTheFramesCameraIsClosed) {
+    ZentaraHandle second = 0;
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(1, &second));
+    OwnedFrame mosaic = GrabMosaic();
+    std::memcpy(mosaic->privateCamera, &second, sizeof(second));
+    mosaic->width = mosaic->height = 32;
+    mosaic->size = 32 * 32;
+    OwnedFrame target = MakeTarget(mosaic, zfmtRGB24);
+    target->format = zfmtRGB24;
+    EXPECT_ZERR(zerrNone, Process(zfmtRGB24, zbayerFast, mosaic, target));
+    EXPECT_ZERR(zerrNone, Zentara_BayerToRgb(zbayerFast, mosaic.Get(), target.Get()));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(second));
+    const Zentara_Frame before = GetRecord(target);
+
+    EXPECT_ZERR(zerrBadHandle, Process(zfmtRGB24, zbayerFast, mosaic, target));
+    EXPECT_ZERR(zerrBadHandle, Zentara_BayerToRgb(zbayerFast, mosaic.Get(), target.Get()));
+
+    ExpectSameRecord(before, target);
 }
 
 TEST_F(SingleFrame, MayBeFinishedBesideADelivery) {
