@@ -24,8 +24,14 @@ double CalculateStep(std::int32_t sourceLength, double factor) {
     return length > 1.0 ? (sourceLength - 1) / (length - 1.0) : 0.0;
 }
 
+/// The sample at or before the position, at most the last one: the rounding of the step can carry
+/// the end of a long row beyond what an index holds.
+std::int32_t FindIndex(double position, std::int32_t last) {
+    return static_cast<std::int32_t>(std::min(position + Slack, static_cast<double>(last)));
+}
+
 LinearPosition PlaceLinear(double position, std::int32_t last) {
-    const auto index = static_cast<std::int32_t>(position + Slack);
+    const std::int32_t index = FindIndex(position, last);
     if (index >= last) return {last - 1, WeightOne};
     return {index, static_cast<std::int32_t>((position - index) * double{WeightOne} + Slack)};
 }
@@ -37,7 +43,7 @@ CubicWeights CalculateCubicWeights(float t) {
 
 /// The four samples move inward at the edges, so that they lie inside.
 CubicPosition PlaceCubic(double position, std::int32_t last) {
-    const auto index = static_cast<std::int32_t>(position + Slack);
+    const std::int32_t index = FindIndex(position, last);
     if (index >= last) return {last - 3, CalculateCubicWeights(2.0F)};
     std::int32_t base = index;
     if (index == 0) {

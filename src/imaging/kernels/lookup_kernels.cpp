@@ -1,6 +1,7 @@
 #include <algorithm>
 #include <memory>
 #include <new>
+#include <numeric>
 
 #include "imaging/kernels/image_rows.h"
 #include "imaging/kernels/kernel_selection.h"
@@ -80,8 +81,8 @@ void ApplyTables(void (*lookupRow)(const Value*, Sample*, std::size_t), const Va
 std::int32_t FindLevel(const std::int32_t* levels, std::int32_t count, std::int32_t sample) {
     std::int32_t reached = -1;
     std::int32_t beyond = count;
-    while (beyond - reached > 1) {
-        const std::int32_t middle = reached + (beyond - reached) / 2;
+    while (reached + 1 < beyond) {
+        const std::int32_t middle = std::midpoint(reached, beyond);
         (levels[middle] <= sample ? reached : beyond) = middle;
     }
     return reached;
