@@ -5,13 +5,12 @@
 #include <array>
 #include <cstddef>
 #include <cstring>
-#include <memory>
-#include <new>
 
 #include "imaging/kernels/enlarge_rows.h"
 #include "imaging/kernels/image_rows.h"
 #include "imaging/kernels/kernel_selection.h"
 #include "imaging/kernels/kernels.h"
+#include "imaging/kernels/scratch.h"
 
 namespace ZV {
 
@@ -122,7 +121,7 @@ template <typename Item, std::size_t Slots>
 class RowCache {
   public:
     explicit RowCache(std::size_t rowLength)
-        : items(new (std::nothrow) Item[Slots * rowLength]), length(rowLength) {
+        : items(MakeScratch<Item>(Slots * rowLength)), length(rowLength) {
         rows.fill(-1);
     }
     [[nodiscard]] bool IsMade() const { return items != nullptr; }
@@ -139,15 +138,15 @@ class RowCache {
     }
 
   private:
-    std::unique_ptr<Item[]> items;
+    Scratch<Item> items;
     std::size_t length;
     std::array<std::int32_t, Slots> rows{};
 };
 
 /// The source samples of the nearest interpolation in one direction; null without memory.
-std::unique_ptr<std::int32_t[]> PlaceNearest(std::int32_t sourceLength, std::int32_t outputLength,
-                                             double factor) {
-    std::unique_ptr<std::int32_t[]> indices(new (std::nothrow) std::int32_t[outputLength]);
+Scratch<std::int32_t> PlaceNearest(std::int32_t sourceLength, std::int32_t outputLength,
+                                   double factor) {
+    auto indices = MakeScratch<std::int32_t>(static_cast<std::size_t>(outputLength));
     if (indices == nullptr) return indices;
     const double step = 1.0 / factor;
     double position = step / 2.0;

@@ -1,7 +1,7 @@
 #include "imaging/kernels/enlarge_rows.h"
 
 #include <algorithm>
-#include <new>
+#include <utility>
 
 namespace ZV {
 
@@ -13,11 +13,6 @@ constexpr std::int32_t WeightOne = 16384;
 constexpr std::size_t GroupOutputs = 8;
 constexpr std::size_t GroupBytes = 16;
 constexpr std::int32_t GroupCubicSamples = 8;
-
-template <typename Item>
-std::unique_ptr<Item[]> MakeItems(std::size_t count) {
-    return std::unique_ptr<Item[]>(new (std::nothrow) Item[count]);
-}
 
 double CalculateStep(std::int32_t sourceLength, double factor) {
     const double length = sourceLength * factor;
@@ -102,10 +97,10 @@ std::uint8_t* WritePair(std::int32_t sample, std::size_t sampleBytes, std::uint8
 LinearPositions::LinearPositions(std::int32_t sourceLength, std::int32_t outputLength,
                                  double factor, std::size_t sampleBytes) {
     const auto count = static_cast<std::size_t>(outputLength);
-    auto made = MakeItems<LinearPosition>(count);
-    bases = MakeItems<std::int32_t>(count / GroupOutputs + 1);
-    pairs = MakeItems<std::uint8_t>(count * 2 * sampleBytes);
-    weights = MakeItems<std::int16_t>(count * 2);
+    auto made = MakeScratch<LinearPosition>(count);
+    bases = MakeScratch<std::int32_t>(count / GroupOutputs + 1);
+    pairs = MakeScratch<std::uint8_t>(count * 2 * sampleBytes);
+    weights = MakeScratch<std::int16_t>(count * 2);
     if (!made || !bases || !pairs || !weights) return;
     PlaceOutputs(sourceLength, outputLength, factor, PlaceLinear, made.get());
     const std::size_t groups =
@@ -125,10 +120,10 @@ LinearPositions::LinearPositions(std::int32_t sourceLength, std::int32_t outputL
 CubicPositions::CubicPositions(std::int32_t sourceLength, std::int32_t outputLength,
                                double factor) {
     const auto count = static_cast<std::size_t>(outputLength);
-    auto made = MakeItems<CubicPosition>(count);
-    bases = MakeItems<std::int32_t>(count / GroupOutputs + 1);
-    places = MakeItems<std::int32_t>(count);
-    weights = MakeItems<float>(3 * count);
+    auto made = MakeScratch<CubicPosition>(count);
+    bases = MakeScratch<std::int32_t>(count / GroupOutputs + 1);
+    places = MakeScratch<std::int32_t>(count);
+    weights = MakeScratch<float>(3 * count);
     if (!made || !bases || !places || !weights) return;
     PlaceOutputs(sourceLength, outputLength, factor, PlaceCubic, made.get());
     const std::size_t groups =

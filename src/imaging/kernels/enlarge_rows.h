@@ -2,9 +2,9 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <memory>
 
 #include "imaging/kernels/row_kernels.h"
+#include "imaging/kernels/scratch.h"
 
 namespace ZV {
 
@@ -24,10 +24,10 @@ class LinearPositions {
     [[nodiscard]] const LinearPlan& GetPlan() const { return plan; }
 
   private:
-    std::unique_ptr<LinearPosition[]> positions;
-    std::unique_ptr<std::int32_t[]> bases;
-    std::unique_ptr<std::uint8_t[]> pairs;
-    std::unique_ptr<std::int16_t[]> weights;
+    Scratch<LinearPosition> positions;
+    Scratch<std::int32_t> bases;
+    Scratch<std::uint8_t> pairs;
+    Scratch<std::int16_t> weights;
     LinearPlan plan;
 };
 
@@ -43,10 +43,10 @@ class CubicPositions {
     [[nodiscard]] const CubicPlan& GetPlan() const { return plan; }
 
   private:
-    std::unique_ptr<CubicPosition[]> positions;
-    std::unique_ptr<std::int32_t[]> bases;
-    std::unique_ptr<std::int32_t[]> places;
-    std::unique_ptr<float[]> weights;
+    Scratch<CubicPosition> positions;
+    Scratch<std::int32_t> bases;
+    Scratch<std::int32_t> places;
+    Scratch<float> weights;
     CubicPlan plan;
 };
 

@@ -1,11 +1,10 @@
 #include <algorithm>
-#include <memory>
-#include <new>
 #include <numeric>
 
 #include "imaging/kernels/image_rows.h"
 #include "imaging/kernels/kernel_selection.h"
 #include "imaging/kernels/kernels.h"
+#include "imaging/kernels/scratch.h"
 
 namespace ZV {
 
@@ -130,7 +129,7 @@ KernelStatus LookUp16(void (*lookupRow)(const std::uint16_t*, Word*, std::size_t
     }
     constexpr std::size_t Entries = Channels * 65536;
     // One word more: the row loops may read an entry as the low half of 32 bits.
-    const std::unique_ptr<std::uint16_t[]> tables(new (std::nothrow) std::uint16_t[Entries + 1]);
+    const auto tables = MakeScratch<std::uint16_t>(Entries + 1);
     if (tables == nullptr) return KernelNoMemory;
     tables[Entries] = 0;
     FillTables<std::uint16_t, Channels>(lookup, tables.get());
