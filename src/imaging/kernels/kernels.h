@@ -2,8 +2,6 @@
 
 #include <cstdint>
 
-#include "zentara/zentara.h"
-
 namespace ZV {
 
 /// The pixel kernels of the filters. They know nothing of cameras: they see pointers, row lengths
@@ -48,44 +46,40 @@ enum KernelInterpolation : std::int32_t {
 
 /// Sample i of every row of the planes goes to pixel i, side by side.
 /// KernelNullPointer, KernelBadSize.
-ZENTARA_API KernelStatus PackPlanes8x4(const void* const planes[4], std::int32_t planeRowBytes,
-                                       void* pixels, std::int32_t pixelRowBytes, KernelSize size);
-ZENTARA_API KernelStatus PackPlanes8x3(const void* const planes[3], std::int32_t planeRowBytes,
-                                       void* pixels, std::int32_t pixelRowBytes, KernelSize size);
-ZENTARA_API KernelStatus PackPlanes16x3(const void* const planes[3], std::int32_t planeRowBytes,
-                                        void* pixels, std::int32_t pixelRowBytes, KernelSize size);
+KernelStatus PackPlanes8x4(const void* const planes[4], std::int32_t planeRowBytes, void* pixels,
+                           std::int32_t pixelRowBytes, KernelSize size);
+KernelStatus PackPlanes8x3(const void* const planes[3], std::int32_t planeRowBytes, void* pixels,
+                           std::int32_t pixelRowBytes, KernelSize size);
+KernelStatus PackPlanes16x3(const void* const planes[3], std::int32_t planeRowBytes, void* pixels,
+                            std::int32_t pixelRowBytes, KernelSize size);
 
 /// Enlarges `sourceRect`, cut to the image, by the two factors. Samples of the destination beyond
 /// the result stay untouched. The interpolation falls to one that the source is large enough for:
 /// 16 to 4 below 8 samples in a direction, 4 to 2 below 4, 2 to 1 below 2.
 /// KernelNullPointer, KernelBadSize (source size, then rectangle), KernelNoOverlap, KernelBadSize
 /// (destination), KernelBadFactor, KernelBadInterpolation, KernelEmptyResult, KernelNoMemory.
-ZENTARA_API KernelStatus EnlargePlane8(const void* source, KernelSize sourceSize,
-                                       std::int32_t sourceRowBytes, KernelRect sourceRect,
-                                       void* destination, std::int32_t destinationRowBytes,
-                                       KernelSize destinationSize, double xFactor, double yFactor,
-                                       std::int32_t interpolation);
-ZENTARA_API KernelStatus EnlargePlane16(const void* source, KernelSize sourceSize,
-                                        std::int32_t sourceRowBytes, KernelRect sourceRect,
-                                        void* destination, std::int32_t destinationRowBytes,
-                                        KernelSize destinationSize, double xFactor, double yFactor,
-                                        std::int32_t interpolation);
+KernelStatus EnlargePlane8(const void* source, KernelSize sourceSize, std::int32_t sourceRowBytes,
+                           KernelRect sourceRect, void* destination,
+                           std::int32_t destinationRowBytes, KernelSize destinationSize,
+                           double xFactor, double yFactor, std::int32_t interpolation);
+KernelStatus EnlargePlane16(const void* source, KernelSize sourceSize, std::int32_t sourceRowBytes,
+                            KernelRect sourceRect, void* destination,
+                            std::int32_t destinationRowBytes, KernelSize destinationSize,
+                            double xFactor, double yFactor, std::int32_t interpolation);
 
 /// Adds the source to the destination, held at the greatest sample. A scale other than 0 is not
 /// there. KernelNullPointer, KernelBadSize (a scale too). Row lengths are not tested.
-ZENTARA_API KernelStatus AddPlane8(const void* source, std::int32_t sourceRowBytes,
-                                   void* destination, std::int32_t destinationRowBytes,
-                                   KernelSize size, std::int32_t scale);
-ZENTARA_API KernelStatus AddPlane16(const void* source, std::int32_t sourceRowBytes,
-                                    void* destination, std::int32_t destinationRowBytes,
-                                    KernelSize size, std::int32_t scale);
+KernelStatus AddPlane8(const void* source, std::int32_t sourceRowBytes, void* destination,
+                       std::int32_t destinationRowBytes, KernelSize size, std::int32_t scale);
+KernelStatus AddPlane16(const void* source, std::int32_t sourceRowBytes, void* destination,
+                        std::int32_t destinationRowBytes, KernelSize size, std::int32_t scale);
 
 /// Shifts every sample right as an unsigned number; 0 from a count beyond the samples' width.
 /// KernelNullPointer, KernelBadSize (a negative count too), KernelBadStep.
-ZENTARA_API KernelStatus ShiftRightPlane8(std::int32_t count, void* plane, std::int32_t rowBytes,
-                                          KernelSize size);
-ZENTARA_API KernelStatus ShiftRightPlane16(std::int32_t count, void* plane, std::int32_t rowBytes,
-                                           KernelSize size);
+KernelStatus ShiftRightPlane8(std::int32_t count, void* plane, std::int32_t rowBytes,
+                              KernelSize size);
+KernelStatus ShiftRightPlane16(std::int32_t count, void* plane, std::int32_t rowBytes,
+                               KernelSize size);
 
 /// Maps the samples of interleaved channels in place, each channel by its own tables of `counts[c]`
 /// entries: a sample from levels[k] up to but not including levels[k + 1] becomes values[k], held
@@ -94,23 +88,20 @@ ZENTARA_API KernelStatus ShiftRightPlane16(std::int32_t count, void* plane, std:
 /// some sample in range.
 /// KernelNullPointer (each channel's tables too), KernelBadSize, KernelBadStep, KernelBadLevels;
 /// for 16-bit images of more than 6400 pixels KernelNoMemory.
-ZENTARA_API KernelStatus LookupInPlace8x4(void* image, std::int32_t rowBytes, KernelSize size,
-                                          const std::int32_t* const values[4],
-                                          const std::int32_t* const levels[4],
-                                          const std::int32_t counts[4]);
-ZENTARA_API KernelStatus LookupInPlace8x3(void* image, std::int32_t rowBytes, KernelSize size,
-                                          const std::int32_t* const values[3],
-                                          const std::int32_t* const levels[3],
-                                          const std::int32_t counts[3]);
-ZENTARA_API KernelStatus LookupInPlace8x1(void* plane, std::int32_t rowBytes, KernelSize size,
-                                          const std::int32_t* values, const std::int32_t* levels,
-                                          std::int32_t count);
-ZENTARA_API KernelStatus LookupInPlace16x3(void* image, std::int32_t rowBytes, KernelSize size,
-                                           const std::int32_t* const values[3],
-                                           const std::int32_t* const levels[3],
-                                           const std::int32_t counts[3]);
-ZENTARA_API KernelStatus LookupInPlace16x1(void* plane, std::int32_t rowBytes, KernelSize size,
-                                           const std::int32_t* values, const std::int32_t* levels,
-                                           std::int32_t count);
+KernelStatus LookupInPlace8x4(void* image, std::int32_t rowBytes, KernelSize size,
+                              const std::int32_t* const values[4],
+                              const std::int32_t* const levels[4], const std::int32_t counts[4]);
+KernelStatus LookupInPlace8x3(void* image, std::int32_t rowBytes, KernelSize size,
+                              const std::int32_t* const values[3],
+                              const std::int32_t* const levels[3], const std::int32_t counts[3]);
+KernelStatus LookupInPlace8x1(void* plane, std::int32_t rowBytes, KernelSize size,
+                              const std::int32_t* values, const std::int32_t* levels,
+                              std::int32_t count);
+KernelStatus LookupInPlace16x3(void* image, std::int32_t rowBytes, KernelSize size,
+                               const std::int32_t* const values[3],
+                               const std::int32_t* const levels[3], const std::int32_t counts[3]);
+KernelStatus LookupInPlace16x1(void* plane, std::int32_t rowBytes, KernelSize size,
+                               const std::int32_t* values, const std::int32_t* levels,
+                               std::int32_t count);
 
 }  // namespace ZV
