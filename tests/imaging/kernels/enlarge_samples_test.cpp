@@ -154,6 +154,43 @@ TEST_P(KernelEnlarging, EveryFactorGivesTheJudgesSamples) {
     }
 }
 
+TEST_P(KernelEnlarging, EveryFactorGivesTheJudgesSamplesOnLongRows) {
+    for (int round = CountKernelRounds(120); round > 0; --round) {
+        const KernelSize size{PickBetween(71, 600), PickBetween(1, 6)};
+        Enlarging call = MakeWhole(size, PickFactor(), PickFactor(),
+                                   Interpolations[random() % Interpolations.size()]);
+        call.kind = PickKind();
+        call.layout = PickLayout();
+        CompareBoth(call);
+        if (HasFatalFailure()) return;
+    }
+}
+
+TEST_P(KernelEnlarging, TheSourceStaysAsItWas) {
+    for (const RowLayout& layout : DownwardLayouts)
+        for (const std::int32_t interpolation : Interpolations)
+            for (const KernelSize size : {KernelSize{1, 1}, KernelSize{37, 5}, KernelSize{150, 4}})
+                for (const EnlargeKernel& row : EnlargeKernels) {
+                    const std::size_t rowContent =
+                        static_cast<std::size_t>(size.width) * row.sampleBytes;
+                    const auto height = static_cast<std::size_t>(size.height);
+                    const PixelRows source(layout, rowContent, height);
+                    const PixelRows before(layout, rowContent, height);
+                    const PixelRows output(layout, 2 * rowContent, 2 * height);
+                    source.Fill(SampleKind::Random, row.sampleBytes, random);
+                    before.CopyRowsFrom(source);
+
+                    ASSERT_EQ(row.kernel(source.GetStart(), size, source.GetRowBytes(),
+                                         {0, 0, size.width, size.height}, output.GetStart(),
+                                         output.GetRowBytes(), {2 * size.width, 2 * size.height},
+                                         2.0, 2.0, interpolation),
+                              KernelOk);
+
+                    ASSERT_EQ(source.Compare(before, row.sampleBytes), "")
+                        << Describe(std::string(row.name) + ", " + layout.name, size);
+                }
+}
+
 TEST_P(KernelEnlarging, RectanglesInsideAndPastTheEdgesGiveTheJudgesSamples) {
     for (int round = CountKernelRounds(500); round > 0; --round) {
         const KernelSize size{PickBetween(1, 60), PickBetween(1, 14)};

@@ -9,6 +9,7 @@
 
 #include "imaging/kernels/kernel_fixture.h"
 #include "imaging/kernels/kernel_judge.h"
+#include "imaging/kernels/kernel_selection.h"
 #include "imaging/kernels/kernels.h"
 #include "imaging/kernels/pixel_rows.h"
 
@@ -206,6 +207,68 @@ TEST_P(KernelSamples, OnePlaneMayServeAsAll) {
 
         EXPECT_EQ(actual.Compare(expected, row.sampleBytes), "") << row.name;
     }
+}
+
+TEST_P(KernelSamples, PackedPlanesStayAsTheyWere) {
+    for (const RowLayout& layout : ListLayoutsOfBothDirections())
+        for (const KernelSize size : {KernelSize{1, 1}, KernelSize{37, 3}, KernelSize{150, 2}})
+            for (const PackKernel& row : PackKernels) {
+                const auto rowContent = static_cast<std::size_t>(size.width) * row.sampleBytes;
+                const auto height = static_cast<std::size_t>(size.height);
+                const PixelRows plane(layout, rowContent, height);
+                const PixelRows before(layout, rowContent, height);
+                const PixelRows pixels(layout, rowContent * row.planeCount, height);
+                plane.Fill(SampleKind::Random, row.sampleBytes, random);
+                before.CopyRowsFrom(plane);
+                const std::vector<const void*> pointers(row.planeCount, plane.GetStart());
+
+                ASSERT_EQ(row.kernel(pointers.data(), plane.GetRowBytes(), pixels.GetStart(),
+                                     pixels.GetRowBytes(), size),
+                          KernelOk);
+
+                ASSERT_EQ(plane.Compare(before, row.sampleBytes), "")
+                    << Describe(std::string(row.name) + ", " + layout.name, size);
+            }
+}
+
+TEST_P(KernelSamples, AnAddedPlaneStaysAsItWas) {
+    for (const RowLayout& layout : ListLayoutsOfBothDirections())
+        for (const KernelSize size : {KernelSize{1, 1}, KernelSize{37, 3}, KernelSize{150, 2}})
+            for (const AddKernel& row : AddKernels) {
+                const auto rowContent = static_cast<std::size_t>(size.width) * row.sampleBytes;
+                const auto height = static_cast<std::size_t>(size.height);
+                const PixelRows source(layout, rowContent, height);
+                const PixelRows before(layout, rowContent, height);
+                const PixelRows sums(layout, rowContent, height);
+                source.Fill(SampleKind::Random, row.sampleBytes, random);
+                sums.Fill(SampleKind::Random, row.sampleBytes, random);
+                before.CopyRowsFrom(source);
+
+                ASSERT_EQ(row.kernel(source.GetStart(), source.GetRowBytes(), sums.GetStart(),
+                                     sums.GetRowBytes(), size, 0),
+                          KernelOk);
+
+                ASSERT_EQ(source.Compare(before, row.sampleBytes), "")
+                    << Describe(std::string(row.name) + ", " + layout.name, size);
+            }
+}
+
+TEST_P(KernelSamples, OverlappingRowsAreShiftedAlikeInAllForms) {
+    // Rows are taken one after the other, so that samples in two of them are shifted twice.
+    constexpr KernelSize Size{150, 5};
+    for (const ShiftKernel& row : ShiftKernels)
+        for (const std::int32_t rowBytes : {1, 2, 15, 16, 17, 33, 64, 149}) {
+            std::vector<std::uint8_t> actual(150 * row.sampleBytes + 4 * 149);
+            for (std::uint8_t& byte : actual) byte = static_cast<std::uint8_t>(random());
+            std::vector<std::uint8_t> plain = actual;
+
+            ASSERT_EQ(row.kernel(1, actual.data(), rowBytes, Size), KernelOk);
+            ASSERT_TRUE(ForceKernels("plain"));
+            ASSERT_EQ(row.kernel(1, plain.data(), rowBytes, Size), KernelOk);
+            ASSERT_TRUE(ForceKernels(GetParam()));
+
+            EXPECT_EQ(actual, plain) << Describe(row.name, Size) << ", row length " << rowBytes;
+        }
 }
 
 TEST_P(KernelSamples, ARowLengthOfZeroTakesTheSameSourceRowAgain) {

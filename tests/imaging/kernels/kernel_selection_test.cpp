@@ -82,6 +82,7 @@ constexpr Processor Processors[] = {
     {"SSE3Without64BitMode", NamedVendor, 10, SSE3Bit, SSE2Bits, 1, Extended, 0, 66, 0},
     {"ExtendedLeafOneMissing", NamedVendor, 10, SSE3Bit, SSE2Bits, 1, NoExtended, LongModeBit, 66,
      0},
+    {"NoExtendedLeafAtAll", NamedVendor, 10, SSE3Bit, SSE2Bits, 1, 0, LongModeBit, 66, 0},
     {"SSE2Alone", NamedVendor, 2, 0, SSE2Bits, 1, NoExtended, 0, 65, 0},
     {"SSEAlone", NamedVendor, 2, 0, SSEBits, 1, NoExtended, 0, 64, 0},
     {"NothingAtAll", OtherVendor, 0, 0, 0, 1, 0, 0, 0, 0},
@@ -112,6 +113,16 @@ TEST(ProcessorClass, TakesAVendorForTheNamedOneOnlyByAllTwelveLetters) {
     answers.vendor.back() = 'x';
 
     EXPECT_EQ(CalculateProcessorClass(answers), 68);
+}
+
+TEST(ProcessorClass, CountsCoresByTheTopSixBitsOfLeaf4Alone) {
+    ProcessorAnswers answers = MakeAnswers(Processors[1]);
+    answers.leaf4Eax |= (1U << 26) - 1;
+    EXPECT_EQ(CalculateProcessorClass(answers), 33);
+
+    answers = MakeAnswers(Processors[2]);
+    answers.leaf4Eax |= (1U << 26) - 1;
+    EXPECT_EQ(CalculateProcessorClass(answers), 34);
 }
 
 ProcessorAnswers MakeWideProcessor() {
@@ -283,6 +294,22 @@ TEST_F(Selection, LeavesTheChoiceToTheProcessorWhereTheVariableNamesNoForm) {
         NameByVariable(name);
         EXPECT_EQ(&GetRowKernels(), chosen) << name;
     }
+}
+
+TEST_F(Selection, LeavesTheChoiceToTheProcessorWhereTheVariableNamesAFormThatItLacks) {
+    SelectKernels();
+    const RowKernels* const chosen = &GetRowKernels();
+    int lacking = 0;
+
+    for (const char* const name : FormNames) {
+        if (FindRowKernels(name) != nullptr) continue;
+        ++lacking;
+        NameByVariable("plain");
+        NameByVariable(name);
+        EXPECT_EQ(&GetRowKernels(), chosen) << name;
+    }
+
+    if (lacking == 0) GTEST_SKIP() << "this processor has every form";
 }
 
 TEST_F(Selection, IsMadeByEveryPipeline) {

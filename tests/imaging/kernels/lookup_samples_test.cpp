@@ -73,7 +73,7 @@ std::int32_t GetTop(const LookupKernel& row) {
     return row.sampleBytes == 1 ? 255 : 65535;
 }
 
-KernelStatus Call(LookupFunction lookup, const PixelRows& image, KernelSize size,
+KernelStatus Call(LookupFunction lookup, void* image, std::int32_t rowBytes, KernelSize size,
                   const LookupTables& tables) {
     std::vector<const std::int32_t*> values;
     std::vector<const std::int32_t*> levels;
@@ -83,8 +83,12 @@ KernelStatus Call(LookupFunction lookup, const PixelRows& image, KernelSize size
         levels.push_back(tables.levels[channel].data());
         counts.push_back(static_cast<std::int32_t>(tables.levels[channel].size()));
     }
-    return lookup(image.GetStart(), image.GetRowBytes(), size, values.data(), levels.data(),
-                  counts.data());
+    return lookup(image, rowBytes, size, values.data(), levels.data(), counts.data());
+}
+
+KernelStatus Call(LookupFunction lookup, const PixelRows& image, KernelSize size,
+                  const LookupTables& tables) {
+    return Call(lookup, image.GetStart(), image.GetRowBytes(), size, tables);
 }
 
 class KernelLookups : public KernelFormTest {
@@ -298,6 +302,29 @@ TEST_P(KernelLookups, FallingLevelsEndAlikeInAllForms) {
 
             ASSERT_EQ(actual.Compare(plain, row.sampleBytes), "") << Describe(row.name, size);
         }
+}
+
+TEST_P(KernelLookups, OverlappingRowsAreLookedUpAlikeInAllForms) {
+    // Rows are taken one after the other, so that samples in two of them are looked up twice.
+    for (const LookupKernel& row : ListAllKernels())
+        for (const KernelSize size : {KernelSize{70, 5}, KernelSize{700, 10}})
+            for (const std::int32_t rowBytes : {1, 2, 15, 16, 33, 69}) {
+                const LookupTables tables = MakeFullTables(row);
+                const PixelRows actual =
+                    MakeImage(row, {size.width + 69 * size.height, 1}, DownwardLayouts[3]);
+                const PixelRows plain =
+                    MakeImage(row, {size.width + 69 * size.height, 1}, DownwardLayouts[3]);
+                actual.Fill(SampleKind::Random, row.sampleBytes, random);
+                plain.CopyRowsFrom(actual);
+
+                ASSERT_EQ(Call(row.kernel, actual.GetStart(), rowBytes, size, tables), KernelOk);
+                ASSERT_TRUE(ForceKernels("plain"));
+                ASSERT_EQ(Call(row.kernel, plain.GetStart(), rowBytes, size, tables), KernelOk);
+                ASSERT_TRUE(ForceKernels(GetParam()));
+
+                ASSERT_EQ(actual.Compare(plain, 1), "")
+                    << Describe(row.name, size) << ", row length " << rowBytes;
+            }
 }
 
 TEST_P(KernelLookups, ChannelsHaveTablesOfTheirOwn) {
