@@ -864,19 +864,22 @@ ZENTARA_API ZentaraResult Zentara_AutoExpose(Zentara_Settings* settings, uint32_
  *
  * `inFrame` is a frame as it was delivered: its private words name the camera whose filters work,
  * which must be open; `handle` is tested and no more. The pixels of `inFrame` may be changed on the
- * way. `outFrame` may be the same record or share its buffer. Format and algorithm stay in force
- * for what the camera delivers, until settings are sent or the next call of this kind.
+ * way. `outFrame` may be the same record or have the same pBuffer. Format and algorithm stay in
+ * force for what the camera delivers, until settings are sent or the next call of this kind.
  *
  * Copying, `outFrame` gets a new buffer of malloc if it has none, or if bufferSize is below the
  * frame's size: the old one is then given to free, so it must have come from malloc. bufferSize
  * becomes the size in both cases. All public fields follow, the private words do not.
  *
- * Finishing, `outFrame` needs a buffer for the largest image on the way, which is the result or the
- * frame itself; a bufferSize of 0 says that it is large enough. It takes bits, format, width,
- * height and size, its other fields stay. What goes wrong in the filters is not told: 0 is returned
- * and the record is filled all the same. So it is for a format without three colours (0 to 5, the
- * pixels are the mosaic), for whole planes (6, 7) and for a frame larger than the sensor. An
- * algorithm above 4 keeps the one in force.
+ * Finishing, `outFrame` needs a buffer for the largest image on the way, which is the result, the
+ * frame itself, or its mosaic with the pixel ratio corrected; a bufferSize of 0 says that it is
+ * large enough. It takes bits, format, width, height and size, its other fields stay. What goes
+ * wrong in the filters is not told: 0 is returned and the record is filled all the same, as it
+ * stands where the filters stopped. So it is for a format without three colours (0 to 5, the pixels
+ * are the mosaic), for whole planes (6, 7), for a frame larger than the sensor, an image above 32
+ * bits, and for a frame with fewer bytes than its size asks for: a ratio is not corrected then, a
+ * mosaic is black where it has none. What a filter does not make needs no room. An algorithm above
+ * 4 keeps the one in force.
  *
  * 8 not loaded; 2 `handle`, `inFrame` or `outFrame` null; 3 `settings` null or without its magic
  * number; 9 not a camera, not open, or open in another process. Copying: 2 `inFrame` has no buffer,
@@ -896,10 +899,13 @@ ZENTARA_API ZentaraResult Zentara_PostProcessSingleFrame(ZentaraHandle handle,
  * and with the wanted format (8 to 12; RGB48 for samples of 16 bits, the others for bytes).
  *
  * `algorithm` is one of zbayer...; one above 4 keeps the one in force. `outFrame` takes width,
- * height, bits and size; its other fields stay. Whatever the filter does not take (another
- * `inFrame` than a mosaic, another format) gives 0 all the same, with no pixels written, and width
- * and height as they were. Format and algorithm stay in force for what the camera delivers. With
- * algorithm 0 the format alone is set and nothing else happens.
+ * height, bits and size; its other fields stay. It may be the same record or have the same pBuffer;
+ * the same record has one format for both, with which no pixels are written. Neither the pixel
+ * ratio is corrected nor are the colours scaled. Whatever the filter does not take (another
+ * `inFrame` than a mosaic, another format, a frame larger than the sensor) gives 0 all the same,
+ * needs no room, writes no pixels and leaves width and height as they were. Format and algorithm
+ * stay in force for what the camera delivers. With algorithm 0 the format alone is set and nothing
+ * else happens.
  *
  * 8 not loaded; 2 `inFrame` or `outFrame` null; 9 the camera of `inFrame` is not open; 2 `inFrame`
  * has no buffer, or one below its size (bufferSize 0 says nothing); 2 `outFrame` has no buffer; 18

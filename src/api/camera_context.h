@@ -44,10 +44,11 @@ inline constexpr std::uint32_t QueueCapacity = 100;
 
 /// What the flat interface keeps for an open camera.
 ///
-/// Locks: `deliveryLock` before `queueLock`; the leaf mutexes after both. `deliveryLock` is held
+/// Locks: `measuringMutex` before all others, `deliveryLock` before `queueLock` and before
+/// `postMutex`; the leaf mutexes (`queueMutex`, `settingsMutex`) last. `deliveryLock` is held
 /// for the whole of ImageReceived and of Zentara_Abort. `queueLock` keeps clients, ExposeDone and
 /// the sending of settings apart; ImageReceived and the emptying by Zentara_Abort do without it.
-/// `queueMutex` keeps the queue whole whoever changes it; no callback runs under a leaf mutex.
+/// `queueMutex` keeps the queue whole whoever changes it. No callback runs under a leaf mutex.
 struct CameraContext {
     CameraContext() = default;
     ~CameraContext();  ///< Frees what is still queued.
@@ -77,7 +78,8 @@ struct CameraContext {
     std::condition_variable serviceChanged;  ///< A service has ended or moved on.
     mutable std::mutex settingsMutex;
     std::mutex measuringMutex;  ///< One white balance or auto exposure at a time, waits included.
-    std::mutex postMutex;  ///< One run of `postPipeline` at a time: a grab and a delivery may meet.
+    /// One run of `postPipeline` at a time: deliveries, grabs and single frames may meet.
+    std::mutex postMutex;
 };
 
 /// Makes the context of a camera that has just been opened and puts the wheel into the camera's own
