@@ -12,6 +12,7 @@
 #include <string_view>
 
 #include "fits_names.h"
+#include "output.h"
 #include "zentara/zentara.h"
 
 namespace ZentaraProgram {
@@ -34,7 +35,7 @@ class FitsInput {
 
     [[nodiscard]] bool Open(const std::string& path) {
         int status = 0;
-        fits_open_diskfile(&file, path.c_str(), READONLY, &status);
+        fits_open_diskfile(&file, GetLiteralPath(path).c_str(), READONLY, &status);
         return status == 0;
     }
     [[nodiscard]] fitsfile* Get() const { return file; }
@@ -152,7 +153,7 @@ constexpr std::array Numbers{
 /// What says something about an image and nothing about its samples: wrong cards count as missing.
 void ReadDescription(const FitsInput& input, Image* image) {
     for (const TextRow& row : Texts) {
-        if (const auto text = input.ReadText(row.key)) image->*row.member = *text;
+        if (const auto text = input.ReadText(row.key)) image->*row.member = MakeHarmless(*text);
     }
     for (const NumberRow& row : Numbers) {
         const auto number = input.ReadNumber(row.key);
@@ -219,8 +220,10 @@ std::string ReadWords(const FitsInput& input, Image* image) {
 std::string FindContradiction(const Image& image, const PixelFormat& samples) {
     constexpr std::uint32_t FirstMosaicPattern = 5;
     const PixelFormat& told = *image.layout;
+    // Who asks for raw data is told raw, whatever the samples are.
+    const bool isRaw = told.format == zfmtRaw8 || told.format == zfmtRaw16;
     const bool isOfOneKind = told.IsThreeColour() == samples.IsThreeColour() &&
-                             told.bytesPerSample == samples.bytesPerSample;
+                             (isRaw || told.bytesPerSample == samples.bytesPerSample);
     if (!isOfOneKind)
         return fmt::format("PIXFORM says {}, which does not fit the samples", told.name);
     if ((image.bits > 8) != samples.IsDeep())

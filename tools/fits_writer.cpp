@@ -98,7 +98,7 @@ std::string WriteFits(const std::string& path, const Image& image) {
     int status = 0;
     fitsfile* file = nullptr;
     // The plain form of create: brackets in a name are part of it.
-    fits_create_diskfile(&file, path.c_str(), &status);
+    fits_create_diskfile(&file, GetLiteralPath(path).c_str(), &status);
     if (status != 0) {
         std::string reason = DescribeFileFailure();
         fits_clear_errmsg();

@@ -1,5 +1,6 @@
 #include "output.h"
 
+#include <algorithm>
 #include <nlohmann/json.hpp>
 
 namespace ZentaraProgram {
@@ -27,6 +28,14 @@ void PrintJson(const nlohmann::ordered_json& value) {
 
 void PrintError(const std::string& text) {
     (void)std::fputs(("zentara: " + text + "\n").c_str(), stderr);  // There is no one else to tell.
+}
+
+std::string MakeHarmless(std::string text) {
+    constexpr unsigned char FirstPrinted = 32, Delete = 127;
+    std::replace_if(
+        text.begin(), text.end(), [](unsigned char c) { return c < FirstPrinted || c == Delete; },
+        '?');
+    return text;
 }
 
 bool FlushOutput() {

@@ -15,6 +15,9 @@ void PrintJson(const nlohmann::json& value);
 void PrintJson(const nlohmann::ordered_json& value);
 void PrintError(const std::string& text);
 
+/// A text from elsewhere, with question marks for what a terminal could take as a command.
+std::string MakeHarmless(std::string text);
+
 /// False when something that was printed could not be written (a full disk, a closed pipe).
 bool FlushOutput();
 

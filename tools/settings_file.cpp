@@ -12,6 +12,7 @@
 #include <system_error>
 
 #include "image_writers.h"
+#include "output.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -133,7 +134,7 @@ class SettingsReader : public nlohmann::json_sax<nlohmann::json> {
     static constexpr int SettingsDepth = 1000000;
 
     void Refuse(std::size_t line, const std::string& reason) {
-        problems->push_back(fmt::format("{}:{}: {}", file, line, reason));
+        problems->push_back(fmt::format("{}:{}: {}", file, line, MakeHarmless(reason)));
     }
 
     bool Value(JsonKind kind, const std::string& text) {

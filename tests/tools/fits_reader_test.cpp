@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <functional>
 
 #include "tools/colour_image.h"
@@ -210,6 +211,81 @@ TEST_P(FitsReader, AnyByteOfTheHeaderMayBeWrong) {
 }
 
 INSTANTIATE_TEST_SUITE_P(BytesPerSample, FitsReader, testing::Values(1U, 2U));
+
+TEST(FitsReaderDoor, RawFormatsTakeSamplesOfEitherWidth) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("a.fits");
+    for (const std::uint32_t format : {zfmtRaw8, zfmtRaw16}) {
+        for (const std::uint32_t bytes : {1U, 2U}) {
+            Image written = MakeMosaic(bytes);
+            written.layout = ZentaraProgram::FindPixelFormat(format);
+            written.isBayer = false;
+            ASSERT_EQ("", ZentaraProgram::WriteImage(path, written));
+            Image read;
+
+            ASSERT_EQ("", ReadFits(path, FitsDemand::FrameRecord, &read)) << format << bytes;
+
+            EXPECT_EQ(format, read.layout->format);
+            EXPECT_EQ(bytes, read.bytesPerSample);
+            EXPECT_EQ(written.pixels, read.pixels);
+        }
+    }
+}
+
+TEST(FitsReaderDoor, ATextHoldsNothingThatATerminalTakesForACommand) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("a.fits");
+    ASSERT_EQ("", ZentaraProgram::WriteImage(path, MakeMosaic(1)));
+    std::string file = ReadFile(path);
+    SetCard(&file, "INSTRUME", "'\x1B[2J\x7F\n'");
+    WriteFile(path, file);
+    Image read;
+
+    ASSERT_EQ("", ReadFits(path, FitsDemand::FrameRecord, &read));
+
+    EXPECT_EQ("?[2J??", read.model);
+}
+
+/// Another current folder, until the end of the scope.
+class CurrentFolder {
+  public:
+    explicit CurrentFolder(const std::string& path) { std::filesystem::current_path(path); }
+    ~CurrentFolder() { std::filesystem::current_path(before); }
+    CurrentFolder(const CurrentFolder&) = delete;
+    CurrentFolder& operator=(const CurrentFolder&) = delete;
+
+  private:
+    std::filesystem::path before = std::filesystem::current_path();
+};
+
+TEST(FitsReaderDoor, NamesThatBeginWithATildeOrABlankAreNamesOfFiles) {
+    const TemporaryFolder folder;
+    const CurrentFolder here(folder.GetPath(""));
+    for (const char* name : {"~a.fits", "~/a.fits", " a.fits", "~.fits", "a[1].fits"}) {
+        std::filesystem::create_directory("~");
+        ASSERT_EQ("", ZentaraProgram::WriteImage(name, MakeMosaic(1))) << name;
+        Image read;
+
+        EXPECT_EQ("", ReadFits(name, FitsDemand::FrameRecord, &read)) << name;
+
+        EXPECT_TRUE(std::filesystem::exists(folder.GetPath(name))) << name;
+    }
+}
+
+TEST(FitsReaderDoor, APathThatIsTooLongIsRefused) {
+    const TemporaryFolder folder;
+    const CurrentFolder here(folder.GetPath(""));
+    std::string path;
+    for (int i = 0; i < 11; ++i) {
+        path += std::string(120, 'd') + "/";
+        std::filesystem::create_directory(path);
+    }
+    EXPECT_NE("", ZentaraProgram::WriteImage(path + "a.fits", MakeMosaic(1)));
+    WriteFile(path + "a.fits", "SIMPLE  =                    T");
+    Image read;
+
+    EXPECT_NE("", ReadFits(path + "a.fits", FitsDemand::Pixels, &read));
+}
 
 TEST(FitsReaderDoor, AFolderAndAMissingFileAreNamedForWhatTheyAre) {
     const TemporaryFolder folder;
