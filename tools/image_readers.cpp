@@ -40,13 +40,13 @@ std::string ReadImage(const std::string& path, Image* image) {
 
 bool PrepareImage(std::uint64_t width, std::uint64_t height, std::uint32_t channels,
                   std::uint32_t bytesPerSample, Image* image) {
-    constexpr std::uint64_t GreatestSide = 65535, GreatestBytes = std::uint64_t{1} << 30;
+    // Eight times the pixels of the largest camera.
+    constexpr std::uint64_t GreatestSide = 65535, GreatestPixels = 8 * 4008 * 2672;
     const bool isKnown =
         (channels == 1 || channels == ColourCount) && (bytesPerSample == 1 || bytesPerSample == 2);
     if (!isKnown || width < 1 || height < 1 || width > GreatestSide || height > GreatestSide)
         return false;
-    const std::uint64_t bytes = width * height * channels * bytesPerSample;
-    if (bytes > GreatestBytes) return false;
+    if (width * height > GreatestPixels) return false;
     const bool isDeep = bytesPerSample == 2;
     const std::uint32_t grey = isDeep ? zfmtMono16 : zfmtMono8;
     const std::uint32_t colour = isDeep ? zfmtRGB48 : zfmtRGB24;
@@ -55,7 +55,7 @@ bool PrepareImage(std::uint64_t width, std::uint64_t height, std::uint32_t chann
     image->height = static_cast<std::uint32_t>(height);
     image->bytesPerSample = bytesPerSample;
     image->bits = 8 * bytesPerSample;
-    image->pixels.assign(bytes, 0);
+    image->pixels.assign(width * height * channels * bytesPerSample, 0);
     return true;
 }
 

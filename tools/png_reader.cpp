@@ -24,7 +24,9 @@ void SetTransformations(png_structp png) {
 
 /// libpng leaves by longjmp: no object with a destructor lives in this frame.
 bool ReadHeader(png_structp png, png_infop info, std::FILE* file, bool* isInterlaced) {
+    constexpr png_uint_32 GreatestSide = 65535;
     if (setjmp(png_jmpbuf(png)) != 0) return false;
+    png_set_user_limits(png, GreatestSide, GreatestSide);
     png_init_io(png, file);
     png_read_info(png, info);
     *isInterlaced = png_get_interlace_type(png, info) != PNG_INTERLACE_NONE;

@@ -30,7 +30,11 @@ std::string ReadOpened(TIFF* file, Image* image) {
     constexpr std::uint32_t BitsPerByte = 8;
     const std::uint32_t channels = ReadShort(file, TIFFTAG_SAMPLESPERPIXEL);
     const std::uint32_t bits = ReadShort(file, TIFFTAG_BITSPERSAMPLE);
-    const bool isPlain = TIFFIsTiled(file) == 0 && bits % BitsPerByte == 0 &&
+    const std::uint32_t meaning = channels == 1 ? PHOTOMETRIC_MINISBLACK : PHOTOMETRIC_RGB;
+    std::uint16_t photometric = 0;
+    const bool isLight =
+        TIFFGetField(file, TIFFTAG_PHOTOMETRIC, &photometric) == 1 && photometric == meaning;
+    const bool isPlain = isLight && TIFFIsTiled(file) == 0 && bits % BitsPerByte == 0 &&
                          ReadShort(file, TIFFTAG_SAMPLEFORMAT) == SAMPLEFORMAT_UINT &&
                          ReadShort(file, TIFFTAG_PLANARCONFIG) == PLANARCONFIG_CONTIG;
     const bool isRoomy = isPlain && PrepareImage(ReadLong(file, TIFFTAG_IMAGEWIDTH),

@@ -2,8 +2,10 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <tiffio.h>
 
 #include <algorithm>
+#include <array>
 
 #include "tools/colour_image.h"
 #include "tools/image_samples.h"
@@ -87,6 +89,39 @@ TEST(ImageReadersDoor, AnEndingThatSaysNothingAndAMissingFileAreTold) {
     EXPECT_EQ("there is no such file", ReadImage(folder.GetPath("a.png"), &read));
 }
 
+struct TiffCase {
+    std::uint16_t photometric, channels;
+    bool isRead;
+};
+
+TEST(TiffReader, OnlyLightOfOneOrThreeColoursIsRead) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("a.tiff");
+    const TiffCase cases[] = {
+        {PHOTOMETRIC_MINISBLACK, 1, true},  {PHOTOMETRIC_RGB, 3, true},
+        {PHOTOMETRIC_MINISWHITE, 1, false}, {PHOTOMETRIC_RGB, 1, false},
+        {PHOTOMETRIC_MINISBLACK, 3, false}, {PHOTOMETRIC_CIELAB, 3, false},
+        {PHOTOMETRIC_MASK, 1, false},       {PHOTOMETRIC_RGB, 4, false},
+    };
+    for (const TiffCase& row : cases) {
+        std::array<std::uint8_t, 4> pixel{1, 2, 3, 4};
+        TIFF* file = TIFFOpen(path.c_str(), "w");
+        ASSERT_NE(nullptr, file);
+        TIFFSetField(file, TIFFTAG_IMAGEWIDTH, 1);
+        TIFFSetField(file, TIFFTAG_IMAGELENGTH, 1);
+        TIFFSetField(file, TIFFTAG_BITSPERSAMPLE, 8);
+        TIFFSetField(file, TIFFTAG_SAMPLESPERPIXEL, row.channels);
+        TIFFSetField(file, TIFFTAG_PHOTOMETRIC, row.photometric);
+        TIFFSetField(file, TIFFTAG_PLANARCONFIG, PLANARCONFIG_CONTIG);
+        EXPECT_EQ(1, TIFFWriteScanline(file, pixel.data(), 0, 0));
+        TIFFClose(file);
+        Image read;
+
+        EXPECT_EQ(row.isRead, ReadImage(path, &read).empty())
+            << row.photometric << " with " << row.channels;
+    }
+}
+
 TEST(PrepareImage, OnlyImagesOfCamerasHaveRoom) {
     Image image;
 
@@ -95,6 +130,7 @@ TEST(PrepareImage, OnlyImagesOfCamerasHaveRoom) {
     EXPECT_FALSE(ZentaraProgram::PrepareImage(0, 1, 1, 1, &image));
     EXPECT_FALSE(ZentaraProgram::PrepareImage(1, 65536, 1, 1, &image));
     EXPECT_FALSE(ZentaraProgram::PrepareImage(65535, 65535, 3, 2, &image));
+    EXPECT_FALSE(ZentaraProgram::PrepareImage(10000, 10000, 1, 1, &image));
     EXPECT_FALSE(ZentaraProgram::PrepareImage(1, 1, 2, 1, &image));
     EXPECT_FALSE(ZentaraProgram::PrepareImage(1, 1, 1, 4, &image));
     EXPECT_EQ(4008U, image.width);
