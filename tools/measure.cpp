@@ -6,6 +6,7 @@
 #include <charconv>
 #include <string_view>
 
+#include "frame_size.h"
 #include "grab_watch.h"
 #include "interrupt.h"
 #include "output.h"
@@ -15,14 +16,24 @@ namespace {
 
 constexpr std::uint32_t LeastSide = 16;
 
+constexpr std::array GainKeys{zprmPostProcessGainRed, zprmPostProcessGainGreen,
+                              zprmPostProcessGainBlue};
+
+Size GetSizeOfFrames(const Camera& camera, const SettingsBlock&) {
+    return GetFrameSize(camera);
+}
+
 struct MeasurementRow {
     const char* name;
     ZentaraResult (SettingsBlock::*run)(const Region&);
+    /// What a region is held against: the exposure cuts it before the proportions are corrected.
+    Size (*getSize)(const Camera&, const SettingsBlock&);
+    const char* ground;
 };
 // In the order of Measurement.
 constexpr std::array Measurements{
-    MeasurementRow{"white balance", &SettingsBlock::BalanceWhite},
-    MeasurementRow{"auto exposure", &SettingsBlock::Expose},
+    MeasurementRow{"white balance", &SettingsBlock::BalanceWhite, &GetFinishedSize, "image"},
+    MeasurementRow{"auto exposure", &SettingsBlock::Expose, &GetSizeOfFrames, "camera's frame"},
 };
 
 /// Takes a number from the begin of a text, and the sign behind it unless that is 0.
@@ -38,19 +49,14 @@ bool TakeNumber(std::string_view* text, char sign, std::uint32_t* number) {
 }
 
 /// Why a region cannot be measured in an image of this size; empty when it can.
-std::string FindRegionProblem(const Region& region, const Region& image) {
-    const bool isInside = std::uint64_t{region.x} + region.width <= image.width &&
-                          std::uint64_t{region.y} + region.height <= image.height;
+std::string FindRegionProblem(const Region& region, Size size, const char* ground) {
+    const bool isInside = std::uint64_t{region.x} + region.width <= size.width &&
+                          std::uint64_t{region.y} + region.height <= size.height;
     if (!isInside)
-        return fmt::format("--region reaches beyond the image of {} x {} pixels", image.width,
-                           image.height);
+        return fmt::format("--region reaches beyond the {} of {} x {} pixels", ground, size.width,
+                           size.height);
     if (region.width >= LeastSide || region.height >= LeastSide) return {};
     return fmt::format("--region has to be {} pixels wide or high at least", LeastSide);
-}
-
-Region GetImageRegion(const Camera& camera) {
-    return {0, 0, camera.GetInfo(zinfImageWidth).value_or(0),
-            camera.GetInfo(zinfImageHeight).value_or(0)};
 }
 
 bool IsSoftwareTriggered(const SettingsBlock& settings) {
@@ -59,12 +65,23 @@ bool IsSoftwareTriggered(const SettingsBlock& settings) {
 
 /// The exposures of a wheel are balanced as well: the gains would do it a second time.
 void LeaveGainsToExposures(SettingsBlock* settings) {
-    constexpr std::array Gains{zprmPostProcessGainRed, zprmPostProcessGainGreen,
-                               zprmPostProcessGainBlue};
     constexpr SettingValue Even = 1000;
     // Even gains are within all limits.
-    for (const std::uint32_t key : Gains)
+    for (const std::uint32_t key : GainKeys)
         (void)settings->Set(GetSetting(ParameterFamily::Word, key), Even);
+}
+
+/// A region without light has such gains; a camera takes them, but --set and files do not.
+void TellExtremeGains(const SettingsBlock& settings) {
+    for (const std::uint32_t key : GainKeys) {
+        const Setting& setting = GetSetting(ParameterFamily::Word, key);
+        const auto value = settings.Get(setting);
+        const SettingLimits limits = settings.GetLimits(setting);
+        if (!value || limits.Allows(*value)) continue;
+        PrintError(fmt::format("{}: {} was found, which is out of range; allowed is {}",
+                               setting.name, FormatValue(setting, *value),
+                               DescribeLimits(setting, limits)));
+    }
 }
 
 /// A failure that the library does not tell still shows in the camera: it takes nothing any more.
@@ -92,13 +109,14 @@ std::string FindMeasureProblem(const MeasureOptions& options) {
 ExitCode Measure(Measurement measurement, const MeasureOptions& options, Session* session,
                  SettingsBlock* settings) {
     const Camera& camera = session->GetCamera();
-    const Region image = GetImageRegion(camera);
-    const Region region = ParseRegion(options.region).value_or(image);
-    if (const std::string problem = FindRegionProblem(region, image); !problem.empty()) {
+    const MeasurementRow& row = Measurements[static_cast<std::size_t>(measurement)];
+    const Size size = row.getSize(camera, *settings);
+    const Region region =
+        ParseRegion(options.region).value_or(Region{0, 0, size.width, size.height});
+    if (const std::string problem = FindRegionProblem(region, size, row.ground); !problem.empty()) {
         PrintError(problem);
         return ExitWrongUse;
     }
-    const MeasurementRow& row = Measurements[static_cast<std::size_t>(measurement)];
     GrabWatch watch(camera.GetHandle(), options.timeoutSeconds,
                     IsSoftwareTriggered(*settings) ? TriggerHelp::EachImage : TriggerHelp::None);
     ZentaraResult result = (settings->*row.run)(region);
@@ -111,6 +129,7 @@ ExitCode Measure(Measurement measurement, const MeasureOptions& options, Session
     }
     const bool hasWheel = camera.GetInfo(zinfColorWheelSupported).value_or(0) != 0;
     if (measurement == Measurement::WhiteBalance && hasWheel) LeaveGainsToExposures(settings);
+    if (measurement == Measurement::WhiteBalance && !hasWheel) TellExtremeGains(*settings);
     if (result == zerrNone) result = Confirm(camera, settings);
     if (result == zerrNone) return ExitDone;
     PrintError(fmt::format("{}: {}", row.name, DescribeResult(result)));

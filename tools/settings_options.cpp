@@ -45,6 +45,18 @@ std::string ReadAssignment(const std::string& assignment, SettingEdit* edit) {
     return parsed.problem;
 }
 
+/// Puts edits before others, but those whose settings the others make anyway.
+void InsertFirst(const std::vector<SettingEdit>& first, std::vector<SettingEdit>* edits) {
+    std::vector<SettingEdit> all;
+    for (const SettingEdit& edit : first) {
+        const bool isMadeLater =
+            std::any_of(edits->begin(), edits->end(),
+                        [&](const SettingEdit& later) { return later.setting == edit.setting; });
+        if (!isMadeLater) all.push_back(edit);
+    }
+    edits->insert(edits->begin(), all.begin(), all.end());
+}
+
 ExitCode TellProblems(const std::vector<std::string>& problems) {
     for (const std::string& problem : problems) PrintError(problem);
     return problems.empty() ? ExitDone : ExitWrongUse;
@@ -54,11 +66,7 @@ ExitCode TellProblems(const std::vector<std::string>& problems) {
 
 ExitCode ReadEdits(const SettingsOptions& options, std::vector<SettingEdit>* edits) {
     std::vector<std::string> problems;
-    *edits = options.first;
-    if (!options.file.empty()) {
-        const auto stored = ReadSettingsFile(options.file, &problems);
-        edits->insert(edits->end(), stored.begin(), stored.end());
-    }
+    if (!options.file.empty()) *edits = ReadSettingsFile(options.file, &problems);
     for (const std::string& assignment : options.assignments) {
         SettingEdit edit;
         const std::string problem = ReadAssignment(assignment, &edit);
@@ -68,6 +76,7 @@ ExitCode ReadEdits(const SettingsOptions& options, std::vector<SettingEdit>* edi
             problems.push_back(problem);
         }
     }
+    InsertFirst(options.first, edits);
     const std::string colour = FindColourProblem(options.colour);
     if (!colour.empty()) problems.push_back(colour);
     return TellProblems(problems);

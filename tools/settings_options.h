@@ -10,13 +10,13 @@
 namespace ZentaraProgram {
 
 /// Settings that a command line asks for: those that it implies, those of a file, then those of
-/// --set, then those that
-/// --colour and its like stand for.
+/// --set, then those that --colour and its like stand for.
 struct SettingsOptions {
     std::string file;
     std::vector<std::string> assignments;  ///< "exposure=250ms"
     ColourOptions colour;
-    std::vector<SettingEdit> first;  ///< What the command itself asks for, before all others.
+    /// What the command itself asks for, where the file and --set do not.
+    std::vector<SettingEdit> first;
 };
 
 /// Checks all that can be checked without a camera; says on standard error what is wrong.

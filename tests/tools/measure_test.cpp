@@ -93,6 +93,40 @@ TEST(WhiteBalanceCommand, BalancesTheExposuresOfAWheelAndLeavesItsGainsEven) {
     EXPECT_EQ("1 x", found["post-process-gain-blue"]);
 }
 
+/// Of a value as "1.25 x".
+double GetGain(const json& value) {
+    EXPECT_THAT(value.get<std::string>(), testing::EndsWith(" x"));
+    return std::stod(value.get<std::string>());
+}
+
+TEST(WhiteBalanceCommand, TheGainsOfAMosaicFitTheLight) {
+    const StillScenario scenario(
+        "colour", R"({"kind": "flat", "level": 1, "brightness": 2e5, "light": [1.5, 1, 0.5]})");
+
+    const ProgramResult result =
+        RunProgram({"white-balance", "0", "--simulation", scenario.GetName(), "--json"});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    const json found = json::parse(result.output);
+    // Means lose their fraction, and the black level lies below all of them.
+    EXPECT_NEAR(1 / 1.5, GetGain(found["post-process-gain-red"]), 0.03);
+    EXPECT_NEAR(1, GetGain(found["post-process-gain-green"]), 0.001);
+    EXPECT_NEAR(1 / 0.5, GetGain(found["post-process-gain-blue"]), 0.1);
+    EXPECT_THAT(result.errors, testing::Not(HasSubstr("out of range")));
+}
+
+TEST(WhiteBalanceCommand, GainsOutOfRangeAreTold) {
+    const StillScenario scenario(
+        "colour", R"({"kind": "flat", "level": 1, "brightness": 5e5, "light": [1, 1, 0]})");
+
+    const ProgramResult result =
+        RunProgram({"white-balance", "0", "--simulation", scenario.GetName(), "--set", "offset=0"});
+
+    EXPECT_EQ(0, result.exitCode) << result.errors;
+    EXPECT_THAT(result.errors, HasSubstr("post-process-gain-blue: "));
+    EXPECT_THAT(result.errors, HasSubstr("out of range"));
+}
+
 TEST(WhiteBalanceCommand, ACameraWithoutColoursIsRefusedBeforeItTakesAnImage) {
     // The colour kind of the sensor stands in bits 8 to 11 of configuration quadlet 17.
     const TemporaryFolder folder;
@@ -177,6 +211,35 @@ INSTANTIATE_TEST_SUITE_P(Commands, Measurements, testing::Values("white-balance"
                              return std::string(tested.param) == "auto-expose" ? "AutoExpose"
                                                                                : "WhiteBalance";
                          });
+
+TEST(GrabCommand, AnInterruptInTheWhiteBalanceLeavesNoFile) {
+    const TracedScenario still(
+        R"({"faults": [{"kind": "losePacket", "count": 0, "frame": 1, "packet": 0},
+                       {"kind": "losePacket", "probability": 1}]})");
+    const std::string path = still.folder.GetPath("never.fits");
+    RunningProgram program(
+        {"grab", "0", "--simulation", still.GetName(), "--colour", "--white-balance", "-o", path});
+    ASSERT_TRUE(ZV::Test::WaitUntil(
+        [&] { return ReadFile(still.GetTrace()).find("\"type\":\"frame\"") != std::string::npos; },
+        std::chrono::seconds(60)));
+
+    program.Send(SIGINT);
+
+    EXPECT_EQ(130, program.Wait().exitCode);
+    EXPECT_THAT(ReadFile(path), IsEmpty());
+}
+
+TEST(GrabCommand, ATimeWithoutANumberIsWrongUse) {
+    for (const char* time : {"nan", "inf", "-nan", "0", "soon"}) {
+        const ProgramResult grab = RunProgram(
+            {"grab", "0", "--simulation", "mono", "-o", "never.fits", "--timeout", time});
+        const ProgramResult stream =
+            RunProgram({"stream", "0", "--simulation", "mono", "--duration", time});
+
+        EXPECT_EQ(2, grab.exitCode) << time;
+        EXPECT_EQ(2, stream.exitCode) << time;
+    }
+}
 
 TEST(GrabCommand, ARegionWithoutWhiteBalanceIsWrongUse) {
     const ProgramResult result =
