@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <span>
 
 #include "pixel_formats.h"
 
@@ -38,9 +39,9 @@ void AddEdit(std::uint32_t key, SettingValue value, std::vector<SettingEdit>* ed
     edits->push_back({&GetSetting(ParameterFamily::Word, key), value, {}});
 }
 
-/// The last edit of the image format, or null when the edits leave it as it is.
-const SettingEdit* FindFormatEdit(const std::vector<SettingEdit>& edits) {
-    const Setting* setting = &GetSetting(ParameterFamily::Word, zprmImageFormat);
+/// The last edit of a setting, or null when the edits leave it as it is.
+const SettingEdit* FindLastEdit(std::uint32_t key, const std::vector<SettingEdit>& edits) {
+    const Setting* setting = &GetSetting(ParameterFamily::Word, key);
     const auto last = std::find_if(edits.rbegin(), edits.rend(), [&](const SettingEdit& edit) {
         return edit.setting == setting;
     });
@@ -55,15 +56,42 @@ const PixelFormat* FindFormatInForce(const SettingsBlock& block) {
 /// The image format that will be in force after the edits.
 const PixelFormat* FindSourceFormat(const SettingsBlock& block,
                                     const std::vector<SettingEdit>& edits) {
-    const SettingEdit* edit = FindFormatEdit(edits);
+    const SettingEdit* edit = FindLastEdit(zprmImageFormat, edits);
     if (edit != nullptr) return FindPixelFormat(static_cast<std::uint32_t>(edit->value));
     return FindFormatInForce(block);
 }
 
-/// True when a word of the command line, and not a file, asks for another image format.
-bool IsContradicted(std::uint32_t format, const std::vector<SettingEdit>& edits) {
-    const SettingEdit* edit = FindFormatEdit(edits);
-    return edit != nullptr && edit->place.empty() && edit->value != format;
+/// Adds an edit, unless a word of the command line, and not a file, asks for another value. Returns
+/// what contradicts then; `purpose` is what the edit is made for.
+std::string AddWantedEdit(const std::string& purpose, std::uint32_t key, SettingValue value,
+                          std::vector<SettingEdit>* edits) {
+    const Setting& setting = GetSetting(ParameterFamily::Word, key);
+    const SettingEdit* edit = FindLastEdit(key, *edits);
+    if (edit != nullptr && edit->place.empty() && edit->value != value) {
+        return fmt::format("{} needs {}={}, but --set asks for {}", purpose, setting.name,
+                           FormatValue(setting, value), FormatValue(setting, edit->value));
+    }
+    AddEdit(key, value, edits);
+    return {};
+}
+
+struct WantedEdit {
+    std::uint32_t key;
+    SettingValue value;
+};
+
+std::string AddWantedEdits(const PixelFormat& format, std::span<const WantedEdit> wanted,
+                           std::vector<SettingEdit>* edits) {
+    for (const WantedEdit& edit : wanted) {
+        std::string problem = AddWantedEdit(format.name, edit.key, edit.value, edits);
+        if (!problem.empty()) return problem;
+    }
+    return {};
+}
+
+/// True for a camera whose samples have 16 bits in every format.
+bool SendsDeepSamplesOnly(const Camera& camera) {
+    return camera.GetInfo(zinfCameraType) == std::uint32_t{zmodelMetrona};
 }
 
 /// The three-colour format that is meant: the one of the name, the source's own, or the usual one
@@ -78,13 +106,12 @@ const PixelFormat* ChooseFormat(const ColourOptions& options, const PixelFormat*
 std::string AddMosaicEdits(const PixelFormat& format, const ColourOptions& options,
                            std::vector<SettingEdit>* edits) {
     const std::uint32_t mosaic = format.IsDeep() ? zfmtBayer16 : zfmtBayer8;
-    if (IsContradicted(mosaic, *edits)) {
-        return fmt::format("{} is made of images in {}, but --set asks for another image-format",
-                           format.name, FindPixelFormat(mosaic)->name);
-    }
-    AddEdit(zprmImageFormat, mosaic, edits);
-    AddEdit(zprmDoPostProcessing, 1, edits);
-    AddEdit(zprmPostProcessImageFormat, format.format, edits);
+    const WantedEdit wanted[] = {{zprmPostProcessImageFormat, format.format},
+                                 {zprmImageFormat, mosaic},
+                                 {zprmDoPostProcessing, 1}};
+    const auto needed = std::span(wanted).first(options.isOfStoredFrame ? 1 : 3);
+    std::string problem = AddWantedEdits(format, needed, edits);
+    if (!problem.empty()) return problem;
     if (const AlgorithmRow* algorithm = FindAlgorithm(options.algorithm))
         AddEdit(zprmPostProcessBayerAlgorithm, algorithm->value, edits);
     return {};
@@ -95,11 +122,10 @@ std::string AddWheelEdits(const PixelFormat& format, const ColourOptions& option
                           std::vector<SettingEdit>* edits) {
     if (!options.algorithm.empty())
         return "this camera has a colour filter wheel and no mosaic; --bayer means nothing to it";
-    AddEdit(zprmImageFormat, format.format, edits);
-    if (!options.isColour) return {};
-    AddEdit(zprmDoPostProcessing, 1, edits);
-    AddEdit(zprmPostProcessImageFormat, format.format, edits);
-    return {};
+    const WantedEdit wanted[] = {{zprmImageFormat, format.format},
+                                 {zprmDoPostProcessing, 1},
+                                 {zprmPostProcessImageFormat, format.format}};
+    return AddWantedEdits(format, std::span(wanted).first(options.isColour ? 3 : 1), edits);
 }
 
 }  // namespace
@@ -128,6 +154,12 @@ std::string AddColourEdits(const Camera& camera, const SettingsBlock& block,
     const PixelFormat& target = *ChooseFormat(options, FindSourceFormat(block, *edits));
     const ColourMaker maker = GetColourMaker(camera);
     if (maker == ColourMaker::Mosaic) return AddMosaicEdits(target, options, edits);
+    if (options.isOfStoredFrame)
+        return fmt::format("this camera ({}) has no mosaic to process the frame by",
+                           camera.GetModelName());
+    if (maker == ColourMaker::Wheel && !target.IsDeep() && SendsDeepSamplesOnly(camera))
+        return fmt::format("this camera ({}) sends samples of 16 bits alone; {} is of 8",
+                           camera.GetModelName(), target.name);
     if (maker == ColourMaker::Wheel) return AddWheelEdits(target, options, edits);
     return fmt::format("this camera ({}) makes no colours: it has no mosaic and no filter wheel",
                        camera.GetModelName());

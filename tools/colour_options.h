@@ -13,6 +13,8 @@ struct ColourOptions {
     bool isColour = false;  ///< Post-processing on, and three colours.
     std::string format;     ///< Name of a format, or empty.
     std::string algorithm;  ///< "average", "fast", "bicubic", or empty.
+    /// The colours are made of a frame in a file: only post-processing counts.
+    bool isOfStoredFrame = false;
 
     [[nodiscard]] bool IsEmpty() const { return !isColour && format.empty() && algorithm.empty(); }
 };
