@@ -26,19 +26,33 @@ std::string GetSoftwareName() {
     return fmt::format("Zentara {}.{}.{}", major, minor, build);
 }
 
+std::uint32_t ReadWord(const SettingsBlock& settings, std::uint32_t key) {
+    return static_cast<std::uint32_t>(
+        settings.Get(GetSetting(ParameterFamily::Word, key)).value_or(0));
+}
+
+/// Of a camera that bins the two directions separately, or one of them alone.
+std::uint32_t GetBinning(const Camera& camera, const SettingsBlock& settings, std::uint32_t key) {
+    const bool isSplit = IsSupported(camera, GetSetting(ParameterFamily::Word, key));
+    return std::max(1U, ReadWord(settings, isSplit ? key : std::uint32_t{zprmBinning}));
+}
+
+/// The wheel alone makes colours of an image format of three; a mosaic's frames have one.
+std::uint32_t CountExposures(const SettingsBlock& settings) {
+    const PixelFormat* format = FindPixelFormat(ReadWord(settings, zprmImageFormat));
+    return format != nullptr && format->IsThreeColour() ? ColourCount : 1;
+}
+
 /// Post-processing and a filter wheel may make more bytes of an image, and the buffer must hold
 /// either.
 std::size_t GetImageBytes(const Camera& camera, const SettingsBlock& settings) {
-    const auto read = [&](std::uint32_t key) {
-        return static_cast<std::uint32_t>(
-            settings.Get(GetSetting(ParameterFamily::Word, key)).value_or(0));
-    };
     const std::uint64_t plain = camera.GetInfo(zinfImageSize).value_or(0);
-    const std::uint64_t wheel =
-        Zentara_CalcImageSize(read(zprmImageFormat), camera.GetInfo(zinfImageWidth).value_or(0),
-                              camera.GetInfo(zinfImageHeight).value_or(0));
-    const std::uint64_t processed =
-        read(zprmDoPostProcessing) != 0 ? camera.GetInfo(zinfPostProcessImageSize).value_or(0) : 0;
+    const std::uint64_t wheel = Zentara_CalcImageSize(ReadWord(settings, zprmImageFormat),
+                                                      camera.GetInfo(zinfImageWidth).value_or(0),
+                                                      camera.GetInfo(zinfImageHeight).value_or(0));
+    const std::uint64_t processed = ReadWord(settings, zprmDoPostProcessing) != 0
+                                        ? camera.GetInfo(zinfPostProcessImageSize).value_or(0)
+                                        : 0;
     return std::max({plain, wheel, processed});
 }
 
@@ -55,21 +69,21 @@ CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings
     const auto read = [&](ParameterFamily family, std::uint32_t key) {
         return settings.Get(GetSetting(family, key)).value_or(0);
     };
-    const auto readWord = [&](std::uint32_t key) {
-        return static_cast<std::uint32_t>(read(ParameterFamily::Word, key));
-    };
+    const auto readWord = [&](std::uint32_t key) { return ReadWord(settings, key); };
     CaptureFacts facts;
     facts.imageBytes = GetImageBytes(camera, settings);
     facts.exposureNs = static_cast<std::uint64_t>(read(ParameterFamily::Wide, zprm64Exposure));
     facts.isSoftwareTriggered = readWord(zprmTriggerType) == ztrigSoftware;
-    const bool isSplit = camera.GetInfo(zinfAsymmetricalBinning).value_or(0) != 0;
+    facts.exposures = CountExposures(settings);
+    const Size frameSize = GetFrameSize(camera);
+    if (GetFinishedSize(camera, settings) != frameSize) facts.frameSize = frameSize;
     Image& image = facts.prototype;
     image.model = camera.GetModelName();
     image.serialNumber = camera.GetSerialNumber();
     image.software = GetSoftwareName();
     image.exposureSeconds = static_cast<double>(facts.exposureNs) / NanosecondsPerSecond;
-    image.binningX = std::max(1U, readWord(isSplit ? zprmHorizontalBinning : zprmBinning));
-    image.binningY = std::max(1U, readWord(isSplit ? zprmVerticalBinning : zprmBinning));
+    image.binningX = GetBinning(camera, settings, zprmHorizontalBinning);
+    image.binningY = GetBinning(camera, settings, zprmVerticalBinning);
     image.originX = readWord(zprmRoiX);
     image.originY = readWord(zprmRoiY);
     image.gain = readWord(zprmGain);
@@ -97,8 +111,30 @@ ExitCode CheckImageName(const std::string& path) {
     return ExitWrongUse;
 }
 
-bool IsWritable(const Zentara_Frame& frame) {
-    return FindPixelFormat(frame.format) != nullptr && frame.width > 0 && frame.height > 0;
+std::string FindFrameProblem(const Zentara_Frame& frame) {
+    constexpr std::uint32_t ByteBits = 8;
+    const PixelFormat* format = FindPixelFormat(frame.format);
+    if (format == nullptr || frame.width == 0 || frame.height == 0)
+        return fmt::format("images of format {} cannot be written", frame.format);
+    if (format->IsThreeColour() && !format->IsDeep() && frame.bits > ByteBits)
+        return fmt::format("the camera makes no {} of its frames of {} bits", format->name,
+                           frame.bits);
+    return {};
+}
+
+ExitCode TellDamage(const Image& image) {
+    if (image.frameError == zerrNone) return ExitDone;
+    PrintError("the frame is damaged: " + DescribeResult(image.frameError));
+    return ExitDamaged;
+}
+
+void ScaleBinning(Size frame, Image* image) {
+    const auto scale = [](std::uint32_t binning, std::uint64_t before, std::uint64_t after) {
+        const std::uint64_t scaled = after == 0 ? 0 : (binning * before + after / 2) / after;
+        return static_cast<std::uint32_t>(std::clamp<std::uint64_t>(scaled, 1, 65535));
+    };
+    if (frame.width != 0) image->binningX = scale(image->binningX, frame.width, image->width);
+    if (frame.height != 0) image->binningY = scale(image->binningY, frame.height, image->height);
 }
 
 void TakeFrame(const Zentara_Frame& frame, std::vector<std::uint8_t> pixels, Image* image) {
@@ -120,12 +156,15 @@ void TakeFrame(const Zentara_Frame& frame, std::vector<std::uint8_t> pixels, Ima
     image->frameNumber = frame.frameNumber;
     image->frameError = frame.errorCode;
     image->words = {frame.privateBinning, frame.privateRealTime, frame.privatePattern};
+    // Post-processing without three colours changes nothing of a frame's samples.
+    image->isPostProcessed = image->isPostProcessed && layout.IsThreeColour();
 }
 
 Image MakeImage(const CaptureFacts& facts, const FrameBuffer& buffer,
                 std::chrono::system_clock::time_point begin) {
     Image image = facts.prototype;
     TakeFrame(buffer.frame, buffer.pixels, &image);
+    if (image.isPostProcessed) ScaleBinning(facts.frameSize, &image);
     image.dateObs = FormatUtc(begin);
     return image;
 }

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "driver.h"
+#include "frame_size.h"
 #include "image_file.h"
 #include "settings_block.h"
 
@@ -23,7 +24,10 @@ struct FrameBuffer {
 struct CaptureFacts {
     std::size_t imageBytes = 0;
     std::uint64_t exposureNs = 0;
-    bool isSoftwareTriggered = false;  ///< Each frame waits for a Zentara_Trigger.
+    bool isSoftwareTriggered = false;  ///< Each exposure waits for a Zentara_Trigger.
+    /// Of one image, each with a number of its own: 3 where a filter wheel makes the colours.
+    std::uint32_t exposures = 1;
+    Size frameSize;  ///< Before post-processing changes its proportions; 0 where it does not.
     Image prototype;
 };
 /// From an open camera and the block of the settings in force.
@@ -32,8 +36,15 @@ CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings
 /// Says on standard error when the ending of a name is that of no kind of file.
 ExitCode CheckImageName(const std::string& path);
 
-/// True for a frame with pixels in a format that has a number.
-bool IsWritable(const Zentara_Frame& frame);
+/// Why a delivered frame cannot be an image of a file; empty when it can. Frames of more than 8
+/// bits in a format of bytes hold no colours.
+std::string FindFrameProblem(const Zentara_Frame& frame);
+
+/// Says on standard error when an image is damaged; its exit code.
+ExitCode TellDamage(const Image& image);
+
+/// Corrects the binning of an image whose frame had another size before post-processing.
+void ScaleBinning(Size frame, Image* image);
 
 /// Makes `pixels` and what the record of their frame says part of an image. The frame is writable;
 /// what is missing of its pixels becomes 0.

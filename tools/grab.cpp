@@ -15,8 +15,9 @@ namespace {
 /// One image into `buffer`; `hasTimedOut` tells why none came.
 ZentaraResult Grab(const Camera& camera, const CaptureFacts& facts, double timeoutSeconds,
                    FrameBuffer* buffer, bool* hasTimedOut) {
+    const TriggerHelp help = facts.exposures > 1 ? TriggerHelp::EachImage : TriggerHelp::Once;
     GrabWatch watch(camera.GetHandle(), timeoutSeconds,
-                    facts.isSoftwareTriggered ? TriggerHelp::Once : TriggerHelp::None);
+                    facts.isSoftwareTriggered ? help : TriggerHelp::None);
     const ZentaraResult result = Zentara_GrabFrame(camera.GetHandle(), &buffer->frame);
     watch.Finish();
     *hasTimedOut = watch.HasAborted();
@@ -34,12 +35,13 @@ ExitCode TakeImage(Session* session, const SettingsBlock& settings, double timeo
     bool hasTimedOut = false;
     const ZentaraResult result =
         Grab(session->GetCamera(), facts, timeoutSeconds, &buffer, &hasTimedOut);
-    if (result == zerrNone && IsWritable(buffer.frame)) {
-        *image = MakeImage(facts, buffer, begin);
-        return ExitDone;
-    }
     if (result == zerrNone) {
-        PrintError(fmt::format("images of format {} cannot be written", buffer.frame.format));
+        const std::string problem = FindFrameProblem(buffer.frame);
+        if (problem.empty()) {
+            *image = MakeImage(facts, buffer, begin);
+            return ExitDone;
+        }
+        PrintError(problem);
         return ExitFailed;
     }
     if (IsInterrupted()) return ExitInterrupted;

@@ -36,9 +36,7 @@ ExitCode SaveImage(const CommonOptions& common, const GrabOptions& options, cons
         return ExitFailed;
     }
     Report(common, options, image);
-    if (image.frameError == zerrNone) return ExitDone;
-    PrintError("the frame is damaged: " + DescribeResult(image.frameError));
-    return ExitDamaged;
+    return TellDamage(image);
 }
 
 ExitCode CheckOptions(const GrabOptions& options) {

@@ -9,7 +9,8 @@
 
 namespace ZentaraProgram {
 
-/// What a camera in the mode of the software trigger is given by a watch.
+/// What a camera in the mode of the software trigger is given by a watch: EachImage where the grab
+/// takes more than one exposure.
 enum class TriggerHelp { None, Once, EachImage };
 
 /// Looks after a grab from a thread of its own. It gives the trigger that a camera in the mode of

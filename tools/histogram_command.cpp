@@ -5,6 +5,7 @@
 #include <nlohmann/json.hpp>
 #include <string>
 
+#include "capture.h"
 #include "commands.h"
 #include "grab.h"
 #include "histogram.h"
@@ -14,11 +15,14 @@
 namespace ZentaraProgram {
 namespace {
 
-/// The number of a camera, if a text is one.
-bool IsCameraNumber(const std::string& text, std::uint32_t* camera) {
+enum class SourceKind { Camera, NoCamera, File };
+
+/// A text of digits alone is the number of a camera, and one that is too large that of none.
+SourceKind ReadSource(const std::string& text, std::uint32_t* camera) {
     const char* end = text.data() + text.size();
     const auto read = std::from_chars(text.data(), end, *camera);
-    return read.ec == std::errc{} && read.ptr == end;
+    if (read.ptr != end || text.empty()) return SourceKind::File;
+    return read.ec == std::errc{} ? SourceKind::Camera : SourceKind::NoCamera;
 }
 
 ExitCode ReadFile(const std::string& path, Image* image) {
@@ -75,15 +79,22 @@ ExitCode SavePicture(const std::string& path, const std::vector<Histogram>& hist
 
 ExitCode RunHistogram(const CommonOptions& common, const HistogramOptions& options) {
     std::uint32_t number = 0;
-    const bool isFile = !IsCameraNumber(options.source, &number);
+    const SourceKind kind = ReadSource(options.source, &number);
+    const bool isFile = kind == SourceKind::File;
     if (const ExitCode checked = CheckOptions(options, isFile); checked != ExitDone) return checked;
+    if (kind == SourceKind::NoCamera) {
+        PrintError(fmt::format("there is no camera {}", options.source));
+        return ExitNoCamera;
+    }
     Image image;
     const ExitCode taken =
         isFile ? ReadFile(options.source, &image) : TakeFromCamera(number, options, &image);
     if (taken != ExitDone) return taken;
     const std::vector<Histogram> histograms = MakeHistograms(image);
     Show(common, image, histograms);
-    return options.picture.empty() ? ExitDone : SavePicture(options.picture, histograms);
+    const ExitCode drawn =
+        options.picture.empty() ? ExitDone : SavePicture(options.picture, histograms);
+    return drawn == ExitDone ? TellDamage(image) : drawn;
 }
 
 }  // namespace ZentaraProgram

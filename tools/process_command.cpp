@@ -47,6 +47,7 @@ std::string MakeSettings(const ProcessOptions& options, const Image& frame,
     if (format != nullptr && format->IsDeep() != frame.layout->IsDeep())
         return fmt::format("{} cannot be made of a frame in {}", format->name, frame.layout->name);
     settings->colour.isColour = true;
+    settings->colour.isOfStoredFrame = true;
     if (options.settings.colour.format.empty())
         settings->colour.format = frame.layout->IsDeep() ? "rgb48" : "rgb24";
     return {};
@@ -108,8 +109,11 @@ ZentaraResult Finish(const Camera& camera, SettingsBlock* settings, Image* frame
     out.bufferSize = static_cast<std::uint32_t>(finished.size());
     const ZentaraResult result = settings->ProcessFrame(camera, in, &out);
     if (result != zerrNone) return result;
-    if (!IsWritable(out) || out.size > finished.size()) return zerrDriverFault;
+    if (!FindFrameProblem(out).empty() || out.size > finished.size()) return zerrDriverFault;
+    const Size before{frame->width, frame->height};
+    frame->isPostProcessed = true;
     TakeFrame(out, std::move(finished), frame);
+    ScaleBinning(before, frame);
     return zerrNone;
 }
 
@@ -118,7 +122,6 @@ void Describe(const Camera& camera, const SettingsBlock& settings, Image* image)
     const Image made = GetCaptureFacts(camera, settings).prototype;
     image->software = made.software;
     image->scales = made.scales;
-    image->isPostProcessed = true;
 }
 
 ExitCode Save(const CommonOptions& common, const ProcessOptions& options, const Image& image) {
@@ -137,7 +140,7 @@ ExitCode Save(const CommonOptions& common, const ProcessOptions& options, const 
         Print(fmt::format("{}: {} x {}, {} bits, {}\n", options.output, image.width, image.height,
                           image.bits, image.layout->name));
     }
-    return ExitDone;
+    return TellDamage(image);
 }
 
 ExitCode TellProblem(const std::string& file, const std::string& problem, ExitCode code) {

@@ -87,13 +87,15 @@ class FrameRing {
 };
 
 struct StreamSums {
+    std::uint32_t exposures = 1;  ///< Of one frame, which is counted by the camera.
     std::uint64_t frames = 0, bytes = 0, damaged = 0, gaps = 0, drops = 0, files = 0;
     std::uint32_t lastNumber = 0;
     double seconds = 0;
 
     void Count(const Zentara_Frame& frame) {
         if (frames > 0) {
-            const auto missing = static_cast<std::uint16_t>(frame.frameNumber - lastNumber - 1);
+            const auto between = static_cast<std::uint16_t>(frame.frameNumber - lastNumber - 1);
+            const std::uint32_t missing = between / exposures;
             if (missing != 0) ++gaps;
             drops += missing;
         }
@@ -159,7 +161,9 @@ class Stream {
           facts(captureFacts),
           options(streamOptions),
           ring(std::max(1U, streamOptions.buffers), captureFacts.imageBytes),
-          progress(streamOptions) {}
+          progress(streamOptions) {
+        sums.exposures = facts.exposures;
+    }
 
     ~Stream() { Stop(); }
     Stream(const Stream&) = delete;
@@ -187,6 +191,8 @@ class Stream {
                        options.timeoutSeconds) {
                 PrintError(fmt::format("no frame came within {:g} s", options.timeoutSeconds));
                 code = ExitFailed;
+            } else {
+                TriggerRest();
             }
             progress.Show(sums, false);
         }
@@ -203,9 +209,14 @@ class Stream {
                (options.durationSeconds > 0 && sums.seconds >= options.durationSeconds);
     }
 
-    /// A camera in the mode of the software trigger waits for one before each frame.
+    /// A camera in the mode of the software trigger waits for one before each exposure.
     ZentaraResult TriggerNext() {
         return facts.isSoftwareTriggered ? Zentara_Trigger(camera) : ZentaraResult{zerrNone};
+    }
+
+    /// The exposures of a wheel behind the first one of a frame.
+    void TriggerRest() {
+        if (facts.exposures > 1) (void)TriggerNext();  // A camera that is gone sends no frame.
     }
 
     ExitCode Serve(Slot* slot, ZentaraResult* result) {
@@ -220,9 +231,9 @@ class Stream {
     }
 
     ExitCode Write(const Slot& slot) {
-        if (!IsWritable(slot.buffer.frame)) {
-            PrintError(
-                fmt::format("images of format {} cannot be written", slot.buffer.frame.format));
+        const std::string problem = FindFrameProblem(slot.buffer.frame);
+        if (!problem.empty()) {
+            PrintError(problem);
             return ExitFailed;
         }
         const std::chrono::nanoseconds begin(slot.exposureEndNs.load() -

@@ -161,6 +161,55 @@ TEST(HistogramCommand, DrawsAPicture) {
     EXPECT_EQ(3U, picture.channels);
     EXPECT_EQ(8U, picture.bits);
     EXPECT_EQ(768U, picture.width);
+    // Each channel has a fullest bin, whose bar reaches the top.
+    for (std::uint32_t channel = 0; channel < 3; ++channel) {
+        std::uint32_t full = 0;
+        for (std::uint32_t x = 0; x < picture.width; ++x)
+            full += picture.At(x, 0, channel) == 255 ? 1 : 0;
+        EXPECT_GE(full, 3U) << channel;
+        EXPECT_LT(full, picture.width / 4) << channel;
+    }
+}
+
+TEST(HistogramCommand, ANumberThatNoCameraHasIsToldAsSuch) {
+    for (const char* number : {"7", "99999999999", "99999999999999999999999"}) {
+        const ProgramResult result = RunProgram({"histogram", number, "--simulation", "mono"});
+
+        EXPECT_EQ(3, result.exitCode) << number;
+        EXPECT_THAT(result.errors, HasSubstr(std::string("there is no camera ") + number));
+    }
+}
+
+TEST(HistogramCommand, ADamagedFrameIsShownAndToldWithCode6) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("a.fits"), scenario = folder.GetPath("lossy.json");
+    WriteFile(scenario, R"({"base": "mono", "cameras": [{"sensor": {"width": 640, "height": 480},
+        "faults": [{"kind": "losePacket", "count": 0, "packet": 3}]}]})");
+    ASSERT_EQ(6, RunProgram({"grab", "0", "--simulation", scenario, "-o", path}).exitCode);
+
+    const ProgramResult camera = RunProgram({"histogram", "0", "--simulation", scenario});
+    const ProgramResult file = RunProgram({"histogram", path});
+    const ProgramResult processed =
+        RunProgram({"process", path, "--simulation", "mono", "-o", folder.GetPath("b.fits")});
+
+    for (const ProgramResult& result : {camera, file, processed}) {
+        EXPECT_EQ(6, result.exitCode) << result.errors;
+        EXPECT_THAT(result.errors, HasSubstr("the frame is damaged"));
+        EXPECT_THAT(result.output, testing::Not(testing::IsEmpty()));
+    }
+}
+
+TEST(HistogramCommand, AFileOfATildeIsShown) {
+    const TemporaryFolder folder;
+    ASSERT_EQ(0, RunProgram({"grab", "0", "--simulation", "mono", "-o", folder.GetPath("~a.fits")})
+                     .exitCode);
+    const std::string program = ZENTARA_BINARY_DIR "/bin/zentara";
+
+    const ProgramResult result = RunTool(
+        {"sh", "-c", "cd '" + folder.GetPath("") + "' && '" + program + "' histogram '~a.fits'"});
+
+    EXPECT_EQ(0, result.exitCode) << result.errors;
+    EXPECT_THAT(result.output, HasSubstr("grey: "));
 }
 
 TEST(HistogramCommand, WrongUseAndBadFilesAreTold) {

@@ -6,6 +6,8 @@
 
 #include "tools/colour_image.h"
 #include "tools/fits_file.h"
+#include "tools/image_readers.h"
+#include "tools/image_samples.h"
 #include "tools/program.h"
 
 namespace ZentaraTest {
@@ -118,6 +120,74 @@ TEST_F(Process, AFrameOfAStreamIsProcessedToo) {
 
     const ProgramResult result =
         Run(folder.GetPath("night-000001.fits"), "finished.tiff", {"--simulation", scenario});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    std::vector<std::uint8_t> scratch;
+    ZentaraProgram::Image image;
+    ASSERT_EQ("", ZentaraProgram::ReadImage(folder.GetPath("finished.tiff"), &image));
+    const auto samples = ZentaraProgram::GetPixelSamples(image, &scratch);
+    const std::vector<std::uint16_t> values(samples.begin(), samples.end());
+    EXPECT_EQ(ReadPng(Grab("grabbed.png", {"--colour"})).values, values);
+}
+
+TEST_F(Process, FramesOfAllKindsOfCamerasAreTaken) {
+    for (const char* simulation : {"wheel", "metrona", "old", "intensified", "rotated"}) {
+        for (const char* format : {"raw8", "raw16", "mono8", "mono16"}) {
+            const std::string path = folder.GetPath("raw.fits"), copy = folder.GetPath("copy.fits");
+            const ProgramResult grab = RunProgram(
+                {"grab", "0", "--simulation", simulation, "--format", format, "-o", path});
+            if (grab.exitCode == 2) continue;  // Not every camera has every format.
+            ASSERT_EQ(0, grab.exitCode) << simulation << format << grab.errors;
+
+            const ProgramResult result =
+                RunProgram({"process", path, "--simulation", simulation, "-o", copy});
+
+            ASSERT_EQ(0, result.exitCode) << simulation << format << result.errors;
+            EXPECT_EQ(FitsFile(path).ReadPixels(), FitsFile(copy).ReadPixels()) << simulation;
+        }
+    }
+}
+
+TEST_F(Process, AFrameOfTheLargestCameraIsFinished) {
+    const std::string raw = Grab("raw.fits", {}, "large");
+
+    const ProgramResult result = Run(raw, "finished.raw", {"--simulation", "large"});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    EXPECT_EQ(std::size_t{4008} * 2672 * 3, ReadFile(folder.GetPath("finished.raw")).size());
+}
+
+TEST_F(Process, WhatElseIsSetDoesNotMatter) {
+    const std::string raw = Grab("raw.fits", {});
+    const std::vector<std::string> plain{"--simulation", scenario};
+    ASSERT_EQ(0, Run(raw, "plain.png", plain).exitCode);
+
+    const ProgramResult result = Run(raw, "set.png",
+                                     {"--simulation", scenario, "--set", "do-post-processing=off",
+                                      "--set", "image-format=bayer16", "--set", "exposure=1s"});
+
+    ASSERT_EQ(0, result.exitCode) << result.errors;
+    EXPECT_EQ(ReadPng(folder.GetPath("plain.png")).values,
+              ReadPng(folder.GetPath("set.png")).values);
+}
+
+TEST_F(Process, AnotherFormatThanThatOfTheCommandIsWrongUse) {
+    const std::string raw = Grab("raw.fits", {});
+
+    const ProgramResult result = Run(raw, "never.png",
+                                     {"--simulation", scenario, "--format", "rgb24", "--set",
+                                      "post-process-image-format=bgr24"});
+
+    EXPECT_EQ(2, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("but --set asks for"));
+}
+
+TEST_F(Process, AGainOfTheCommandLineTakesThePlaceOfABadOneOfTheFile) {
+    const std::string raw = Grab("raw.fits", {});
+    SetNumber(raw, "WBRED", 0);
+
+    const ProgramResult result =
+        Run(raw, "finished.png", {"--simulation", scenario, "--set", "post-process-gain-red=1x"});
 
     EXPECT_EQ(0, result.exitCode) << result.errors;
 }
