@@ -5,7 +5,7 @@ namespace ZentaraProgram {
 /// Exit codes of the program, part of its interface.
 enum ExitCode : int {
     ExitDone = 0,
-    ExitFailed = 1,      ///< Camera or capture failed, or a file could not be written.
+    ExitFailed = 1,      ///< Camera or capture failed, or a file could not be read or written.
     ExitWrongUse = 2,    ///< Arguments, or a scenario that is refused.
     ExitNoCamera = 3,    ///< No such camera in the list.
     ExitCameraBusy = 4,  ///< Code 30, or a listed camera that cannot be opened.

@@ -3,6 +3,7 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <charconv>
+#include <cmath>
 #include <cstdio>
 #include <exception>
 #include <string>
@@ -85,10 +86,14 @@ void AddSettings(CLI::App* command, SettingsOptions* settings) {
         ->allow_extra_args(false);
 }
 
-void AddFormat(CLI::App* command, ColourOptions* colour) {
-    command->add_option(
-        "--format", colour->format,
-        "Format of the images: rgb24, rgb48, bgr24, rgb-planes, bayer8, mono16 ...");
+constexpr const char* FormatMeaning =
+    "Format of the images: rgb24, rgb48, bgr24, rgb-planes, bayer8, mono16 ...";
+constexpr const char* FinishedFormatMeaning =
+    "Format of the image of a mosaic: of 8 bits rgb24 (else), bgr24, xrgb32 or bgrx32; of more "
+    "rgb48";
+
+void AddFormat(CLI::App* command, ColourOptions* colour, const char* meaning) {
+    command->add_option("--format", colour->format, meaning);
     command->add_option("--bayer", colour->algorithm,
                         "How a mosaic becomes colours: average, fast or bicubic");
 }
@@ -96,13 +101,21 @@ void AddFormat(CLI::App* command, ColourOptions* colour) {
 void AddColour(CLI::App* command, ColourOptions* colour) {
     command->add_flag("--colour,--color", colour->isColour,
                       "Three colours, made and balanced by post-processing");
-    AddFormat(command, colour);
+    AddFormat(command, colour, FormatMeaning);
+}
+
+/// The ranges of numbers let through what is no number.
+std::string FindNoNumber(std::string& text) {
+    double number = 0;
+    const bool isNumber = CLI::detail::lexical_cast(text, number) && std::isfinite(number);
+    return isNumber ? std::string{} : fmt::format("'{}' is no number", text);
 }
 
 void AddTimeout(CLI::App* command, double* seconds, const char* meaning) {
     command->add_option("--timeout", *seconds, meaning)
         ->default_val(60)
-        ->check(CLI::Range(0.001, 1e6));
+        ->check(CLI::Range(0.001, 1e6))
+        ->check(CLI::Validator(FindNoNumber, ""));
 }
 
 void AddRegion(CLI::App* command, std::string* region) {
@@ -166,7 +179,8 @@ void AddStream(CLI::App& app, Arguments* arguments) {
     stream->add_option("-n,--count", options->count, "Number of frames")
         ->check(CLI::PositiveNumber);
     stream->add_option("-d,--duration", options->durationSeconds, "Length, seconds")
-        ->check(CLI::PositiveNumber);
+        ->check(CLI::PositiveNumber)
+        ->check(CLI::Validator(FindNoNumber, ""));
     stream->add_option("-o,--output", options->output,
                        "Numbered files: night.fits gives night-000001.fits ...");
     AddTimeout(stream, &options->timeoutSeconds, "Longest wait for a frame, seconds");
@@ -204,7 +218,7 @@ void AddProcess(CLI::App& app, Arguments* arguments) {
         ->required();
     process->add_option("--camera", arguments->common.camera, "Number of the camera in the list")
         ->default_val(0);
-    AddFormat(process, &options->settings.colour);
+    AddFormat(process, &options->settings.colour, FinishedFormatMeaning);
     AddSettings(process, &options->settings);
     process->footer(ProcessNote);
 }
@@ -314,9 +328,9 @@ ExitCode Run(int count, char** values) {
     CLI::App app{"Cameras on the command line"};
     app.name("zentara");
     app.footer(
-        "Exit codes: 0 done, 1 camera or capture failed, 2 wrong use, 3 no such camera, 4 camera "
-        "busy,\n"
-        "5 camera gone, 6 finished with lost or damaged frames, 130 interrupted.");
+        "Exit codes: 0 done, 1 camera, capture or a file failed, 2 wrong use, 3 no such camera, "
+        "4 camera\n"
+        "busy, 5 camera gone, 6 finished with lost or damaged frames, 130 interrupted.");
     app.require_subcommand(1);
     AddCommon(&app, &arguments.common);
     AddCommon(app.add_subcommand("list", "List the cameras that nobody else holds"),
