@@ -58,9 +58,14 @@ void Double16(const Word* row, Word* output, std::size_t count);
 void LinearRow8(const std::uint8_t* row, const LinearPlan& plan, std::uint16_t* output);
 void LinearColumn8(const std::uint16_t* upper, const std::uint16_t* lower, std::int32_t weight,
                    std::uint8_t* output, std::size_t count);
+void LinearColumnPair8(const std::uint16_t* upper, const std::uint16_t* lower,
+                       const std::int32_t weights[2], std::uint8_t* const outputs[2],
+                       std::size_t count);
 void LinearRow16(const Word* row, const LinearPlan& plan, std::uint16_t* output);
 void LinearColumn16(const std::uint16_t* upper, const std::uint16_t* lower, std::int32_t weight,
                     Word* output, std::size_t count);
+void LinearColumnPair16(const std::uint16_t* upper, const std::uint16_t* lower,
+                        const std::int32_t weights[2], Word* const outputs[2], std::size_t count);
 
 void CubicRow8(const std::uint8_t* row, const CubicPlan& plan, float* output);
 void CubicRow16(const Word* row, const CubicPlan& plan, float* output);
@@ -68,6 +73,10 @@ void CubicColumn8(const float* const rows[4], const CubicWeights& weights, std::
                   std::size_t count);
 void CubicColumn16(const float* const rows[4], const CubicWeights& weights, Word* output,
                    std::size_t count);
+void CubicColumnPair8(const float* const rows[4], const CubicWeights weights[2],
+                      std::uint8_t* const outputs[2], std::size_t count);
+void CubicColumnPair16(const float* const rows[4], const CubicWeights weights[2],
+                       Word* const outputs[2], std::size_t count);
 
 }  // namespace AVX2Rows
 

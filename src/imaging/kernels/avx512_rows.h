@@ -66,6 +66,31 @@ static constexpr SamplePlaces MakeSamplePlaces() {
 
 static constexpr SamplePlaces Places = MakeSamplePlaces();
 
+// The difference of two unsigned words may be 65536 more or less than the word that is left of it.
+// The rounded product of that word and a weight f, a multiplication of signed words, is then too
+// small or too great by 4 * f: the word is negative and should not be, or the reverse.
+
+/// Differences of words, and what tells where they are not their words.
+struct WordDifferences {
+    __m512i words;
+    __mmask32 isNegative, isFalling;
+};
+
+static inline WordDifferences SubtractWords(__m512i from, __m512i to) {
+    const __m512i words = _mm512_sub_epi16(to, from);
+    return {words, _mm512_movepi16_mask(words), _mm512_cmplt_epu16_mask(to, from)};
+}
+
+/// (from * (16384 - f) + to * f + 8192) >> 14; `doubled` is twice f, which is below 16384.
+static inline __m512i WeightWords(__m512i from, const WordDifferences& differences,
+                                  __m512i doubled) {
+    const __m512i fourfold = _mm512_add_epi16(doubled, doubled);
+    const __m512i share = _mm512_mulhrs_epi16(differences.words, doubled);
+    const __m512i sum = _mm512_add_epi16(from, share);
+    const __m512i lifted = _mm512_mask_add_epi16(sum, differences.isNegative, sum, fourfold);
+    return _mm512_mask_sub_epi16(lifted, differences.isFalling, lifted, fourfold);
+}
+
 /// The loops that enlarge; contracts are those of the fields of RowKernels.
 namespace AVX512Rows {
 
@@ -75,9 +100,14 @@ void Double16(const Word* row, Word* output, std::size_t count);
 void LinearRow8(const std::uint8_t* row, const LinearPlan& plan, std::uint16_t* output);
 void LinearColumn8(const std::uint16_t* upper, const std::uint16_t* lower, std::int32_t weight,
                    std::uint8_t* output, std::size_t count);
+void LinearColumnPair8(const std::uint16_t* upper, const std::uint16_t* lower,
+                       const std::int32_t weights[2], std::uint8_t* const outputs[2],
+                       std::size_t count);
 void LinearRow16(const Word* row, const LinearPlan& plan, std::uint16_t* output);
 void LinearColumn16(const std::uint16_t* upper, const std::uint16_t* lower, std::int32_t weight,
                     Word* output, std::size_t count);
+void LinearColumnPair16(const std::uint16_t* upper, const std::uint16_t* lower,
+                        const std::int32_t weights[2], Word* const outputs[2], std::size_t count);
 
 void CubicRow8(const std::uint8_t* row, const CubicPlan& plan, float* output);
 void CubicRow16(const Word* row, const CubicPlan& plan, float* output);
@@ -85,6 +115,10 @@ void CubicColumn8(const float* const rows[4], const CubicWeights& weights, std::
                   std::size_t count);
 void CubicColumn16(const float* const rows[4], const CubicWeights& weights, Word* output,
                    std::size_t count);
+void CubicColumnPair8(const float* const rows[4], const CubicWeights weights[2],
+                      std::uint8_t* const outputs[2], std::size_t count);
+void CubicColumnPair16(const float* const rows[4], const CubicWeights weights[2],
+                       Word* const outputs[2], std::size_t count);
 
 }  // namespace AVX512Rows
 

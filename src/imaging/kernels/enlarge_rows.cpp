@@ -13,6 +13,9 @@ constexpr std::int32_t WeightOne = 16384;
 constexpr std::size_t GroupOutputs = 8;
 constexpr std::size_t GroupBytes = 16;
 constexpr std::int32_t GroupCubicSamples = 8;
+constexpr std::size_t RunOutputs = 32;
+constexpr std::size_t RunBytes = 64;
+constexpr std::int32_t LastRunPlace = 63;
 
 double CalculateStep(std::int32_t sourceLength, double factor) {
     const double length = sourceLength * factor;
@@ -92,6 +95,23 @@ std::uint8_t* WritePair(std::int32_t sample, std::size_t sampleBytes, std::uint8
     return pair;
 }
 
+/// The first run's place in memory that has room for one run more.
+LinearRun* AlignRuns(std::uint8_t* memory) {
+    const auto address = reinterpret_cast<std::uintptr_t>(memory);
+    const std::size_t skipped = (~address + 1) % alignof(LinearRun);
+    return reinterpret_cast<LinearRun*>(memory + skipped);
+}
+
+void WriteRunSlot(const LinearPosition& position, std::int32_t place, std::size_t sampleBytes,
+                  std::size_t slot, LinearRun* run) {
+    const bool isNextSample = position.weight == WeightOne;
+    const std::int32_t first = isNextSample ? place + 1 : place;
+    const std::int32_t second = sampleBytes == 1 ? std::min(first + 1, LastRunPlace) : 0;
+    run->places[2 * slot] = static_cast<std::uint8_t>(first);
+    run->places[2 * slot + 1] = static_cast<std::uint8_t>(second);
+    run->doubledWeights[slot] = static_cast<std::int16_t>(isNextSample ? 0 : 2 * position.weight);
+}
+
 }  // namespace
 
 LinearPositions::LinearPositions(std::int32_t sourceLength, std::int32_t outputLength,
@@ -114,7 +134,35 @@ LinearPositions::LinearPositions(std::int32_t sourceLength, std::int32_t outputL
         weights[2 * output + 1] = static_cast<std::int16_t>(position.weight);
     }
     positions = std::move(made);
-    plan = {positions.get(), count, groups, bases.get(), pairs.get(), weights.get()};
+    plan.positions = positions.get();
+    plan.count = count;
+    plan.groupCount = groups;
+    plan.bases = bases.get();
+    plan.pairs = pairs.get();
+    plan.weights = weights.get();
+    if (!MakeRuns(sourceLength, sampleBytes)) positions = nullptr;
+}
+
+bool LinearPositions::MakeRuns(std::int32_t sourceLength, std::size_t sampleBytes) {
+    const std::size_t count = (plan.count + RunOutputs - 1) / RunOutputs;
+    const auto reach = static_cast<std::int32_t>(RunBytes / sampleBytes) - 2;
+    runBases = MakeScratch<std::int32_t>(count);
+    runMemory = MakeScratch<std::uint8_t>((count + 1) * sizeof(LinearRun));
+    if (!runBases || !runMemory) return false;
+    LinearRun* const runs = AlignRuns(runMemory.get());
+    plan.sourceCount = static_cast<std::size_t>(sourceLength);
+    plan.runBases = runBases.get();
+    plan.runs = runs;
+    for (std::size_t slot = 0; slot < count * RunOutputs; ++slot) {
+        const LinearPosition& position = positions[std::min(slot, plan.count - 1)];
+        std::int32_t& base = runBases[slot / RunOutputs];
+        if (slot % RunOutputs == 0) base = position.index;
+        if (position.index - base > reach) return true;
+        WriteRunSlot(position, position.index - base, sampleBytes, slot % RunOutputs,
+                     &runs[slot / RunOutputs]);
+    }
+    plan.runCount = count;
+    return true;
 }
 
 CubicPositions::CubicPositions(std::int32_t sourceLength, std::int32_t outputLength,

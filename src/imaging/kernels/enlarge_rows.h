@@ -28,7 +28,11 @@ class LinearPositions {
     Scratch<std::int32_t> bases;
     Scratch<std::uint8_t> pairs;
     Scratch<std::int16_t> weights;
+    Scratch<std::int32_t> runBases;
+    Scratch<std::uint8_t> runMemory;
     LinearPlan plan;
+
+    [[nodiscard]] bool MakeRuns(std::int32_t sourceLength, std::size_t sampleBytes);
 };
 
 class CubicPositions {

@@ -104,6 +104,13 @@ void LinearColumn(const std::uint16_t* upper, const std::uint16_t* lower, std::i
     }
 }
 
+template <typename Sample>
+void LinearColumnPair(const std::uint16_t* upper, const std::uint16_t* lower,
+                      const std::int32_t weights[2], Sample* const outputs[2], std::size_t count) {
+    LinearColumn(upper, lower, weights[0], outputs[0], count);
+    LinearColumn(upper, lower, weights[1], outputs[1], count);
+}
+
 /// The value of the cubic through four samples: Newton's form, in this order of operations.
 inline float EvaluateCubic(float a, float c, float d, float e, const CubicWeights& weights) {
     const float first = c - a;
@@ -142,6 +149,13 @@ void CubicColumn(const float* const rows[4], const CubicWeights& weights, Sample
 }
 
 template <typename Sample>
+void CubicColumnPair(const float* const rows[4], const CubicWeights weights[2],
+                     Sample* const outputs[2], std::size_t count) {
+    CubicColumn(rows, weights[0], outputs[0], count);
+    CubicColumn(rows, weights[1], outputs[1], count);
+}
+
+template <typename Sample>
 void Split(const Sample* row, Sample* even, Sample* odd, std::size_t count) {
     for (std::size_t index = 0; index < count; ++index) {
         even[index] = row[2 * index];
@@ -176,12 +190,16 @@ const RowKernels PlainRowKernels{
     .double16 = Double<Word>,
     .linearRow8 = LinearRow<std::uint8_t>,
     .linearColumn8 = LinearColumn<std::uint8_t>,
+    .linearColumnPair8 = LinearColumnPair<std::uint8_t>,
     .linearRow16 = LinearRow<Word>,
     .linearColumn16 = LinearColumn<Word>,
+    .linearColumnPair16 = LinearColumnPair<Word>,
     .cubicRow8 = CubicRow<std::uint8_t>,
     .cubicRow16 = CubicRow<Word>,
     .cubicColumn8 = CubicColumn<std::uint8_t>,
+    .cubicColumnPair8 = CubicColumnPair<std::uint8_t>,
     .cubicColumn16 = CubicColumn<Word>,
+    .cubicColumnPair16 = CubicColumnPair<Word>,
     .split8 = Split<std::uint8_t>,
     .split16 = Split<Word>,
     .addHalves8 = AddHalves<std::uint8_t>,

@@ -17,6 +17,15 @@ struct LinearPosition {
     std::int32_t weight;
 };
 
+/// What the 32 outputs of a run take of the samples that are read for it: sample `index`, or for
+/// the weight 16384 the one behind it, with the weight 0.
+struct alignas(64) LinearRun {
+    /// Per output two bytes: for 8-bit samples the places of the sample and of the one behind it
+    /// (at most 63), for 16-bit samples the place of the sample as a word.
+    std::uint8_t places[64];
+    std::int16_t doubledWeights[32];  ///< Twice the weight, 0 to 32766.
+};
+
 /// The linear row pass of one call: what every output sample takes, and the same once more for
 /// groups of eight outputs in the shape in which vector forms read it. Groups cover the first
 /// 8 * `groupCount` outputs; the rest, or all of a row too short for groups, goes by `positions`.
@@ -32,6 +41,15 @@ struct LinearPlan {
     const std::uint8_t* pairs = nullptr;
     /// Per output: 16384 - `weight`, `weight` (16 numbers per group).
     const std::int16_t* weights = nullptr;
+
+    /// The same for runs of 32 outputs, of which the last may have less: all of them, or none where
+    /// a run needs more samples than 64 bytes hold.
+    std::size_t runCount = 0;
+    std::size_t sourceCount = 0;  ///< Samples of the row.
+    /// Per run: the sample at which its samples begin. What of the 64 bytes lies beyond the row is
+    /// not there to be read.
+    const std::int32_t* runBases = nullptr;
+    const LinearRun* runs = nullptr;
 };
 
 /// Weights of a cubic pass at a parameter t, in single precision: 1 + t, t * (1 + t) * 0.5, and
@@ -106,9 +124,16 @@ struct RowKernels {
     void (*linearRow8)(const std::uint8_t* row, const LinearPlan& plan, std::uint16_t* output);
     void (*linearColumn8)(const std::uint16_t* upper, const std::uint16_t* lower,
                           std::int32_t weight, std::uint8_t* output, std::size_t count);
+    /// Two output rows at once, one by each weight.
+    void (*linearColumnPair8)(const std::uint16_t* upper, const std::uint16_t* lower,
+                              const std::int32_t weights[2], std::uint8_t* const outputs[2],
+                              std::size_t count);
     void (*linearRow16)(const Word* row, const LinearPlan& plan, std::uint16_t* output);
     void (*linearColumn16)(const std::uint16_t* upper, const std::uint16_t* lower,
                            std::int32_t weight, Word* output, std::size_t count);
+    void (*linearColumnPair16)(const std::uint16_t* upper, const std::uint16_t* lower,
+                               const std::int32_t weights[2], Word* const outputs[2],
+                               std::size_t count);
 
     /// Row pass into single precision, without rounding, and its column pass over four such rows:
     /// converted to double, 0.5000001 added, the fraction cut off, held within the samples' range.
@@ -116,8 +141,13 @@ struct RowKernels {
     void (*cubicRow16)(const Word* row, const CubicPlan& plan, float* output);
     void (*cubicColumn8)(const float* const rows[4], const CubicWeights& weights,
                          std::uint8_t* output, std::size_t count);
+    /// Two output rows at once, one by each of the weights.
+    void (*cubicColumnPair8)(const float* const rows[4], const CubicWeights weights[2],
+                             std::uint8_t* const outputs[2], std::size_t count);
     void (*cubicColumn16)(const float* const rows[4], const CubicWeights& weights, Word* output,
                           std::size_t count);
+    void (*cubicColumnPair16)(const float* const rows[4], const CubicWeights weights[2],
+                              Word* const outputs[2], std::size_t count);
 
     /// Samples 0, 2, 4, ... go to `even`, the others to `odd`; `count` is of pairs.
     void (*split8)(const std::uint8_t* row, std::uint8_t* even, std::uint8_t* odd,

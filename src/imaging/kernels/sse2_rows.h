@@ -30,11 +30,20 @@ void LinearColumn8(const std::uint16_t* upper, const std::uint16_t* lower, std::
                    std::uint8_t* output, std::size_t count);
 void LinearColumn16(const std::uint16_t* upper, const std::uint16_t* lower, std::int32_t weight,
                     Word* output, std::size_t count);
+void LinearColumnPair8(const std::uint16_t* upper, const std::uint16_t* lower,
+                       const std::int32_t weights[2], std::uint8_t* const outputs[2],
+                       std::size_t count);
+void LinearColumnPair16(const std::uint16_t* upper, const std::uint16_t* lower,
+                        const std::int32_t weights[2], Word* const outputs[2], std::size_t count);
 
 void CubicColumn8(const float* const rows[4], const CubicWeights& weights, std::uint8_t* output,
                   std::size_t count);
 void CubicColumn16(const float* const rows[4], const CubicWeights& weights, Word* output,
                    std::size_t count);
+void CubicColumnPair8(const float* const rows[4], const CubicWeights weights[2],
+                      std::uint8_t* const outputs[2], std::size_t count);
+void CubicColumnPair16(const float* const rows[4], const CubicWeights weights[2],
+                       Word* const outputs[2], std::size_t count);
 
 void Split8(const std::uint8_t* row, std::uint8_t* even, std::uint8_t* odd, std::size_t count);
 
