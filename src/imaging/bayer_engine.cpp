@@ -70,9 +70,14 @@ struct SampleLoops {
     void (*linearRow)(const Sample* row, const LinearPlan& plan, std::uint16_t* output);
     void (*linearColumn)(const std::uint16_t* upper, const std::uint16_t* lower,
                          std::int32_t weight, Sample* output, std::size_t count);
+    void (*linearColumnPair)(const std::uint16_t* upper, const std::uint16_t* lower,
+                             const std::int32_t weights[2], Sample* const outputs[2],
+                             std::size_t count);
     void (*cubicRow)(const Sample* row, const CubicPlan& plan, float* output);
     void (*cubicColumn)(const float* const rows[4], const CubicWeights& weights, Sample* output,
                         std::size_t count);
+    void (*cubicColumnPair)(const float* const rows[4], const CubicWeights weights[2],
+                            Sample* const outputs[2], std::size_t count);
     void (*packThree)(const Sample* const planes[3], Sample* pixels, std::size_t count);
     void (*packFour)(const Sample* const planes[4], Sample* pixels, std::size_t count);
 };
@@ -83,22 +88,18 @@ SampleLoops<Sample> GetLoops();
 template <>
 SampleLoops<std::uint8_t> GetLoops() {
     const RowKernels& rows = GetRowKernels();
-    return {rows.split8,    rows.addHalves8,   rows.double8, rows.linearRow8, rows.linearColumn8,
-            rows.cubicRow8, rows.cubicColumn8, rows.pack8x3, rows.pack8x4};
+    return {rows.split8,           rows.addHalves8,        rows.double8,   rows.linearRow8,
+            rows.linearColumn8,    rows.linearColumnPair8, rows.cubicRow8, rows.cubicColumn8,
+            rows.cubicColumnPair8, rows.pack8x3,           rows.pack8x4};
 }
 
 template <>
 SampleLoops<Word> GetLoops() {
     const RowKernels& rows = GetRowKernels();
-    return {rows.split16,
-            rows.addHalves16,
-            rows.double16,
-            rows.linearRow16,
-            rows.linearColumn16,
-            rows.cubicRow16,
-            rows.cubicColumn16,
-            rows.pack16x3,
-            nullptr};  // no format of words has four samples
+    return {rows.split16,           rows.addHalves16,        rows.double16,   rows.linearRow16,
+            rows.linearColumn16,    rows.linearColumnPair16, rows.cubicRow16, rows.cubicColumn16,
+            rows.cubicColumnPair16, rows.pack16x3,           nullptr};  // no format of words has
+                                                                        // four samples
 }
 
 /// Hands out rows of the scratch, one after the other.
@@ -141,7 +142,8 @@ std::uint64_t MeasureScratch(std::uint64_t width, KernelInterpolation interpolat
                              std::size_t sampleBytes) {
     const std::uint64_t source = RowCarver::Measure(width * sampleBytes);
     const std::uint64_t quarters = 5 * RowCarver::Measure(width / 2 * sampleBytes);
-    const std::uint64_t chunks = 4 * RowCarver::Measure(ChunkPixels * sampleBytes);
+    const std::uint64_t chunks =
+        (2 * ChannelCount + 1) * RowCarver::Measure(ChunkPixels * sampleBytes);
     return RowAlignment + source + quarters + MeasureEnlarged(width, interpolation, sampleBytes) +
            chunks;
 }
@@ -223,9 +225,32 @@ class RowWindow {
     std::array<std::array<Element*, ChannelCount>, Depth> slots;
 };
 
-// Each way of enlarging brings the rows of an output row together (Prepare, which is false where
-// the row is the one before once more) and finishes a part of them (Finish, into `room` or in
-// place).
+/// Room for a part of up to two output rows of each channel.
+template <typename Sample>
+using ChunkRoom = std::array<std::array<Sample*, 2>, ChannelCount>;
+
+/// Parts of up to two output rows of each channel.
+template <typename Sample>
+using RowParts = std::array<std::array<const Sample*, 2>, ChannelCount>;
+
+template <typename Sample>
+RowParts<Sample> PartsOf(const ChunkRoom<Sample>& room) {
+    RowParts<Sample> parts;
+    for (std::size_t channel = 0; channel < ChannelCount; ++channel) {
+        parts[channel] = {room[channel][0], room[channel][1]};
+    }
+    return parts;
+}
+
+/// How many output rows from `row` on are made at once: two where both lie between the same rows.
+template <typename Positions>
+std::size_t CountRowsAtOnce(const Positions& positions, std::size_t row, std::size_t end) {
+    return row + 1 < end && positions[row].index == positions[row + 1].index ? 2 : 1;
+}
+
+// Each way of enlarging brings what output rows are made of together (Prepare, which returns how
+// many of the rows from `row` on, below `end`, it is good for: one or two) and finishes a part of
+// them (Finish, into `room` or in place).
 
 template <typename Sample>
 class NearestRows {
@@ -233,17 +258,20 @@ class NearestRows {
     NearestRows(ColourRows<Sample>& source, const SampleLoops<Sample>& rowLoops, RowCarver& carver)
         : loops(rowLoops), window(source, carver), count(2 * source.GetCount()) {}
 
-    bool Prepare(std::size_t row) {
-        if (row % 2 != 0) return false;
-        window.Advance(row / 2, [this](const Sample* input, Sample* output) {
+    std::size_t Prepare(std::size_t row, std::size_t) {
+        current = row / 2;
+        window.Advance(current, [this](const Sample* input, Sample* output) {
             loops.repeat(input, output, count);
         });
-        current = row / 2;
-        return true;
+        return 2;
     }
 
-    const Sample* Finish(std::size_t channel, std::size_t from, std::size_t, Sample*) const {
-        return window.Get(current, channel) + from;
+    RowParts<Sample> Finish(std::size_t from, std::size_t, const ChunkRoom<Sample>&) const {
+        RowParts<Sample> parts;
+        for (std::size_t channel = 0; channel < ChannelCount; ++channel) {
+            parts[channel].fill(window.Get(current, channel) + from);
+        }
+        return parts;
     }
 
   private:
@@ -263,21 +291,28 @@ class LinearRows {
           plan(columnPositions.GetPlan()),
           positions(rowPositions) {}
 
-    bool Prepare(std::size_t row) {
-        current = positions[row];
-        window.Advance(static_cast<std::size_t>(current.index) + 1,
-                       [this](const Sample* input, std::uint16_t* output) {
-                           loops.linearRow(input, plan, output);
-                       });
-        return true;
+    std::size_t Prepare(std::size_t row, std::size_t end) {
+        upper = static_cast<std::size_t>(positions[row].index);
+        window.Advance(upper + 1, [this](const Sample* input, std::uint16_t* output) {
+            loops.linearRow(input, plan, output);
+        });
+        rowCount = CountRowsAtOnce(positions, row, end);
+        for (std::size_t i = 0; i < rowCount; ++i) weights[i] = positions[row + i].weight;
+        return rowCount;
     }
 
-    const Sample* Finish(std::size_t channel, std::size_t from, std::size_t count,
-                         Sample* room) const {
-        const auto upper = static_cast<std::size_t>(current.index);
-        loops.linearColumn(window.Get(upper, channel) + from, window.Get(upper + 1, channel) + from,
-                           current.weight, room, count);
-        return room;
+    RowParts<Sample> Finish(std::size_t from, std::size_t count,
+                            const ChunkRoom<Sample>& room) const {
+        for (std::size_t channel = 0; channel < ChannelCount; ++channel) {
+            const std::uint16_t* const above = window.Get(upper, channel) + from;
+            const std::uint16_t* const below = window.Get(upper + 1, channel) + from;
+            if (rowCount == 2) {
+                loops.linearColumnPair(above, below, weights, room[channel].data(), count);
+            } else {
+                loops.linearColumn(above, below, weights[0], room[channel][0], count);
+            }
+        }
+        return PartsOf(room);
     }
 
   private:
@@ -285,7 +320,9 @@ class LinearRows {
     RowWindow<Sample, std::uint16_t, 2> window;
     const LinearPlan& plan;
     const LinearPositions& positions;
-    LinearPosition current{};
+    std::size_t upper = 0;
+    std::size_t rowCount = 0;
+    std::int32_t weights[2] = {};
 };
 
 template <typename Sample>
@@ -298,22 +335,28 @@ class CubicRows {
           plan(columnPositions.GetPlan()),
           positions(rowPositions) {}
 
-    bool Prepare(std::size_t row) {
-        current = positions[row];
-        window.Advance(
-            static_cast<std::size_t>(current.index) + 3,
-            [this](const Sample* input, float* output) { loops.cubicRow(input, plan, output); });
-        return true;
+    std::size_t Prepare(std::size_t row, std::size_t end) {
+        top = static_cast<std::size_t>(positions[row].index);
+        window.Advance(top + 3, [this](const Sample* input, float* output) {
+            loops.cubicRow(input, plan, output);
+        });
+        rowCount = CountRowsAtOnce(positions, row, end);
+        for (std::size_t i = 0; i < rowCount; ++i) weights[i] = positions[row + i].weights;
+        return rowCount;
     }
 
-    const Sample* Finish(std::size_t channel, std::size_t from, std::size_t count,
-                         Sample* room) const {
-        const float* rows[4];
-        for (std::size_t row = 0; row < 4; ++row) {
-            rows[row] = window.Get(static_cast<std::size_t>(current.index) + row, channel) + from;
+    RowParts<Sample> Finish(std::size_t from, std::size_t count,
+                            const ChunkRoom<Sample>& room) const {
+        for (std::size_t channel = 0; channel < ChannelCount; ++channel) {
+            const float* rows[4];
+            for (std::size_t i = 0; i < 4; ++i) rows[i] = window.Get(top + i, channel) + from;
+            if (rowCount == 2) {
+                loops.cubicColumnPair(rows, weights, room[channel].data(), count);
+            } else {
+                loops.cubicColumn(rows, weights[0], room[channel][0], count);
+            }
         }
-        loops.cubicColumn(rows, current.weights, room, count);
-        return room;
+        return PartsOf(room);
     }
 
   private:
@@ -321,7 +364,9 @@ class CubicRows {
     RowWindow<Sample, float, 4> window;
     const CubicPlan& plan;
     const CubicPositions& positions;
-    CubicPosition current{};
+    std::size_t top = 0;
+    std::size_t rowCount = 0;
+    CubicWeights weights[2] = {};
 };
 
 /// The image, row by row.
@@ -403,26 +448,24 @@ class ImageWriter {
 };
 
 template <typename Sample>
-using ChunkRoom = std::array<Sample*, ChannelCount>;
-
-template <typename Sample>
 ChunkRoom<Sample> TakeChunkRoom(RowCarver& carver) {
     ChunkRoom<Sample> room;
-    for (Sample*& row : room) row = carver.Take<Sample>(ChunkPixels);
+    for (auto& rows : room) {
+        for (Sample*& row : rows) row = carver.Take<Sample>(ChunkPixels);
+    }
     return room;
 }
 
 template <typename Sample, typename Enlarger>
-void WriteRow(const Enlarger& enlarger, ImageWriter<Sample>& writer, const ChunkRoom<Sample>& room,
-              std::size_t row, std::size_t width) {
+void WriteRows(const Enlarger& enlarger, ImageWriter<Sample>& writer, const ChunkRoom<Sample>& room,
+               std::size_t row, std::size_t rowCount, std::size_t width) {
     for (std::size_t from = 0; from < width; from += ChunkPixels) {
         const std::size_t count = std::min(ChunkPixels, width - from);
-        writer.Announce(row, from, count);
-        std::array<const Sample*, ChannelCount> channels;
-        for (std::size_t channel = 0; channel < ChannelCount; ++channel) {
-            channels[channel] = enlarger.Finish(channel, from, count, room[channel]);
+        for (std::size_t i = 0; i < rowCount; ++i) writer.Announce(row + i, from, count);
+        const RowParts<Sample> parts = enlarger.Finish(from, count, room);
+        for (std::size_t i = 0; i < rowCount; ++i) {
+            writer.Write({parts[0][i], parts[1][i], parts[2][i]}, row + i, from, count);
         }
-        writer.Write(channels, row, from, count);
     }
 }
 
@@ -432,13 +475,12 @@ void EnlargeRows(const BayerMosaic& mosaic, Enlarger enlarger, ImageWriter<Sampl
                  const ChunkRoom<Sample>& room) {
     const std::size_t width = mosaic.width - mosaic.width % 2;
     const std::size_t height = mosaic.height - mosaic.height % 2;
-    for (std::size_t row = 0; row < height; ++row) {
-        if (!enlarger.Prepare(row)) {
-            writer.RepeatRow(row);
-            continue;
+    for (std::size_t row = 0; row < height;) {
+        const std::size_t rowCount = enlarger.Prepare(row, height);
+        WriteRows(enlarger, writer, room, row, rowCount, width);
+        for (const std::size_t end = row + rowCount; row < end; ++row) {
+            writer.RepeatPixel(row, width);
         }
-        WriteRow(enlarger, writer, room, row, width);
-        writer.RepeatPixel(row, width);
     }
     if (height < mosaic.height) writer.RepeatRow(height);
 }
@@ -447,13 +489,15 @@ template <typename Sample>
 void WriteBlack(const BayerMosaic& mosaic, ImageWriter<Sample>& writer,
                 const ChunkRoom<Sample>& room) {
     struct Nothing {
-        const Sample* Finish(std::size_t, std::size_t, std::size_t, Sample* black) const {
-            return black;
+        RowParts<Sample> Finish(std::size_t, std::size_t, const ChunkRoom<Sample>& black) const {
+            return PartsOf(black);
         }
     };
-    for (Sample* row : room) std::memset(static_cast<void*>(row), 0, ChunkPixels * sizeof(Sample));
+    for (const auto& rows : room) {
+        std::memset(static_cast<void*>(rows[0]), 0, ChunkPixels * sizeof(Sample));
+    }
     for (std::size_t row = 0; row < mosaic.height; ++row) {
-        WriteRow(Nothing{}, writer, room, row, mosaic.width);
+        WriteRows(Nothing{}, writer, room, row, 1, mosaic.width);
     }
 }
 
