@@ -228,10 +228,9 @@ float ConvertThousandthsToScale(std::uint32_t thousandths) {
 void ApplyPostProcessing(const Send& send) {
     CameraContext& context = send.context;
     context.postProcessing = send.Get(zprmDoPostProcessing) != 0 ? 1 : 0;
-    ZAutoWhiteBalance& whiteBalance = *context.whiteBalance;
-    whiteBalance.SetRedScale(ConvertThousandthsToScale(send.Get(zprmPostProcessGainRed)));
-    whiteBalance.SetGreenScale(ConvertThousandthsToScale(send.Get(zprmPostProcessGainGreen)));
-    whiteBalance.SetBlueScale(ConvertThousandthsToScale(send.Get(zprmPostProcessGainBlue)));
+    context.whiteBalance->SetScales(ConvertThousandthsToScale(send.Get(zprmPostProcessGainRed)),
+                                    ConvertThousandthsToScale(send.Get(zprmPostProcessGainGreen)),
+                                    ConvertThousandthsToScale(send.Get(zprmPostProcessGainBlue)));
     (void)context.bayerFilter->SetOutputFormat(send.Get(zprmPostProcessImageFormat));
     SetBayerAlgorithm(send);
 }

@@ -7,6 +7,7 @@
 #include <bit>
 #include <cstring>
 #include <limits>
+#include <optional>
 #include <span>
 
 #include "camera/camera.h"
@@ -22,7 +23,7 @@ constexpr std::uint32_t IndexRed = 0;
 constexpr std::uint32_t IndexGreen = 1;
 constexpr std::uint32_t IndexBlue = 2;
 constexpr std::uint32_t ColourCount = 3;
-constexpr std::size_t PixelSamplesMax = 4;
+constexpr std::uint32_t PixelSamplesMax = 4;
 
 constexpr float StartRedScale = 1.16F;
 constexpr float StartGreenScale = 1.0F;
@@ -64,10 +65,39 @@ std::shared_ptr<const ZAutoWhiteBalance::ScaleTable> MakeScaleTable(float scale)
     return table;
 }
 
+/// Tells numbers that are none apart, too.
+bool HasSameBits(float one, float other) {
+    return std::bit_cast<std::uint32_t>(one) == std::bit_cast<std::uint32_t>(other);
+}
+
 bool IsEmpty(std::uint32_t width, std::uint32_t height) {
     // Sizes of the kernels are signed.
     constexpr std::uint32_t SideMax = std::numeric_limits<std::int32_t>::max();
     return width == 0 || height == 0 || width > SideMax || height > SideMax;
+}
+
+/// Rows of pixels. Those that follow each other are one.
+struct PixelRows {
+    std::size_t count;
+    std::size_t apart;  ///< In bytes.
+    std::size_t pixels;
+};
+
+/// None where rows would overlap, or lie further apart than the row lengths of kernels tell.
+std::optional<PixelRows> LayOutRows(std::uint32_t width, std::uint32_t height, std::uint32_t step,
+                                    std::uint32_t pixelSamples, std::uint32_t sampleBytes) {
+    constexpr std::uint64_t RowBytesMax = std::numeric_limits<std::int32_t>::max();
+    const std::uint64_t rowBytes = std::uint64_t{step} * width * sampleBytes;
+    if (step < pixelSamples || rowBytes > RowBytesMax) return std::nullopt;
+    if (step == pixelSamples) return PixelRows{1, 0, std::size_t{width} * height};
+    return PixelRows{height, static_cast<std::size_t>(rowBytes), width};
+}
+
+/// The order of the colours in pixels of bytes. Null where the format has no such pixels.
+const ColourLayout* FindPixelLayout(std::uint32_t format, std::uint32_t pixelSamples) {
+    const ColourLayout* const layout = FindColourLayout(format);
+    if (layout == nullptr || layout->sampleBytes != 1) return nullptr;
+    return layout->step == pixelSamples ? layout : nullptr;
 }
 
 using Planes = std::array<std::uint8_t*, ColourCount>;
@@ -106,14 +136,16 @@ struct ZAutoWhiteBalance::TableSet {
     const std::uint8_t* Get8(std::uint32_t colour) const { return lookup8 + colour * Levels8; }
     const std::uint16_t* Get16(std::uint32_t colour) const { return lookup16 + colour * Levels16; }
 
-    /// The 8-bit tables of a pixel's samples, one behind the other.
-    void Order8(const ColourLayout& layout, std::uint8_t* ordered) const {
-        for (std::size_t level = 0; level < layout.step * Levels8; ++level) {
+    /// The 8-bit tables of a pixel's samples, one behind the other. Without a layout no sample
+    /// changes.
+    void Order8(const ColourLayout* layout, std::span<std::uint8_t> ordered) const {
+        for (std::size_t level = 0; level < ordered.size(); ++level) {
             ordered[level] = static_cast<std::uint8_t>(level);  // What the padding keeps.
         }
-        const std::uint8_t positions[ColourCount] = {layout.red, layout.green, layout.blue};
+        if (layout == nullptr) return;
+        const std::uint8_t positions[ColourCount] = {layout->red, layout->green, layout->blue};
         for (std::uint32_t colour = 0; colour < ColourCount; ++colour) {
-            std::memcpy(ordered + positions[colour] * Levels8, Get8(colour), Levels8);
+            std::memcpy(ordered.data() + positions[colour] * Levels8, Get8(colour), Levels8);
         }
     }
 };
@@ -175,11 +207,15 @@ FilterResult ZAutoWhiteBalance::GreyWorld(std::uint8_t* image, std::uint8_t* red
         }
         return FilterDone;
     }
-    const ColourLayout* const layout = FindColourLayout(format);
-    if (image == nullptr || layout == nullptr || layout->step != step) return FilterFailed;
+    const std::uint32_t pixelSamples = step == ColourCount ? ColourCount : PixelSamplesMax;
+    const auto rows = LayOutRows(width, height, step, pixelSamples, 1);
+    if (image == nullptr || !rows) return FilterFailed;
     std::uint8_t ordered[PixelSamplesMax * Levels8];
-    set->Order8(*layout, ordered);
-    (step == 3 ? kernels.lookup8x3 : kernels.lookup8x4)(ordered, image, pixels);
+    set->Order8(FindPixelLayout(format, pixelSamples), std::span(ordered, pixelSamples * Levels8));
+    const auto lookup = pixelSamples == ColourCount ? kernels.lookup8x3 : kernels.lookup8x4;
+    for (std::size_t row = 0; row < rows->count; ++row) {
+        lookup(ordered, image + row * rows->apart, rows->pixels);
+    }
     return FilterDone;
 }
 
@@ -200,8 +236,12 @@ FilterResult ZAutoWhiteBalance::GreyWorld_16Bit(std::uint8_t* image, std::uint8_
         }
         return FilterDone;
     }
-    if (image == nullptr || step != ColourCount) return FilterFailed;
-    kernels.lookup16x3(set->lookup16, reinterpret_cast<Word*>(image), pixels);
+    const auto rows = LayOutRows(width, height, step, ColourCount, sizeof(Word));
+    if (image == nullptr || !rows) return FilterFailed;
+    for (std::size_t row = 0; row < rows->count; ++row) {
+        auto* const first = reinterpret_cast<Word*>(image + row * rows->apart);
+        kernels.lookup16x3(set->lookup16, first, rows->pixels);
+    }
     return FilterDone;
 }
 
@@ -240,22 +280,20 @@ FilterResult ZAutoWhiteBalance::RunPass(MeasuringImage& image, MeasuredRegion* r
     redMean.store(means.red, std::memory_order_relaxed);
     greenMean.store(means.green, std::memory_order_relaxed);
     blueMean.store(means.blue, std::memory_order_relaxed);
-    SetScales(means);
+    ScaleToGreen(means);
     if (camera.GetImageFormat() == CameraRGBFilter) BalanceExposures(camera);
     return FilterDone;
 }
 
 // A mean of 0 gives an infinite scale or one that is no number; the tables take either.
-void ZAutoWhiteBalance::SetScales(const ColourValues& means) {
+void ZAutoWhiteBalance::ScaleToGreen(const ColourValues& means) {
     const std::uint64_t sum = std::uint64_t{means.red} + means.green + means.blue;
     const float average = static_cast<float>(sum) / 3.0F;
     const float redShare = average / static_cast<float>(means.red);
     const float greenShare = average / static_cast<float>(means.green);
     const float blueShare = average / static_cast<float>(means.blue);
     const float inverse = 1.0F / greenShare;
-    SetRedScale(redShare * inverse);
-    SetGreenScale(1.0F);
-    SetBlueScale(blueShare * inverse);
+    SetScales(redShare * inverse, 1.0F, blueShare * inverse);
 }
 
 void ZAutoWhiteBalance::BalanceExposures(ZCamera& camera) const {
@@ -280,26 +318,40 @@ bool ZAutoWhiteBalance::AreMeansInBand(std::uint32_t bitDepth) const {
 // ---- Scales and tables ----
 
 void ZAutoWhiteBalance::SetRedScale(float scale) {
-    SetScale(red, scale);
+    const Change change{&red, scale};
+    Exchange({&change, 1});
 }
 
 void ZAutoWhiteBalance::SetGreenScale(float scale) {
-    SetScale(green, scale);
+    const Change change{&green, scale};
+    Exchange({&change, 1});
 }
 
 void ZAutoWhiteBalance::SetBlueScale(float scale) {
-    SetScale(blue, scale);
+    const Change change{&blue, scale};
+    Exchange({&change, 1});
 }
 
-void ZAutoWhiteBalance::SetScale(Colour& colour, float scale) {
+void ZAutoWhiteBalance::SetScales(float redScale, float greenScale, float blueScale) {
+    const Change changes[] = {{&red, redScale}, {&green, greenScale}, {&blue, blueScale}};
+    Exchange(changes);
+}
+
+void ZAutoWhiteBalance::Exchange(std::span<const Change> changes) {
     const std::lock_guard setting(setterMutex);
-    const float present = colour.scale.load(std::memory_order_relaxed);
-    if (std::bit_cast<std::uint32_t>(present) == std::bit_cast<std::uint32_t>(scale)) return;
-    const auto made = std::make_shared<TableSet>(*GetTables());
-    made->Take(colour.index, MakeScaleTable(scale));
+    std::shared_ptr<TableSet> made;
+    for (const Change& change : changes) {
+        const float present = change.colour->scale.load(std::memory_order_relaxed);
+        if (HasSameBits(present, change.scale)) continue;
+        if (made == nullptr) made = std::make_shared<TableSet>(*GetTables());
+        made->Take(change.colour->index, MakeScaleTable(change.scale));
+    }
+    if (made == nullptr) return;
     std::shared_ptr<const TableSet> set = made;
     const std::lock_guard hold(leafMutex);
-    colour.scale.store(scale, std::memory_order_relaxed);
+    for (const Change& change : changes) {
+        change.colour->scale.store(change.scale, std::memory_order_relaxed);
+    }
     tables.swap(set);
 }
 

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <memory>
 #include <mutex>
+#include <span>
 
 #include "imaging/image_filter.h"
 #include "imaging/region_measure.h"
@@ -54,19 +55,26 @@ class ZENTARA_API ZAutoWhiteBalance : public ZImageFilter {
     ///
     /// `FilterDone` also when the passes have run out; the last scales stay. The first failure of
     /// the camera, the pipeline or the measuring ends it and leaves the scales of the last finished
-    /// pass. `width` and `height` are cut to the image's; `x` and `y` are not looked at. Goes over
-    /// the bus, on the caller's thread.
+    /// pass. `width` and `height` are cut to those of the image behind the pipeline, for the later
+    /// passes too; `x` and `y` are not cut: the walk goes on into the rows that follow, and what
+    /// lies beyond the image counts as 0. In `RGBPlane16` it takes every second row. Goes over the
+    /// bus, on the caller's thread; let no settings be sent meanwhile.
     FilterResult Preprocess(std::uint32_t x, std::uint32_t y, std::uint32_t width,
                             std::uint32_t height, ZCamera* camera);
 
     /// Scales samples of 8 bits in place. A `step` of 1 stands for three planes at `red`, `green`
-    /// and `blue`; any other for pixels of `step` samples at `image`, in the order of `format`.
-    /// The sample for padding stays. `pixels` is not looked at. The caller vouches for the memory.
-    /// `FilterFailed` for an empty size, null data, and a step that is not the format's.
+    /// and `blue`; 3 for pixels of three samples at `image`; any other for `width` pixels of four
+    /// samples in each row, rows `step` * `width` samples apart, what stands between them left
+    /// alone. The order of the colours is that of `format`; the sample for padding stays, and all
+    /// of them do where `format` is none of such pixels. `pixels` is not looked at. The caller
+    /// vouches for the memory that the rows name.
+    /// `FilterFailed` for an empty size, null data, rows of 2 GiB or more, and a step of 0 or 2, by
+    /// which rows would overlap.
     FilterResult GreyWorld(std::uint8_t* image, std::uint8_t* red, std::uint8_t* green,
                            std::uint8_t* blue, std::uint32_t width, std::uint32_t height,
                            std::uint32_t pixels, std::uint32_t step, std::uint32_t format) const;
-    /// The same for samples of 16 bits, host order, at any address.
+    /// The same for samples of 16 bits, host order, at any address. Any step but 1 stands for
+    /// pixels of three samples, red, green and blue, whatever `format` is.
     FilterResult GreyWorld_16Bit(std::uint8_t* image, std::uint8_t* red, std::uint8_t* green,
                                  std::uint8_t* blue, std::uint32_t width, std::uint32_t height,
                                  std::uint32_t pixels, std::uint32_t step,
@@ -85,6 +93,9 @@ class ZENTARA_API ZAutoWhiteBalance : public ZImageFilter {
     void SetRedScale(float scale);
     void SetGreenScale(float scale);
     void SetBlueScale(float scale);
+    /// All three at once: no frame is balanced by new tables of one colour and old ones of another.
+    /// Thread-safe.
+    void SetScales(float redScale, float greenScale, float blueScale);
     /// Kept without an effect.
     void SetCalculateValuesOnAllFrames(bool on);
 
@@ -101,9 +112,14 @@ class ZENTARA_API ZAutoWhiteBalance : public ZImageFilter {
         std::atomic<float> scale;
     };
 
+    struct Change {
+        Colour* colour;
+        float scale;
+    };
+
     std::shared_ptr<const TableSet> GetTables() const;
-    void SetScale(Colour& colour, float scale);
-    void SetScales(const ColourValues& means);
+    void Exchange(std::span<const Change> changes);
+    void ScaleToGreen(const ColourValues& means);
     FilterResult RunPass(MeasuringImage& image, MeasuredRegion* region, ZCamera& camera);
     bool AreMeansInBand(std::uint32_t bitDepth) const;
     void BalanceExposures(ZCamera& camera) const;

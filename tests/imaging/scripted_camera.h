@@ -16,9 +16,10 @@ namespace ZV::Testing {
 /// Stands in a camera's Bayer pipeline and notes which format the Bayer filter was to make.
 class PipelineProbe : public ZImageFilter {
   public:
-    FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct*) override {
+    FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override {
         if (bayerFilter != nullptr) formats.push_back(bayerFilter->GetOutputFormat());
         if (onProcess) onProcess(in);
+        if (onProcessOutput) onProcessOutput(in, out);
         return result;
     }
     FilterResult Init(std::uint32_t, std::uint32_t) override { return FilterDone; }
@@ -27,6 +28,7 @@ class PipelineProbe : public ZImageFilter {
     ZBayerInterpolation* bayerFilter = nullptr;
     FilterResult result = FilterDeclined;
     std::function<void(ZInImageBufferStruct*)> onProcess;
+    std::function<void(ZInImageBufferStruct*, ZOutImageBufferStruct*)> onProcessOutput;
     std::vector<std::uint32_t> formats;
 };
 

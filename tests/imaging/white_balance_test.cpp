@@ -366,15 +366,94 @@ TEST_F(WhiteBalance, RefusesGreyWorldOverNothing) {
         return filter->GreyWorld_16Bit(image, data, data, blue, width, 1, width, step, RGB48);
     };
     EXPECT_EQ(balance(nullptr, data, 1, 3, RGB24), FilterFailed);
+    EXPECT_EQ(balance(nullptr, data, 1, 4, RGBX32), FilterFailed);
     EXPECT_EQ(balance(data, nullptr, 1, 1, RGBPlane8), FilterFailed);
     EXPECT_EQ(balance(data, data, 0, 3, RGB24), FilterFailed);
-    EXPECT_EQ(balance(data, data, 1, 4, RGB24), FilterFailed);
-    EXPECT_EQ(balance(data, data, 1, 3, Bayer8), FilterFailed);
     EXPECT_EQ(balanceDeep(nullptr, data, 1, 3), FilterFailed);
     EXPECT_EQ(balanceDeep(data, nullptr, 1, 1), FilterFailed);
     EXPECT_EQ(balanceDeep(data, data, 0, 3), FilterFailed);
-    EXPECT_EQ(balanceDeep(data, data, 1, 4), FilterFailed);
     EXPECT_EQ(pixels, Bytes(24, 100));
+}
+
+TEST_F(WhiteBalance, RefusesGreyWorldByStepsThatMakeRowsOverlapOrThatNoRowLengthTells) {
+    Bytes pixels(24, 100);
+    std::uint8_t* const data = pixels.data();
+    for (const std::uint32_t step : {0U, 2U, 0x80000000U, 0xFFFFFFFFU}) {
+        EXPECT_EQ(filter->GreyWorld(data, data, data, data, 1, 2, 2, step, RGB24), FilterFailed);
+        EXPECT_EQ(filter->GreyWorld_16Bit(data, data, data, data, 1, 2, 2, step, RGB48),
+                  FilterFailed);
+    }
+    EXPECT_EQ(pixels, Bytes(24, 100));
+}
+
+TEST_F(WhiteBalance, KeptGreyWorldTakesOtherStepsForFourSamplesPerPixelAndRowsFurtherApart) {
+    SetScales(2.0F, 0.5F, 0.0F);
+    for (const std::uint32_t step : {4U, 5U, 7U}) {
+        Bytes pixels(2 * 3 * step, 100);
+        Bytes expected = pixels;
+        for (std::size_t row = 0; row < 2; ++row) {
+            for (std::size_t pixel = 0; pixel < 3; ++pixel) {
+                const std::size_t first = row * 3 * step + 4 * pixel;
+                expected[first] = 200;
+                expected[first + 1] = 50;
+                expected[first + 2] = 0;
+            }
+        }
+        EXPECT_EQ(
+            filter->GreyWorld(pixels.data(), nullptr, nullptr, nullptr, 3, 2, 6, step, RGBX32),
+            FilterDone);
+        EXPECT_EQ(pixels, expected) << "step " << step;
+    }
+}
+
+TEST_F(WhiteBalance, KeptGreyWorldOf16BitsTakesAnyOtherStepForThreeSamplesPerPixel) {
+    SetScales(2.0F, 0.5F, 0.0F);
+    for (const std::uint32_t step : {3U, 4U, 5U, 9U}) {
+        std::vector<std::uint16_t> pixels(2 * 3 * step, 1000);
+        std::vector<std::uint16_t> expected = pixels;
+        for (std::size_t row = 0; row < 2; ++row) {
+            for (std::size_t pixel = 0; pixel < 3; ++pixel) {
+                const std::size_t first = row * 3 * step + 3 * pixel;
+                expected[first] = 2000;
+                expected[first + 1] = 500;
+                expected[first + 2] = 0;
+            }
+        }
+        // The format has no say in the order of the colours.
+        EXPECT_EQ(filter->GreyWorld_16Bit(reinterpret_cast<std::uint8_t*>(pixels.data()), nullptr,
+                                          nullptr, nullptr, 3, 2, 6, step, BGR24),
+                  FilterDone);
+        EXPECT_EQ(pixels, expected) << "step " << step;
+    }
+}
+
+TEST_F(WhiteBalance, GreyWorldLeavesPixelsAloneWhoseFormatIsNoneOfTheirLength) {
+    SetScales(0.0F, 0.0F, 0.0F);
+    for (const std::uint32_t step : {3U, 4U, 6U}) {
+        for (const std::uint32_t format : {0U, 2U, 6U, 7U, 10U, 14U, 0xFFFFFFFFU}) {
+            Bytes pixels(2 * 2 * step, 100);
+            EXPECT_EQ(
+                filter->GreyWorld(pixels.data(), nullptr, nullptr, nullptr, 2, 2, 4, step, format),
+                FilterDone);
+            EXPECT_EQ(pixels, Bytes(2 * 2 * step, 100)) << step << " " << format;
+        }
+    }
+    Bytes pixels(12, 100);
+    EXPECT_EQ(filter->GreyWorld(pixels.data(), nullptr, nullptr, nullptr, 4, 1, 4, 3, RGBX32),
+              FilterDone);
+    EXPECT_EQ(filter->GreyWorld(pixels.data(), nullptr, nullptr, nullptr, 3, 1, 3, 4, RGB24),
+              FilterDone);
+    EXPECT_EQ(pixels, Bytes(12, 100));
+}
+
+TEST_F(WhiteBalance, MultipliesInSinglePrecision) {
+    // In double precision the products lie below 29 and 47.
+    ASSERT_EQ(static_cast<int>(25 * static_cast<double>(1.16F)), 28);
+    ASSERT_EQ(static_cast<int>(25 * static_cast<double>(1.88F)), 46);
+    EXPECT_EQ(filter->GetRedTable()->levels8[25], 29);
+    EXPECT_EQ(filter->GetRedTable()->levels16[25], 29);
+    EXPECT_EQ(filter->GetBlueTable()->levels8[25], 47);
+    EXPECT_EQ(filter->GetBlueTable()->levels16[25], 47);
 }
 
 TEST_F(WhiteBalance, TheScaleInForceCostsNoNewTables) {
@@ -385,27 +464,65 @@ TEST_F(WhiteBalance, TheScaleInForceCostsNoNewTables) {
     EXPECT_NE(filter->GetRedTable(), table);
 }
 
-TEST_F(WhiteBalance, AFrameIsNeverBalancedHalfByOneScaleAndHalfByAnother) {
-    SetScales(0.25F, 1.0F, 1.0F);
+TEST_F(WhiteBalance, SetsAllScalesAtOnceOrOneByOneToTheSameTables) {
+    filter->SetScales(0.5F, 1.25F, 3.0F);
+    EXPECT_EQ(filter->GetRedScale(), 0.5F);
+    EXPECT_EQ(filter->GetGreenScale(), 1.25F);
+    EXPECT_EQ(filter->GetBlueScale(), 3.0F);
+    const auto red = filter->GetRedTable();
+    const auto green = filter->GetGreenTable();
+
+    const auto oneByOne = std::make_unique<ZAutoWhiteBalance>(false);
+    oneByOne->SetRedScale(0.5F);
+    oneByOne->SetGreenScale(1.25F);
+    oneByOne->SetBlueScale(3.0F);
+    EXPECT_EQ(oneByOne->GetRedTable()->levels16, red->levels16);
+    EXPECT_EQ(oneByOne->GetGreenTable()->levels16, green->levels16);
+    EXPECT_EQ(oneByOne->GetBlueTable()->levels16, filter->GetBlueTable()->levels16);
+
+    filter->SetScales(0.5F, 1.25F, 4.0F);
+    EXPECT_EQ(filter->GetRedTable(), red) << "what stays costs no new tables";
+    EXPECT_EQ(filter->GetGreenTable(), green);
+}
+
+class FrameAmongChanges : public WhiteBalance,
+                          public testing::WithParamInterface<ZImageFormatEnum> {};
+
+TEST_P(FrameAmongChanges, IsBalancedByTheScalesOfOneChangeInAllItsSamples) {
+    constexpr std::uint32_t Side = 64;
+    const bool isDeep = IsOfWords(GetParam());
+    // Every sample stands at 100, of bytes or of words, and becomes 25 or 50.
+    Bytes frame(std::size_t{Side} * Side * CountPixelBytes(GetParam()), 100);
+    for (std::size_t index = 1; isDeep && index < frame.size(); index += 2) frame[index] = 0;
+    const auto scale = [&](std::uint8_t sample) {
+        Bytes scaled = frame;
+        std::replace(scaled.begin(), scaled.end(), std::uint8_t{100}, sample);
+        return scaled;
+    };
+    const Bytes quarter = scale(25);
+    const Bytes half = scale(50);
+    filter->SetScales(0.25F, 0.25F, 0.25F);
     std::atomic<bool> mayEnd{false};
     std::thread setter([&] {
         while (!mayEnd) {
-            filter->SetRedScale(0.5F);
-            filter->SetRedScale(0.25F);
+            filter->SetScales(0.5F, 0.5F, 0.5F);
+            filter->SetScales(0.25F, 0.25F, 0.25F);
         }
     });
-    for (int round = 0; round < 50; ++round) {
-        Balancing balancing(Bytes(3 * 64 * 64, 100), 64, 64, RGB24);
+    std::uint32_t mixed = 0;
+    for (int round = 0; round < 100; ++round) {
+        Balancing balancing(frame, Side, Side, GetParam());
         EXPECT_EQ(balancing.Run(*filter), FilterDone);
         const Bytes pixels = balancing.GetPixels();
-        EXPECT_TRUE(pixels[0] == 25 || pixels[0] == 50);
-        for (std::size_t index = 0; index < pixels.size(); index += 3) {
-            ASSERT_EQ(pixels[index], pixels[0]);
-        }
+        if (pixels != quarter && pixels != half) ++mixed;
     }
     mayEnd = true;
     setter.join();
+    EXPECT_EQ(mixed, 0U);
 }
+
+INSTANTIATE_TEST_SUITE_P(EachPath, FrameAmongChanges,
+                         testing::Values(RGB24, RGBPlane8, RGBPlane16, RGB48));
 
 /// The whole measuring over a camera whose colours a test gives.
 class WhiteBalanceMeasuring : public WhiteBalance {
@@ -538,6 +655,21 @@ TEST_F(WhiteBalanceMeasuring, CutsTheRegionToTheImageForTheLaterPassesToo) {
     EXPECT_EQ(Measure(), FilterDone);
     EXPECT_EQ(camera.imageCount, 2U);
     EXPECT_EQ(filter->GetRedMean(), 120U);
+}
+
+TEST_F(WhiteBalanceMeasuring, CutsTheRegionToTheImageThatThePipelineHasMade) {
+    // The image shrinks to its left upper quarter, which is all that the mean is taken over.
+    camera.probe.onProcessOutput = [](ZInImageBufferStruct* in, ZOutImageBufferStruct* out) {
+        out->width = in->width / 2;
+        out->height = in->height / 2;
+        out->imageFormat = RGB24;
+        out->imageSize = out->width * out->height * 3;
+        std::fill_n(out->data, out->imageSize, std::uint8_t{120});
+    };
+    camera.probe.result = FilterDone;
+    EXPECT_EQ(Measure(), FilterDone);
+    EXPECT_EQ(filter->GetRedMean(), 120U) << "less, were the region of the whole image divided by";
+    EXPECT_EQ(camera.imageCount, 1U);
 }
 
 TEST_F(WhiteBalanceMeasuring, OfAMosaicCameraLeavesTheExposures) {
