@@ -150,6 +150,21 @@ TEST_P(RegionOfAThreeColourImage, GoesOnIntoTheRowsBelowAndCountsWhatLiesBeyondT
     }
 }
 
+TEST(RegionOfWords, IsSummedBeyond32Bits) {
+    for (const std::uint32_t format : {RGBPlane16, RGB48}) {
+        // Twice as high as the region, of whose planes every second row is taken.
+        Picture picture(format, 300, 600);
+        std::fill(picture.samples.begin(), picture.samples.end(), std::uint16_t{65535});
+        ColourValues means;
+
+        EXPECT_EQ(MeasureColourMeans(picture.Describe(), {0, 0, 300, 300}, &means), FilterDone);
+
+        EXPECT_EQ(means.red, 65535U) << format;
+        EXPECT_EQ(means.green, 65535U) << format;
+        EXPECT_EQ(means.blue, 65535U) << format;
+    }
+}
+
 TEST_P(RegionOfAThreeColourImage, MayHaveTheLargestNumbersAsItsPlaceAndSize) {
     constexpr std::uint32_t Most = 0xFFFFFFFF;
     Picture picture(GetParam(), 5, 3);
