@@ -809,13 +809,15 @@ ZENTARA_API ZentaraResult Zentara_SetFrameBuffers(ZentaraHandle handle, Zentara_
 /* ---- White balance and exposure: take images of their own ----
  *
  * Both run on the caller's thread, wait for each image as Zentara_GrabFrame does (Zentara_Abort
- * from another thread ends the wait) and go over the bus. Do not stream meanwhile, and let no other
- * call take or process images of the same camera. The region is in pixels of the image; its width
- * and height are cut to the image's, `x` and `y` are not looked at: a row that is too long goes on
- * in the row below, and what lies beyond the image counts as black. At the end the block goes to
- * the camera as by Zentara_SendSettingsToCam, whose result is not looked at, so `settings` should
- * be what the camera was last sent. A call waits for one that is under way on the same camera.
- * Never call either from a callback.
+ * from another thread ends the wait) and go over the bus. Do not stream meanwhile, let no settings
+ * be sent, and let no other call take or process images of the same camera. The region is in pixels
+ * of the image; its width and height are cut to the image's (white balance: as it is finished; auto
+ * exposure: as it is before its pixel ratio is corrected). `x` and `y` are not cut: a row that is
+ * too long goes on in the row below, and what lies beyond the image counts as black. Of planes of
+ * 16 bits every second row is taken. At the end the block goes to the camera as by
+ * Zentara_SendSettingsToCam, whose result is not looked at, so `settings` should be what the camera
+ * was last sent. A call waits for one that is under way on the same camera. Never call either from
+ * a callback.
  */
 
 /**
@@ -823,8 +825,9 @@ ZENTARA_API ZentaraResult Zentara_SetFrameBuffers(ZentaraHandle handle, Zentara_
  * gain of 1000, to zprmPostProcessGainRed, -Green and -Blue of `settings`. Up to 6 images are
  * taken, until the mean of each colour lies in the middle of its range: 80 to 199 with 8 bits,
  * 20560 to 51400 with more. It is no failure when that does not come to pass. With a filter wheel
- * the exposures are balanced too and written to the block. A colour of mean 0 makes gains of no
- * use.
+ * the scales of each image go to exposures and gains alike: they multiply the exposures, which are
+ * written to the block, and those of the last image stay as gains, by which frames that are
+ * post-processed are balanced once more. A colour of mean 0 makes gains of no use.
  *
  * A gain is a scale times 1000, truncated twice on its way to the camera and back: what
  * Zentara_ReadSettingsFromCam tells may be one less.
@@ -843,7 +846,9 @@ ZENTARA_API ZentaraResult Zentara_WhiteBalance(Zentara_Settings* settings, uint3
  * to zprm64Exposure of `settings`, with the exposures of a filter wheel to zprm64ExposureRed and
  * zprm64ExposureBlue. Up to 10 images of 8 bits are taken; each moves the exposure by a factor of 4
  * at most, within the camera's limits, until it moves by no more than a tenth. A wheel that cycles
- * is held at green meanwhile.
+ * is held at green meanwhile; afterwards it starts with zprmColorWheel of `settings` again. Of an
+ * image of one colour, an unresolved mosaic too, the region is not its rows but a run of `width` *
+ * `height` consecutive samples from its first pixel on.
  *
  * A camera that fails meanwhile does not fail the call: the exposure that it has then is written
  * and sent.

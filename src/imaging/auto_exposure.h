@@ -38,11 +38,17 @@ class ZENTARA_API ZAutoExposure : public ZImageFilter {
     /// Takes images of 8 bits from the camera and corrects the exposure after each, until it moves
     /// by no more than a tenth, at most `PassesMax` times; running out of passes is no failure. A
     /// wheel that cycles is held at green meanwhile, and its red and blue exposures take the last
-    /// step of the green one. The bit depth is put back.
+    /// step of the green one. The bit depth and the wheel's start colour are put back.
     ///
     /// The first failure ends it and leaves the camera as it is then: at 8 bits, the wheel at
-    /// green, and this filter awake. `width` and `height` are cut to the image's, for good; `x` and
-    /// `y` are not looked at. Goes over the bus, on the caller's thread.
+    /// green, and this filter awake.
+    ///
+    /// `width` and `height` are cut, for good, to those of the image as the camera gives it, which
+    /// the pipeline may then make smaller; `x` and `y` are not cut. Of an image of one colour the
+    /// region is a run of `width` * `height` consecutive samples; otherwise rows that are too long
+    /// go on into those that follow, and `RGBPlane16` gives every second row. What lies beyond the
+    /// image does not count. Goes over the bus, on the caller's thread; let no settings be sent
+    /// meanwhile.
     FilterResult CalculateExposure(std::uint32_t x, std::uint32_t y, std::uint32_t width,
                                    std::uint32_t height, ZCamera* camera);
 

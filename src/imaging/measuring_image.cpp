@@ -23,7 +23,8 @@ class FittingFormat {
         if (standIn != inForce) (void)filter->SetOutputFormat(standIn);
     }
     ~FittingFormat() {
-        // A format that was sent meanwhile stays.
+        // A format that was sent meanwhile stays, as far as it can be told: not one that equals the
+        // stand-in, nor one that comes between this look and the setting.
         if (filter == nullptr || filter->GetOutputFormat() != standIn) return;
         if (standIn != inForce) (void)filter->SetOutputFormat(inForce);
     }
