@@ -68,6 +68,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 struct OutOfReach {
     const char* name;
+    const char* base;
     double brightness;
     std::uint64_t exposureNs;
     std::uint64_t endNs;
@@ -76,7 +77,7 @@ struct OutOfReach {
 
 class StartOutOfReach : public MeasuringCamera, public testing::WithParamInterface<OutOfReach> {
   protected:
-    StartOutOfReach() : MeasuringCamera(MakeFlatWorld("mono", GetParam().brightness)) {}
+    StartOutOfReach() : MeasuringCamera(MakeFlatWorld(GetParam().base, GetParam().brightness)) {}
 };
 
 TEST_P(StartOutOfReach, EndsWhereTheLastPassOrALimitLeavesItWithoutAFailure) {
@@ -91,12 +92,14 @@ TEST_P(StartOutOfReach, EndsWhereTheLastPassOrALimitLeavesItWithoutAFailure) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Mono, StartOutOfReach,
-    testing::Values(OutOfReach{"Glare", 2e8, GreatestNs, GreatestNs >> 20, 10},
-                    OutOfReach{"Dark", 250, LeastNs, LeastNs << 20, 10},
-                    OutOfReach{"GlareAtTheLeast", 2e13, 4 * LeastNs, LeastNs, 2},
-                    OutOfReach{"BlackAtTheGreatest", 0, GreatestNs, GreatestNs, 1},
-                    OutOfReach{"BlackBelowTheGreatest", 0, GreatestNs / 2, GreatestNs, 2}),
+    MonoAndColour, StartOutOfReach,
+    testing::Values(OutOfReach{"Glare", "mono", 2e8, GreatestNs, GreatestNs >> 20, 10},
+                    OutOfReach{"Dark", "mono", 250, LeastNs, LeastNs << 20, 10},
+                    OutOfReach{"GlareAtTheLeast", "mono", 2e13, 4 * LeastNs, LeastNs, 2},
+                    OutOfReach{"BlackAtTheGreatest", "mono", 0, GreatestNs, GreatestNs, 1},
+                    OutOfReach{"BlackBelowTheGreatest", "mono", 0, GreatestNs / 2, GreatestNs, 2},
+                    OutOfReach{"GlareInColour", "colour", 2e8, GreatestNs, GreatestNs >> 20, 10},
+                    OutOfReach{"DarkInColour", "colour", 250, LeastNs, LeastNs << 20, 10}),
     [](const testing::TestParamInfo<OutOfReach>& test) { return test.param.name; });
 
 class AutoExposure : public LogFile, public MeasuringCamera {
@@ -190,7 +193,7 @@ TEST_P(FailedGrab, KeptDoesNotFailAutoExposureWhichSendsTheExposureThatItHasThen
 INSTANTIATE_TEST_SUITE_P(AtEachPass, FailedGrab, testing::Range(1U, 5U));
 
 TEST_F(AutoExposure, SurvivesACameraThatVanishesAtAnyRequestAndWorksWhenItIsBack) {
-    for (std::uint32_t request = 1; request < 24; request += 2) {
+    for (std::uint32_t request = 1; request < 24; ++request) {
         ASSERT_NO_FATAL_FAILURE(Set64(zprm64Exposure, 1000000000));
         ASSERT_NO_FATAL_FAILURE(Send());
         ASSERT_TRUE(world.AddFault(R"({"kind": "unplug", "code": "FW_IOCTL_ASYNC_WRITE",

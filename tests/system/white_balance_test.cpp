@@ -6,6 +6,7 @@
 #include <cmath>
 #include <future>
 #include <string>
+#include <tuple>
 
 #include "support/log_file.h"
 #include "system/measuring_camera.h"
@@ -34,6 +35,15 @@ std::string MakeChartWorld(std::string_view base, std::string_view light) {
 }
 
 constexpr std::string_view WarmLight = "[1.3, 1.0, 0.8]";
+
+/// The darkest mean that is in band.
+constexpr double BandBegin = 80;
+
+/// Samples are rounded and means truncated: a mean lies at most 1.5 below the light and 0.5 above
+/// it, which makes 2 of the darker mean for a quotient of two. A gain is truncated to thousandths.
+constexpr double GetGainTolerance(double gain, double darkestMean) {
+    return gain * 2 / darkestMean + 0.001;
+}
 
 using Colour = std::array<double, 3>;
 
@@ -117,6 +127,7 @@ TEST_F(MosaicUnderWarmLight, HasGreyGreysAfterOneImageInBand) {
     Zentara_Frame frame{};
     const std::vector<std::uint8_t> pixels = GrabChart(&frame);
     ASSERT_EQ(frame.format, zfmtRGB24);
+    // The first patch, the white, is saturated.
     for (const std::uint32_t column : {1U, 2U, 3U, 4U, 5U}) {
         const Colour mean = MeanOfGrey(pixels, column);
         EXPECT_NEAR(mean[0], mean[1], GetTolerance(mean[1], redScale)) << "patch " << column;
@@ -132,7 +143,10 @@ TEST_F(MosaicUnderWarmLight, IsBalancedThroughSixImagesWhenItIsTooDarkForTheBand
     ASSERT_ZERR(zerrNone, BalanceOverGreys());
 
     EXPECT_EQ(CountImages() - before, 6U);
-    EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3, 0.03);
+    // At least 200 in the red of the first patch before it is taken three eighths of: 60 in the
+    // mean with the second one, and 46 in green.
+    EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3,
+                GetGainTolerance(1 / 1.3, 46));
 }
 
 TEST_F(MosaicUnderWarmLight, IsBalancedInEveryFormatAndDepth) {
@@ -147,7 +161,8 @@ TEST_F(MosaicUnderWarmLight, IsBalancedInEveryFormatAndDepth) {
             ASSERT_ZERR(zerrNone, BalanceOverGreys()) << imageFormat << " " << format;
             // Twelve bits stand in the low bits of their words: never in band, and balanced all the
             // same.
-            EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3, 0.03)
+            EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3,
+                        GetGainTolerance(1 / 1.3, BandBegin))
                 << imageFormat << " " << format;
             EXPECT_EQ(GetWord(ReadBack(), zprmPostProcessImageFormat), format)
                 << "the format in force is back";
@@ -156,25 +171,22 @@ TEST_F(MosaicUnderWarmLight, IsBalancedInEveryFormatAndDepth) {
 }
 
 TEST_F(MosaicUnderWarmLight, KeptReadsGainsBackThatAreTruncatedOnceMore) {
-    ASSERT_NO_FATAL_FAILURE(ExposeForBand());
-    ASSERT_ZERR(zerrNone, BalanceOverGreys());
-
-    const Zentara_Settings back = ReadBack();
-
     for (const std::uint32_t key :
          {zprmPostProcessGainRed, zprmPostProcessGainGreen, zprmPostProcessGainBlue}) {
-        const float scale = static_cast<float>(GetWord(settings, key)) / 1000.0F;
-        EXPECT_EQ(GetWord(back, key), static_cast<std::uint32_t>(scale * 1000.0F));
+        ASSERT_NO_FATAL_FAILURE(Set(key, 251));
+        ASSERT_NO_FATAL_FAILURE(Send());
+        EXPECT_EQ(GetWord(ReadBack(), key), 250U);
     }
 }
 
 TEST_F(MosaicUnderWarmLight, KeptTakesOneImageAndFailsWhenTheFormatDoesNotResolveTheMosaic) {
-    for (const std::uint32_t format : {zfmtBayer8, zfmtBayer16}) {
+    for (const std::uint32_t format : {zfmtBayer8, zfmtBayer16, zfmtRGBPlane8, zfmtRGBPlane16}) {
         SetWord(settings, zprmPostProcessImageFormat, format);
         ASSERT_NO_FATAL_FAILURE(Send());
         const std::size_t before = CountImages();
-        EXPECT_ZERR(zerrDriverFault, BalanceOverGreys());
-        EXPECT_EQ(CountImages() - before, 1U);
+        EXPECT_ZERR(zerrDriverFault, BalanceOverGreys()) << format;
+        EXPECT_EQ(CountImages() - before, 1U) << format;
+        EXPECT_EQ(GetWord(ReadBack(), zprmPostProcessImageFormat), format) << "still in force";
     }
 }
 
@@ -265,7 +277,7 @@ TEST_F(MosaicUnderWarmLight, EndsWithTheFailureOfAGrabAndWorksTheNextTime) {
 }
 
 TEST_F(MosaicUnderWarmLight, SurvivesACameraThatVanishesAndWorksWhenItIsBack) {
-    for (std::uint32_t request = 1; request < 24; request += 3) {
+    for (std::uint32_t request = 1; request < 24; ++request) {
         ASSERT_TRUE(world.AddFault(R"({"kind": "unplug", "code": "FW_IOCTL_ASYNC_WRITE",
                                        "request": )" +
                                    std::to_string(request) + "}"));
@@ -285,7 +297,50 @@ TEST_F(MosaicUnderWarmLight, IsBalancedAndExposedByTwoThreadsOneAfterTheOther) {
     });
     EXPECT_ZERR(zerrNone, BalanceOverGreys());
     EXPECT_ZERR(zerrNone, Finish([&] { return exposing.get(); }));
-    EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3, 0.1);
+    // Whichever comes first, red and green are as bright as the band asks for.
+    EXPECT_NEAR(GetWord(settings, zprmPostProcessGainRed) / 1000.0, 1 / 1.3,
+                GetGainTolerance(1 / 1.3, BandBegin));
+}
+
+TEST_F(MosaicUnderWarmLight, EndsByAnAbortWhenTheCameraVanishesInTheMiddleOfAnImage) {
+    ASSERT_NO_FATAL_FAILURE(ExposeFor(100000));
+    auto running = std::async(std::launch::async, [this] {
+        return Zentara_WhiteBalance(&settings, 0, 0, ChartWidth, ChartHeight);
+    });
+    ASSERT_TRUE(WaitUntil([this] { return CountImages() > 0; }));
+    ASSERT_TRUE(world.Unplug());
+    // A pass that begins behind the end of the device fails by itself.
+    const bool hasEnded = WaitUntil([&] {
+        (void)Zentara_Abort(handle);
+        return running.wait_for(std::chrono::seconds(0)) == std::future_status::ready;
+    });
+    EXPECT_TRUE(hasEnded);
+    (void)running.get();  // Six images may all have come before the end.
+    ASSERT_NO_FATAL_FAILURE(Reopen());
+    ASSERT_NO_FATAL_FAILURE(Set(zprmPostProcessImageFormat, zfmtRGB24));
+    ASSERT_NO_FATAL_FAILURE(Send());
+    EXPECT_ZERR(zerrNone, BalanceOverGreys()) << "the next call works";
+}
+
+class MosaicWithoutRedLight : public ChartCamera {
+  protected:
+    MosaicWithoutRedLight() : ChartCamera("colour", "[0, 1.0, 1.0]") {}
+};
+
+TEST_F(MosaicWithoutRedLight, HasTheGreatestGainForRed) {
+    ASSERT_NO_FATAL_FAILURE(Set(zprmPostProcessImageFormat, zfmtRGB24));
+    ASSERT_NO_FATAL_FAILURE(ExposeFor(2000000));
+    (void)TakeMessages("Zentara_WhiteBalance");
+
+    // Half of the region is greys, the other is black beyond the image: without light red is 1, of
+    // which the mean is then 0, and that of the others is not.
+    constexpr std::uint32_t Rows = PatchSide - Margin;
+    ASSERT_ZERR(zerrNone, Balance(PatchSide + Margin, ChartHeight - Rows,
+                                  2 * PatchSide - 2 * Margin, 2 * Rows));
+
+    EXPECT_EQ(GetWord(settings, zprmPostProcessGainRed), 0xFFFFFFFF);
+    EXPECT_EQ(GetWord(settings, zprmPostProcessGainGreen), 1000U);
+    EXPECT_THAT(TakeMessages("Zentara_WhiteBalance"), Contains("New red gain: -1 "));
 }
 
 class MosaicOfAutoExposure : public ChartCamera, public testing::WithParamInterface<std::uint64_t> {
@@ -336,9 +391,26 @@ class WheelUnderWarmLight : public ChartCamera {
         ASSERT_NO_FATAL_FAILURE(ExposeColoursFor(40000000));
     }
     void ExposeColoursFor(std::uint64_t nanoseconds) {
-        ASSERT_NO_FATAL_FAILURE(Set64(zprm64ExposureRed, nanoseconds));
-        ASSERT_NO_FATAL_FAILURE(Set64(zprm64ExposureBlue, nanoseconds));
-        ASSERT_NO_FATAL_FAILURE(ExposeFor(nanoseconds));
+        ASSERT_NO_FATAL_FAILURE(ExposeColoursFor(nanoseconds, nanoseconds, nanoseconds));
+    }
+    void ExposeColoursFor(std::uint64_t red, std::uint64_t green, std::uint64_t blue) {
+        ASSERT_NO_FATAL_FAILURE(Set64(zprm64ExposureRed, red));
+        ASSERT_NO_FATAL_FAILURE(Set64(zprm64ExposureBlue, blue));
+        ASSERT_NO_FATAL_FAILURE(ExposeFor(green));
+    }
+    /// Start colours that were written to the camera, one after the other.
+    std::vector<std::uint32_t> FindStartColours() const {
+        constexpr std::uint32_t Address =
+            Simulation::ControlAddress + 4 * ControlFilterStartColour.quadlet;
+        std::vector<std::uint32_t> colours;
+        for (const RegisterWrite& write : world.ReadRegisterWrites()) {
+            const std::size_t offset = (Address - write.address) / 4;
+            if (write.address > Address || offset >= write.values.size()) continue;
+            const std::uint32_t colour =
+                ExtractField(ControlFilterStartColour, write.values[offset]);
+            if (colours.empty() || colours.back() != colour) colours.push_back(colour);
+        }
+        return colours;
     }
 };
 
@@ -347,8 +419,11 @@ TEST_F(WheelUnderWarmLight, TakesItsColoursWithExposuresThatMakeThemGrey) {
 
     const double green = static_cast<double>(GetWide(settings, zprm64Exposure));
     EXPECT_EQ(GetWide(settings, zprm64Exposure), 40000000U);
-    EXPECT_NEAR(static_cast<double>(GetWide(settings, zprm64ExposureRed)) / green, 1 / 1.3, 0.03);
-    EXPECT_NEAR(static_cast<double>(GetWide(settings, zprm64ExposureBlue)) / green, 1 / 0.8, 0.03);
+    EXPECT_LT(CountImages(), 6U) << "the last image is in band";
+    EXPECT_NEAR(static_cast<double>(GetWide(settings, zprm64ExposureRed)) / green, 1 / 1.3,
+                GetGainTolerance(1 / 1.3, BandBegin));
+    EXPECT_NEAR(static_cast<double>(GetWide(settings, zprm64ExposureBlue)) / green, 1 / 0.8,
+                GetGainTolerance(1 / 0.8, BandBegin));
     const Zentara_Settings back = ReadBack();
     for (const std::uint32_t key : {zprm64Exposure, zprm64ExposureRed, zprm64ExposureBlue}) {
         EXPECT_EQ(GetWide(back, key), GetWide(settings, key)) << key;
@@ -358,8 +433,27 @@ TEST_F(WheelUnderWarmLight, TakesItsColoursWithExposuresThatMakeThemGrey) {
     ASSERT_EQ(frame.format, zfmtRGB24);
     for (const std::uint32_t column : {1U, 2U, 3U}) {
         const Colour mean = MeanOfGrey(pixels, column);
-        EXPECT_NEAR(mean[0], mean[1], mean[1] * 0.03 + 2) << "patch " << column;
-        EXPECT_NEAR(mean[2], mean[1], mean[1] * 0.03 + 2) << "patch " << column;
+        // As exact as the exposures, and rounded on both sides.
+        const double tolerance = mean[1] * 2 / BandBegin + 1;
+        EXPECT_NEAR(mean[0], mean[1], tolerance) << "patch " << column;
+        EXPECT_NEAR(mean[2], mean[1], tolerance) << "patch " << column;
+    }
+}
+
+TEST_F(WheelUnderWarmLight, KeptHasTheScalesOfItsImageInExposuresAndGainsAlike) {
+    constexpr std::uint64_t StartNs = 60000000;  // In band.
+    ASSERT_NO_FATAL_FAILURE(ExposeColoursFor(StartNs));
+
+    ASSERT_ZERR(zerrNone, BalanceOverGreys());
+
+    EXPECT_EQ(CountImages(), 1U);
+    for (const auto& [gain, exposure, light] :
+         {std::tuple{zprmPostProcessGainRed, zprm64ExposureRed, 1.3},
+          std::tuple{zprmPostProcessGainBlue, zprm64ExposureBlue, 0.8}}) {
+        const double scale = GetWord(settings, gain) / 1000.0;
+        EXPECT_NEAR(scale, 1 / light, GetGainTolerance(1 / light, BandBegin));
+        EXPECT_NEAR(static_cast<double>(GetWide(settings, exposure)) / StartNs, scale, 0.001)
+            << "a correction is made twice where frames are balanced";
     }
 }
 
@@ -375,7 +469,16 @@ TEST_F(WheelUnderWarmLight, TellsTheLogItsExposures) {
 }
 
 TEST_F(WheelUnderWarmLight, IsHeldAtGreenWhileItsExposureIsFoundAndCyclesAgainAfterwards) {
-    ASSERT_NO_FATAL_FAILURE(ExposeColoursFor(1000000));
+    constexpr std::uint64_t StartNs = 1000000;
+    constexpr std::uint64_t RedNs = 15000000;
+    constexpr std::uint64_t BlueNs = 70000000;
+    constexpr std::uint32_t Blue = 3;
+    ASSERT_NO_FATAL_FAILURE(Set(zprmColorWheel, Blue));
+    ASSERT_NO_FATAL_FAILURE(ExposeColoursFor(RedNs, StartNs, BlueNs));
+    // A block that says another colour tells what the search puts back from what is sent behind it.
+    ASSERT_NO_FATAL_FAILURE(Set(zprmColorWheel, 0));
+    const std::size_t coloursBefore = FindStartColours().size();
+    (void)TakeMessages("Zentara_AutoExpose");
     const std::size_t framesBefore = world.ReadFrames().size();
 
     ASSERT_ZERR(zerrNone, Finish([this] {
@@ -389,8 +492,43 @@ TEST_F(WheelUnderWarmLight, IsHeldAtGreenWhileItsExposureIsFoundAndCyclesAgainAf
     }
     EXPECT_EQ(GetWord(ReadBack(), zprmImageFormat), zfmtRGB24) << "it cycles";
     EXPECT_EQ(GetWide(ReadBack(), zprm64ExposureRed), GetWide(settings, zprm64ExposureRed));
-    EXPECT_EQ(GetWide(settings, zprm64ExposureRed), GetWide(settings, zprm64ExposureBlue));
-    EXPECT_GT(GetWide(settings, zprm64Exposure), 1000000U);
+    std::vector<std::uint32_t> colours = FindStartColours();
+    colours.erase(colours.begin(), colours.begin() + static_cast<std::ptrdiff_t>(coloursBefore));
+    EXPECT_THAT(colours, ElementsAre(1, Blue, 0)) << "green, the one before, that of the block";
+    const std::uint64_t red = GetWide(settings, zprm64ExposureRed);
+    const std::uint64_t green = GetWide(settings, zprm64Exposure);
+    const std::uint64_t blue = GetWide(settings, zprm64ExposureBlue);
+    EXPECT_GT(green, 4 * StartNs);
+    // The last step alone, which is no more than a tenth, moves both.
+    const auto step = static_cast<double>(red) - static_cast<double>(RedNs);
+    EXPECT_EQ(static_cast<double>(blue) - static_cast<double>(BlueNs), step);
+    EXPECT_LE(std::abs(step), 0.12 * static_cast<double>(green));
+    const std::vector<std::string> messages = TakeMessages("Zentara_AutoExpose");
+    ASSERT_EQ(messages.size(), 4U);
+    EXPECT_EQ(messages[1], "New red exposure: " + std::to_string(red) + "  ns");
+    EXPECT_EQ(messages[2], "New green exposure: " + std::to_string(green) + "  ns");
+    EXPECT_EQ(messages[3], "New blue exposure: " + std::to_string(blue) + "  ns");
+}
+
+TEST_F(WheelUnderWarmLight, CyclesAgainAfterAFailedGrabByTheBlockThatIsSent) {
+    constexpr std::uint32_t Blue = 3;
+    ASSERT_NO_FATAL_FAILURE(Set(zprmColorWheel, Blue));
+    ASSERT_NO_FATAL_FAILURE(ExposeColoursFor(2000000, 1000000, 3000000));
+    ASSERT_TRUE(world.AddFault(
+        R"({"kind": "failRequest", "code": "FW_IOCTL_ALLOC_BANDWIDTH", "request": 2})"));
+
+    ASSERT_ZERR(zerrNone, Finish([this] {
+                    return Zentara_AutoExpose(&settings, 0, 0, ChartWidth, ChartHeight);
+                }));
+
+    EXPECT_EQ(CountImages(), 1U);
+    const Zentara_Settings back = ReadBack();
+    EXPECT_EQ(GetWord(back, zprmImageFormat), zfmtRGB24) << "it cycles";
+    EXPECT_EQ(GetWord(back, zprmColorWheel), Blue);
+    EXPECT_EQ(GetWide(back, zprm64Exposure), 4000000U) << "one step";
+    EXPECT_EQ(GetWide(back, zprm64ExposureRed), GetWide(settings, zprm64ExposureRed));
+    EXPECT_EQ(GetWide(back, zprm64ExposureBlue), GetWide(settings, zprm64ExposureBlue));
+    EXPECT_ZERR(zerrNone, BalanceOverGreys()) << "the next call works";
 }
 
 }  // namespace
