@@ -206,6 +206,41 @@ TEST_P(RowLoops, WordLookupsReadTheirTablesAndOneWordMore) {
     }
 }
 
+TEST_P(RowLoops, TwoLinearRowsAtOnceAreTheOnesThatThePlainFormMakesOneByOne) {
+    const RowKernels& plain = *FindRowKernels("plain");
+    const std::int32_t choices[] = {0, 1, 4095, 8192, 12289, 16383, 16384};
+    for (const std::size_t count : ListCounts()) {
+        const std::int32_t weights[] = {choices[random() % 7], choices[random() % 7]};
+        std::vector<std::uint16_t> upper(count), lower(count);
+        for (std::uint16_t& sum : upper) sum = static_cast<std::uint16_t>(random());
+        for (std::uint16_t& sum : lower) sum = static_cast<std::uint16_t>(random());
+        std::vector<Word> words[2], expectedWords(count);
+        for (auto& row : words) row.resize(count);
+        Word* const wordRows[] = {words[0].data(), words[1].data()};
+
+        rows->linearColumnPair16(upper.data(), lower.data(), weights, wordRows, count);
+
+        for (std::size_t i = 0; i < 2; ++i) {
+            plain.linearColumn16(upper.data(), lower.data(), weights[i], expectedWords.data(),
+                                 count);
+            ASSERT_EQ(std::memcmp(wordRows[i], expectedWords.data(), 2 * count), 0) << count;
+        }
+
+        for (std::uint16_t& sum : upper) sum %= 16321;
+        for (std::uint16_t& sum : lower) sum %= 16321;
+        std::vector<std::uint8_t> bytes[2], expected(count);
+        for (auto& row : bytes) row.resize(count);
+        std::uint8_t* const byteRows[] = {bytes[0].data(), bytes[1].data()};
+
+        rows->linearColumnPair8(upper.data(), lower.data(), weights, byteRows, count);
+
+        for (std::size_t i = 0; i < 2; ++i) {
+            plain.linearColumn8(upper.data(), lower.data(), weights[i], expected.data(), count);
+            ASSERT_EQ(bytes[i], expected) << count;
+        }
+    }
+}
+
 ZENTARA_FOR_ALL_KERNEL_FORMS(RowLoops);
 
 }  // namespace
