@@ -5,6 +5,7 @@
 
 #include "camera/camera.h"
 #include "imaging/horizontal_reduction.h"
+#include "imaging/image_formats.h"
 #include "imaging/row_zoom.h"
 
 namespace ZV {
@@ -37,6 +38,12 @@ bool IsWhole(const ZInImageBufferStruct& in) {
     return in.width <= samples && in.height <= samples / in.width && in.data != nullptr;
 }
 
+/// Kept: every pattern that is no mosaic's counts as the first one.
+std::uint32_t GetMosaicPattern(const ZInImageBufferStruct& in) {
+    const bool isMosaic = in.colourPattern >= PatternRGGB && in.colourPattern <= PatternBGGR;
+    return isMosaic ? in.colourPattern : std::uint32_t{PatternRGGB};
+}
+
 bool DoesFit(std::uint64_t bytes, const ZOutImageBufferStruct& out) {
     return out.dataCapacity == 0 || bytes <= out.dataCapacity;
 }
@@ -66,7 +73,7 @@ void DoubleRows(const ZInImageBufferStruct& in, const RatioOutcome& outcome, std
     }
     const std::uint32_t sampleBytes = GetSampleBytes(in);
     ZoomSpreadRows(image, image, outcome.width, in.height, sampleBytes);
-    ZoomFillRows(in.colourPattern, image, fillWidth, fillHeight, sampleBytes);
+    ZoomFillRows(GetMosaicPattern(in), image, fillWidth, fillHeight, sampleBytes);
 }
 
 void MakeImage(const ZInImageBufferStruct& in, const RatioOutcome& outcome,

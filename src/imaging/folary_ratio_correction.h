@@ -24,11 +24,15 @@ class ZENTARA_API ZFolaryRatioCorrection : public ZImageFilter {
     ~ZFolaryRatioCorrection() override;
 
     /// A binned frame is reduced across by its binning mode. A frame of real-time video is reduced
-    /// by what its sensor asks for and doubled down. The image format is not looked at; a bit depth
-    /// of 8 means samples of a byte, every other one words. `in->data` is only read and may be
-    /// `out->data`.
+    /// by what its sensor asks for and doubled down, as a mosaic of its pattern: 5 to 8, every
+    /// other one counts as 5. The image format is not looked at; a bit depth of 8 means samples of
+    /// a byte, every other one words. `in->data` is only read, unless it is `out->data`.
     ///
-    /// In this order: `FilterDeclined` for another model, for a frame that is neither binned nor
+    /// Done as well, without real-time video: a binning of 0 sets the output's format and leaves
+    /// size, width and height as they came; one for which there is no reduction (5, 7, 8) sets all
+    /// four and writes no samples.
+    ///
+    /// In this order: `FilterDeclined` for another model, for a frame of binning 1 that is not
     /// real-time video, and for real-time video of a sensor that is neither 2048 nor 2560 wide;
     /// `FilterFailed` for a frame with fewer bytes than its size asks for, and for an output that
     /// does not hold the result.

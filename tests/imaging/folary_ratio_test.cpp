@@ -55,6 +55,17 @@ Samples MakeRandom(std::size_t count, std::uint32_t sampleBytes, std::uint32_t s
     return samples;
 }
 
+/// What a reduced mosaic is before its rows between are computed, over an output of zeros: what is
+/// not spread holds the rows as they were reduced, and zeros behind them.
+Samples JudgeVideoSpread(const Samples& reduced, std::uint32_t width) {
+    Samples spread = JudgeZoomSpread(reduced, width, 0);
+    for (std::size_t i = 0; i < reduced.size(); ++i) {
+        const std::size_t row = i / width % 4;
+        if (row == 1 || row == 2) spread[i] = reduced[i];
+    }
+    return spread;
+}
+
 class FolaryRatio : public testing::Test {
   protected:
     void Give(const Samples& samples, std::uint32_t width, std::uint32_t height,
@@ -272,14 +283,11 @@ class RealTimeVideo : public FolaryRatio,
         const std::uint32_t factor = std::get<0>(GetParam()).factor;
         const std::uint32_t sampleBytes = std::get<1>(GetParam()) == 8 ? 1 : 2;
         const std::uint32_t reducedWidth = CalculateReducedWidth(width, factor);
-        const Samples reduced = JudgeReduction(samples, width, factor);
-        // What is not computed holds the rows as they were reduced, and zeros behind them.
-        Samples zoomed = JudgeZoomSpread(reduced, reducedWidth, 0);
-        for (std::size_t i = 0; i < reduced.size(); ++i) {
-            const std::size_t row = i / reducedWidth % 4;
-            if (row == 1 || row == 2) zoomed[i] = reduced[i];
-        }
-        return Spell(JudgeZoomFill(zoomed, reducedWidth, 2 * height, pattern), sampleBytes);
+        const std::uint32_t mosaic =
+            pattern >= PatternRGGB && pattern <= PatternBGGR ? pattern : std::uint32_t{PatternRGGB};
+        const Samples spread =
+            JudgeVideoSpread(JudgeReduction(samples, width, factor), reducedWidth);
+        return Spell(JudgeZoomFill(spread, reducedWidth, 2 * height, mosaic), sampleBytes);
     }
 };
 
@@ -309,6 +317,25 @@ TEST_P(RealTimeVideo, IsReducedAcrossAndDoubledDownForEverySizeAndPattern) {
             }
         }
     }
+}
+
+TEST_P(RealTimeVideo, KeptEveryPatternThatIsNoMosaicsIsCorrectedAsRGGB) {
+    const auto [video, bitDepth] = GetParam();
+    camera.sensorWidth = video.sensorWidth;
+    const Samples samples = MakeRandom(std::size_t{60} * 8, bitDepth == 8 ? 1 : 2, 6);
+    const auto correct = [&](std::uint32_t pattern) {
+        Give(samples, 60, 8, bitDepth);
+        in.isRTV = true;
+        in.colourPattern = pattern;
+        EXPECT_EQ(FilterDone, Process());
+        return GetOutput();
+    };
+    const Bytes expected = correct(PatternRGGB);
+    for (const std::uint32_t pattern : {0U, 1U, 2U, 3U, 4U, 9U, 0x10006U, 0xFFFFFFFFU}) {
+        EXPECT_EQ(expected, correct(pattern)) << pattern;
+    }
+    EXPECT_NE(expected, correct(PatternGRBG));
+    EXPECT_NE(expected, correct(PatternGBRG));
 }
 
 TEST_P(RealTimeVideo, MayBeCorrectedInPlace) {
@@ -356,6 +383,46 @@ TEST_F(FolaryRatio, RowsOfASmallFrameThatAreNotComputedHoldTheStepBeforeOrNothin
               Bytes(zoomed.begin() + 4, zoomed.begin() + 8))
         << "the second row, where it stood and where it belongs";
     EXPECT_EQ(Bytes(4), Bytes(zoomed.begin() + 8, zoomed.begin() + 12));
+}
+
+class TallOrWideVideo : public FolaryRatio {
+  protected:
+    static constexpr std::uint32_t Factor = 4;  // of the fixture's camera
+
+    /// Corrects random samples. Only a frame of `fillWidth` x `fillHeight` is computed, from the
+    /// first sample on.
+    void ExpectFilledAs(std::uint32_t width, std::uint32_t height, std::uint32_t bitDepth,
+                        std::uint32_t fillWidth, std::uint32_t fillHeight) {
+        const std::uint32_t sampleBytes = bitDepth == 8 ? 1 : 2;
+        const Samples samples = MakeRandom(std::size_t{width} * height, sampleBytes, bitDepth);
+        Give(samples, width, height, bitDepth);
+        in.isRTV = true;
+
+        ASSERT_EQ(FilterDone, Process());
+
+        const std::uint32_t reducedWidth = width / Factor;
+        ASSERT_EQ(reducedWidth, out.width);
+        ASSERT_EQ(2 * height, out.height);
+        Samples expected = JudgeVideoSpread(JudgeReduction(samples, width, Factor), reducedWidth);
+        const auto filledEnd = expected.begin() + fillWidth * fillHeight;
+        const Samples filled =
+            JudgeZoomFill(Samples(expected.begin(), filledEnd), fillWidth, fillHeight, PatternRGGB);
+        std::copy(filled.begin(), filled.end(), expected.begin());
+        EXPECT_TRUE(Spell(expected, sampleBytes) == GetOutput());
+        EXPECT_TRUE(IsUntouched(out.imageSize));
+    }
+};
+
+TEST_F(TallOrWideVideo, KeptTheHeightTravelsAs16BitsAndTheRowsBehindItAreNotComputed) {
+    ExpectFilledAs(40, 32772, 8, 10, 8);  // twice the height is 65536 + 8
+    ExpectFilledAs(40, 32772, 12, 10, 8);
+    EXPECT_EQ(65544U, out.height);
+}
+
+TEST_F(TallOrWideVideo, KeptTheWidthTravelsAs16BitsAndTheSamplesAreFilledAsRowsOfTheRest) {
+    ExpectFilledAs(4 * (65536 + 6), 4, 8, 6, 8);
+    ExpectFilledAs(4 * (65536 + 6), 4, 12, 6, 8);
+    EXPECT_EQ(65542U, out.width);
 }
 
 // ---- Bad input ----
