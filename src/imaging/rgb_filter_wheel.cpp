@@ -8,9 +8,10 @@
 #include "imaging/image_formats.h"
 
 // Threads. The streaming thread collects; a client's thread may drop the set, or let the planes go
-// and make them anew. The semaphore keeps each of these whole. The needed size is asked for without
-// it: a set that is dropped in between makes the answer too large at worst, and no byte is written
-// beyond the buffer that was made by it.
+// and make them anew. Each of these is one hold of the semaphore: no frame comes between the end of
+// a set and that of its planes, or the planes and the flag that lets frames in. The needed size is
+// asked for without it: a set that is dropped in between makes the answer too large at worst, and
+// no byte is written beyond the buffer that was made by it.
 
 namespace ZV {
 namespace {
@@ -145,9 +146,10 @@ FilterResult ZRGBFilterWheel::Process(ZInImageBufferStruct* in, ZOutImageBufferS
 }
 
 FilterResult ZRGBFilterWheel::Init(std::uint32_t width, std::uint32_t height) {
+    const WheelHold hold(semaphore);
     widthMax = width;
     heightMax = height;
-    AllocateBuffers(widthMax, heightMax);
+    MakePlanes(widthMax, heightMax);
     return FilterDone;
 }
 
@@ -162,14 +164,16 @@ void ZRGBFilterWheel::Reset() {
 }
 
 void ZRGBFilterWheel::Enable() {
+    const WheelHold hold(semaphore);
     ZImageFilter::Enable();
-    AllocateBuffers(widthMax, heightMax);
+    MakePlanes(widthMax, heightMax);
 }
 
 void ZRGBFilterWheel::Disable() {
+    const WheelHold hold(semaphore);
     ZImageFilter::Disable();
-    Reset();
-    FreeBuffers();
+    DropSet();
+    FreePlanes();
 }
 
 std::uint32_t ZRGBFilterWheel::GetNeededOutputBufferSize(ZInImageBufferStruct* in) {
@@ -186,16 +190,12 @@ std::uint32_t ZRGBFilterWheel::GetOutputFormat() const {
 
 void ZRGBFilterWheel::AllocateBuffers(std::uint32_t width, std::uint32_t height) {
     const WheelHold hold(semaphore);
-    if (buffersAllocated) return;
-    const std::uint64_t planeBytes = std::uint64_t{width} * height * SampleBytesMax;
-    for (Shot& shot : shots) (void)shot.plane.AllocateAhead(planeBytes);
-    buffersAllocated = true;
+    MakePlanes(width, height);
 }
 
 void ZRGBFilterWheel::FreeBuffers() {
     const WheelHold hold(semaphore);
-    for (Shot& shot : shots) shot.plane.Free();
-    buffersAllocated = false;
+    FreePlanes();
 }
 
 std::uint16_t ZRGBFilterWheel::GetCount(std::size_t place) const {
@@ -280,6 +280,23 @@ FilterResult ZRGBFilterWheel::Pack(const ZInImageBufferStruct& in,
 void ZRGBFilterWheel::DropSet() {
     isStarted.store(false, std::memory_order_relaxed);
     for (Shot& shot : shots) shot.count.store(0, std::memory_order_relaxed);
+}
+
+void ZRGBFilterWheel::MakePlanes(std::uint32_t width, std::uint32_t height) {
+    if (buffersAllocated) return;
+    // A frame that came while there were none may have begun a set.
+    DropSet();
+    const std::uint64_t planeBytes = std::uint64_t{width} * height * SampleBytesMax;
+    if (planeBytes == 0) return;
+    buffersAllocated = std::all_of(shots.begin(), shots.end(), [planeBytes](Shot& shot) {
+        return shot.plane.AllocateAhead(planeBytes);
+    });
+    if (!buffersAllocated) FreePlanes();
+}
+
+void ZRGBFilterWheel::FreePlanes() {
+    for (Shot& shot : shots) shot.plane.Free();
+    buffersAllocated = false;
 }
 
 }  // namespace ZV

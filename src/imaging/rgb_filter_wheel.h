@@ -28,14 +28,17 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     /// `FilterDeclined` the camera's wheel does not turn; `FilterNothingYet` out of turn (nothing
     /// stored); `FilterNotInitialised` the frame is larger than the planes (nothing stored);
     /// `FilterNothingYet` the set is not complete; `FilterFailed` the output format is none of 6 to
-    /// 12, or the image does not fit the output; 9 the semaphore cannot be given back. A set that
-    /// could not be packed stays as it is: the next frame in turn tries again.
+    /// 12; `FilterNotInitialised` the format reads words and the planes hold fewer than the image
+    /// has pixels; `FilterFailed` the image does not fit the output; 9 the semaphore cannot be
+    /// given back. A set that could not be packed stays as it is: the next frame in turn tries
+    /// again.
     FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
     /// Stores the largest size and makes the planes if there are none. `FilterDone`.
     FilterResult Init(std::uint32_t width, std::uint32_t height) override;
     FilterResult SetOutputFormat(std::uint32_t format) override;
     /// Drops a set that is half collected.
     void Reset() override;
+    /// Makes the planes of the largest size if there are none.
     void Enable() override;
     /// Drops a set that is half collected and lets the planes go; a later `Enable` makes them anew.
     void Disable() override;
@@ -49,7 +52,8 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     std::uint16_t GetGreenCount() const { return GetCount(1); }
     std::uint16_t GetBlueCount() const { return GetCount(2); }
 
-    /// Makes three planes of 16-bit samples if there are none.
+    /// Makes three planes of 16-bit samples if there are none, and drops a set that was begun
+    /// without them. A size of 0, or one that there is no memory for, makes none.
     void AllocateBuffers(std::uint32_t width, std::uint32_t height);
     void FreeBuffers();
 
@@ -60,18 +64,22 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     };
 
     std::uint16_t GetCount(std::size_t place) const;
+    // The rest wants the semaphore held.
     bool IsInTurn(const ZInImageBufferStruct& in);
     FilterResult Collect(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out);
     FilterResult Store(const ZInImageBufferStruct& in);
     FilterResult Pack(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out) const;
     void DropSet();
+    void MakePlanes(std::uint32_t width, std::uint32_t height);
+    void FreePlanes();
 
     std::atomic<std::uint32_t> outputFormat;
-    std::atomic<bool> isStarted{false};  // guarded by semaphore, as is all below
+    HALSemaphore* semaphore = nullptr;
+    // Guarded by semaphore, as is all below; flag and counts are read without it, too.
+    std::atomic<bool> isStarted{false};
     std::uint16_t nextColour = 0;
     std::array<Shot, 3> shots;  // Red, green, blue.
     bool buffersAllocated = false;
-    HALSemaphore* semaphore = nullptr;
     std::uint32_t widthMax = 0;
     std::uint32_t heightMax = 0;
 };

@@ -84,6 +84,9 @@ class FilterWheel : public testing::Test {
         return std::all_of(output.begin() + static_cast<std::ptrdiff_t>(from), output.end(),
                            [](std::uint8_t byte) { return byte == Untouched; });
     }
+    Bytes GetImage() const {
+        return {output.begin(), output.begin() + static_cast<std::ptrdiff_t>(out.imageSize)};
+    }
     std::array<int, 3> GetCounts() const {
         return {wheel.GetRedCount(), wheel.GetGreenCount(), wheel.GetBlueCount()};
     }
@@ -453,9 +456,58 @@ TEST_F(FilterWheel, BeingDisabledDropsTheSetAndThePlanesAndEnablingMakesThemAnew
     EXPECT_EQ(FilterNotInitialised, Process(PatternRed));
 
     wheel.Enable();
-    wheel.Reset();
 
     EXPECT_EQ(FilterDone, ProcessSet());
+}
+
+TEST_F(FilterWheel, BeingEnabledAloneSufficesBehindFramesThatWereMetWhileDisabled) {
+    wheel.Disable();
+    ASSERT_EQ(FilterNotInitialised, Process(PatternRed));
+    ASSERT_TRUE(wheel.IsStarted()) << "it waits for red";
+    camera.startColour = PatternGreen;
+
+    wheel.Enable();
+
+    EXPECT_FALSE(wheel.IsStarted());
+    EXPECT_EQ(FilterNothingYet, Process(PatternGreen));
+    EXPECT_EQ(FilterNothingYet, Process(PatternBlue));
+    EXPECT_EQ(FilterDone, Process(PatternRed));
+    EXPECT_EQ(ExpectImage(RGBPlane8, 8), GetImage());
+}
+
+TEST_F(FilterWheel, BeingEnabledWithPlanesKeepsTheSetThatIsUnderWay) {
+    ASSERT_EQ(FilterNothingYet, Process(PatternRed));
+
+    wheel.Enable();
+
+    EXPECT_EQ((Counts{1, 0, 0}), GetCounts());
+    EXPECT_EQ(FilterNothingYet, Process(PatternGreen));
+    EXPECT_EQ(FilterDone, Process(PatternBlue));
+}
+
+TEST_F(FilterWheel, BeingEnabledBeforeItKnowsASizeLeavesThePlanesToInit) {
+    ZRGBFilterWheel fresh(RGBPlane8);
+    fresh.Enable();
+    fresh.AllocateBuffers(0, Height);
+    (void)fresh.Init(Width, 0);
+    (void)Process(PatternRed);
+    ASSERT_EQ(FilterNotInitialised, fresh.Process(&in, &out));
+
+    (void)fresh.Init(Width, Height);
+
+    EXPECT_EQ(FilterNothingYet, fresh.Process(&in, &out));
+    EXPECT_EQ(1, fresh.GetRedCount());
+}
+
+TEST_F(FilterWheel, PlanesThatCouldNotBeMadeAreMadeBySizesThatFit) {
+    ZRGBFilterWheel claimed(RGBPlane8);
+    (void)claimed.Init(65535, 65535);
+    (void)Process(PatternRed);
+    ASSERT_EQ(FilterNotInitialised, claimed.Process(&in, &out));
+
+    (void)claimed.Init(Width, Height);
+
+    EXPECT_EQ(FilterNothingYet, claimed.Process(&in, &out));
 }
 
 TEST_F(FilterWheel, MayBeResetAndSwitchedWhileFramesCome) {
@@ -468,19 +520,23 @@ TEST_F(FilterWheel, MayBeResetAndSwitchedWhileFramesCome) {
         }
     });
 
+    const Bytes expected = ExpectImage(RGBPlane8, 8);
     for (int set = 0; set < 300; ++set) {
         for (const std::uint32_t colour : {0U, 1U, 3U}) {
             const FilterResult result = Process(colour);
             EXPECT_TRUE(result == FilterDone || result == FilterNothingYet ||
                         result == FilterNotInitialised)
                 << result;
+            if (result == FilterDone) {
+                EXPECT_EQ(expected, GetImage());
+            }
             (void)wheel.GetNeededOutputBufferSize(&in);
         }
     }
     mayEnd = true;
     client.join();
-    wheel.Reset();
     EXPECT_EQ(FilterDone, ProcessSet());
+    EXPECT_EQ(expected, GetImage());
 }
 
 // ---- In its pipeline ----
