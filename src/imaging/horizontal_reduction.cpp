@@ -39,8 +39,8 @@ void ReduceGroups(const std::uint8_t* row, std::uint8_t* reduced, std::size_t gr
     }
 }
 
-// Each of the following takes what it can and leaves the last groups of a row to ReduceGroups. All
-// of a group is read before any of it is written, so that a row may be reduced in place.
+// All of a group, or of a block of groups, is read before any of it is written, so that a row may
+// be reduced in place.
 
 /// The first words of the groups of both blocks.
 __m128i TakeFirstWords(__m128i lower, __m128i upper) {
@@ -63,6 +63,8 @@ void HalveBlock(const std::uint8_t* row, std::uint8_t* reduced) {
     _mm_storeu_si128(reinterpret_cast<__m128i*>(reduced),
                      _mm_add_epi8(_mm_and_si128(first, second), differences));
 }
+
+// This one and the next take what they can and leave the last groups of a row to ReduceGroups.
 
 void HalveBytes(const std::uint8_t* row, std::uint8_t* reduced, std::size_t groups) {
     for (; groups >= 8; groups -= 8) {

@@ -59,15 +59,16 @@ std::uint32_t Third(std::uint32_t sum) {
 // ---- Rows inside the frame ----
 
 /// Computed rows of one kind: 2, 6, 10, ..., whose real neighbours of the other colours stand
-/// below, or 5, 9, 13, ..., where they stand above. A sample's real neighbours in its own column
-/// stand two rows above and below; the nearer one counts twice where it has the same colour.
+/// below, or 5, 9, 13, ..., where they stand above. Both real neighbours of a sample in its own
+/// column stand two rows away; where they have its colour, rows 2, 6, ... weigh the upper one
+/// twice, rows 5, 9, ... the lower one.
 struct RowFamily {
     std::size_t firstRow;
     std::size_t rowCount;
     bool isBelow;  ///< The adjacent real row stands below.
 };
 
-/// Samples with their own colour right above and below.
+/// Samples with their own colour above and below, two rows away.
 template <typename Sample>
 void ZoomFillVertical(Frame<Sample>& frame, const RowFamily& rows, std::size_t startColumn) {
     const std::uint32_t upperWeight = rows.isBelow ? 2 : 1;
@@ -95,8 +96,8 @@ void ZoomFillDiagonal(Frame<Sample>& frame, const RowFamily& rows, std::size_t s
         const std::size_t row = rows.firstRow + RowsPerCell * index;
         const std::size_t near = rows.isBelow ? row + 1 : row - 1;
         const std::size_t far = rows.isBelow ? row - 2 : row + 2;
-        // Kept: column 1 has a left neighbour, and so has the last odd column, and the last even
-        // one of an even width a right neighbour; none of them is used.
+        // Kept: column 1 has a left neighbour, and column w - 2 of an even width a right one;
+        // neither is used.
         frame.Put(row, startColumn - 2,
                   Third(frame.Get(far, startColumn - 2) + 2 * frame.Get(near, startColumn - 1)));
         for (std::size_t column = startColumn; column < rightEdge; column += 2) {

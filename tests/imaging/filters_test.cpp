@@ -1,4 +1,4 @@
-// What stands of the filters while their Process declines.
+// What the filters hold and answer apart from the images that they make.
 
 #include <gtest/gtest.h>
 
@@ -95,10 +95,12 @@ TEST(RGBFilterWheel, MayBeDisabledEnabledAndResetInAnyOrder) {
     wheel.Disable();
     EXPECT_FALSE(wheel.IsEnabled());
     (void)wheel.Init(16, 16);
+    EXPECT_FALSE(wheel.IsEnabled());
     wheel.Enable();
     wheel.Reset();
 
     EXPECT_TRUE(wheel.IsEnabled());
+    EXPECT_FALSE(wheel.IsStarted());
 }
 
 std::int32_t Level8(float scale, std::size_t level) {
@@ -196,7 +198,7 @@ TEST(AutoExposure, MeasuresTheWholeSensorFromInitOn) {
     EXPECT_EQ(filter.SetOutputFormat(99), FilterDone);
 }
 
-TEST(Filters, DeclineUntilTheyAreBuilt) {
+TEST(Filters, DeclineAnImageOfNoFormatAndNoCamera) {
     ZBayerInterpolation bayer(1, 12);
     ZFolaryRatioCorrection ratio(0);
     ZRGBFilterWheel wheel(6);
