@@ -14,6 +14,17 @@ namespace ZV::Test {
 /// base before the one that loads.
 class LogFile {
   protected:
+    /// `switches`: further lines of the configuration.
+    explicit LogFile(const std::string& switches = {})
+        : config(
+              "ZENTARA_CONFIG",
+              folder
+                  .WriteFile("zentara.conf",
+                             "outputEnabled = 1\noutputToFile = 1\noutputSettings = 1\n"
+                             "outputNestedCalls = 1\n" +
+                                 switches + "outputFilePath = " + folder.GetPath("log.txt") + "\n")
+                  .c_str()) {}
+
     /// Texts of the messages of `function` since the last call.
     std::vector<std::string> TakeMessages(const std::string& function) {
         const std::regex message(R"(\d\d:\d\d\.\d{3} )" + function + " - ([^\\n]*)");
@@ -47,13 +58,7 @@ class LogFile {
 
     TemporaryFolder folder;
     std::size_t taken = 0;
-    ScopedVariable config{"ZENTARA_CONFIG",
-                          folder
-                              .WriteFile("zentara.conf",
-                                         "outputEnabled = 1\noutputToFile = 1\noutputSettings = 1\n"
-                                         "outputNestedCalls = 1\noutputFilePath = " +
-                                             folder.GetPath("log.txt") + "\n")
-                              .c_str()};
+    ScopedVariable config;
 };
 
 }  // namespace ZV::Test

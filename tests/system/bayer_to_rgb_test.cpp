@@ -285,6 +285,17 @@ TEST_F(BayerToRgb, MayWriteOverTheMosaicItReads) {
     EXPECT_EQ(expected, both.GetImage());
 }
 
+TEST_F(BayerToRgb, OfOneRecordForBothEndsNoPixelsAreWritten) {
+    OwnedFrame mosaic = GrabMosaic();
+    const Zentara_Frame before = *mosaic.Get();
+    const std::vector<std::uint8_t> pixels = mosaic.pixels;
+
+    EXPECT_ZERR(zerrNone, Zentara_BayerToRgb(zbayerAverage, mosaic.Get(), mosaic.Get()));
+
+    EXPECT_EQ(0, std::memcmp(&before, mosaic.Get(), sizeof(before)));
+    EXPECT_EQ(pixels, mosaic.pixels);
+}
+
 TEST_F(BayerToRgb, AnEmptyFrameGivesAnEmptyImage) {
     OwnedFrame mosaic = GrabMosaic();
     mosaic->width = 0;
