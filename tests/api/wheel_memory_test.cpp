@@ -1,7 +1,11 @@
 #include <gtest/gtest.h>
 
+#include <string>
+
 #include "api/failing_memory.h"
 #include "camera/camera_result.h"
+#include "hal/hal.h"
+#include "hal/platform/last_error.h"
 #include "imaging/rgb_filter_wheel.h"
 
 namespace ZV::Test {
@@ -20,6 +24,25 @@ TEST(WheelWithoutMemory, ForItsSemaphoreFailsEachFrameAndMayStillBeReset) {
     wheel.Disable();
     wheel.Enable();
     EXPECT_EQ(CameraHalFault, wheel.Process(&in, &out));
+}
+
+TEST(WheelWithoutMemory, ForItsSemaphorePrintsTheTextOfTheLastErrorForEachFrame) {
+    FailAllocation(1);
+    ZRGBFilterWheel wheel(zfmtRGB24);
+    ASSERT_EQ(0U, EndFailingAllocation());
+    ZInImageBufferStruct in;
+    ZOutImageBufferStruct out;
+    SetLastPlatformError(PlatformErrorAccessDenied);
+    const std::string text = HAL_ErrorMessage(HALSemaphoreFailed);
+    ASSERT_FALSE(text.empty());
+    testing::internal::CaptureStdout();
+
+    const FilterResult first = wheel.Process(&in, &out);
+    const FilterResult second = wheel.Process(&in, &out);
+
+    EXPECT_EQ(text + text, testing::internal::GetCapturedStdout());
+    EXPECT_EQ(CameraHalFault, first);
+    EXPECT_EQ(CameraHalFault, second);
 }
 
 }  // namespace
