@@ -922,7 +922,8 @@ ZENTARA_API ZentaraResult Zentara_BayerToRgb(uint32_t algorithm, const Zentara_F
 /**
  * Doubles the height of a mosaic frame, which stays a mosaic of the same pattern: two rows of
  * `inFrame` and two computed from samples of the same colour make four. Computed rows of frames
- * below 5 columns, or 6 rows of output, keep what the buffer held.
+ * below 5 columns, or 6 rows of output, keep what the buffer held. Both frames may have one buffer,
+ * which then holds the output; buffers that overlap in any other way give undefined pixels.
  *
  * The client fills height, twice that of `inFrame`, pBuffer and bufferSize of `outFrame`; a
  * bufferSize of 0 leaves the room to the client's word. `outFrame` takes width and bits; size,

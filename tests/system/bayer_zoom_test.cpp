@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "support/flat_camera.h"
+#include "support/log_file.h"
 #include "support/ratio_judge.h"
 
 namespace ZV::Test {
@@ -163,6 +164,23 @@ TEST_F(BayerZoomVert, KeptComputedRowsOfANarrowFrameKeepWhatTheBufferHeld) {
     }
 }
 
+TEST_F(BayerZoomVert, MayDoubleAMosaicInItsOwnBuffer) {
+    for (const std::uint32_t format : {zfmtBayer8, zfmtBayer16}) {
+        for (const std::uint32_t height : {3U, 4U, 6U, 9U}) {
+            Make(8, height, format);
+            std::copy_n(in.pixels.begin(), in.record.size, out.pixels.begin());
+            in.record.pBuffer = out.record.pBuffer;
+            in.record.bufferSize = out.record.bufferSize;
+
+            ASSERT_ZERR(zerrNone, Zoom());
+
+            const std::size_t count = 2 * samples.size();
+            EXPECT_EQ(Expect(0), GetSamples(out.pixels.data(), format, count)) << height;
+            EXPECT_TRUE(out.IsUntouched(count * GetSampleBytes(format))) << height;
+        }
+    }
+}
+
 TEST_F(BayerZoomVert, EveryAlgorithmButTheFastOneIsNotSupported) {
     for (const std::uint32_t algorithm : {0U, 1U, 3U, 4U, 5U, 0x10002U}) {
         Make(8, 6);
@@ -256,6 +274,26 @@ TEST_F(BayerZoomVert, AFrameWithoutPixelsIsDoubledToNothing) {
     EXPECT_ZERR(zerrNone, Zoom());
     EXPECT_EQ(0U, out.record.width);
     EXPECT_TRUE(out.IsUntouched());
+}
+
+class LoggedBayerZoomVert : public LogFile, public BayerZoomVert {};
+
+TEST_F(LoggedBayerZoomVert, WritesItsStartAndItsEndAlsoWhenItIsRefused) {
+    const auto expectRecords = [&](const std::string& end) {
+        const std::vector<std::string> expected = {"Zentara_BayerZoomVert start",
+                                                   "Zentara_BayerZoomVert " + end + "\n\n"};
+        EXPECT_EQ(expected, TakeTexts());
+    };
+    Make(8, 6);
+    (void)TakeTexts();
+
+    EXPECT_ZERR(zerrNone, Zoom());
+    expectRecords("end (error code 0)");
+    EXPECT_ZERR(zerrNotSupported, Zoom(zbayerAverage));
+    expectRecords("ending because the function is not supported for this device. (error 1)");
+    in.record.pBuffer = nullptr;
+    EXPECT_ZERR(zerrBadParameter, Zoom());
+    expectRecords("ending because one of the parameters used is not valid. (error 2)");
 }
 
 TEST(BayerZoomVertUnloaded, IsRefusedBeforeAnythingElse) {
