@@ -97,6 +97,30 @@ TEST_F(CaptureSettings, TheHeaderTellsTheSettingsInForce) {
               ReadFitsNumber(file.Get(), "GAIN"));
 }
 
+TEST_F(CaptureSettings, TheHeaderTellsTheBinningOfEachDirection) {
+    UseScenario("metrona");
+
+    const FitsFile file(
+        Grab("a.fits", {"--set", "horizontal-binning=4", "--set", "vertical-binning=2"}));
+
+    EXPECT_EQ(4, ReadFitsNumber(file.Get(), "XBINNING"));
+    EXPECT_EQ(2, ReadFitsNumber(file.Get(), "YBINNING"));
+}
+
+TEST_F(CaptureSettings, OnlyImagesOfThreeColoursAreToldToBePostProcessed) {
+    const auto isProcessed = [&](const std::string& path) {
+        int status = 0, truth = -1;
+        fits_read_key_log(FitsFile(path).Get(), "POSTPROC", &truth, nullptr, &status);
+        return truth;
+    };
+    const std::string colour = Grab("colour.fits", {"--colour"});
+    UseScenario("mono");
+    const std::string mono = Grab("mono.fits", {"--set", "do-post-processing=on"});
+
+    EXPECT_EQ(1, isProcessed(colour));
+    EXPECT_EQ(0, isProcessed(mono));
+}
+
 TEST_F(CaptureSettings, AStreamTakesSettingsToo) {
     const ProgramResult result = Run({"stream", "0", "-n", "2", "-o", folder.GetPath("s.fits"),
                                       "--set", "exposure=20ms", "--set", "roi-width=64"});
