@@ -35,10 +35,10 @@ struct EnlargeScratch {
 };
 
 /// Nearest takes the columns' and the rows' indices; the others the rows in use, and for columns
-/// and rows each the positions and three arrays of their plan.
+/// and rows each the positions and three arrays of their plan, a linear plan two more for its runs.
 constexpr EnlargeScratch EnlargeScratches[] = {
     {InterpolateNearest, 2},
-    {InterpolateLinear, 9},
+    {InterpolateLinear, 13},
     {InterpolateCubic, 9},
 };
 
