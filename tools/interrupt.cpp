@@ -1,14 +1,17 @@
 #include "interrupt.h"
 
+#include <atomic>
 #include <csignal>
 
 namespace ZentaraProgram {
 namespace {
 
-volatile std::sig_atomic_t interrupted = 0;
+// The handler runs on any thread, and other threads than that one ask.
+std::atomic<bool> interrupted = false;
+static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler may not wait for a lock");
 
 extern "C" void RememberInterrupt(int signal) {
-    interrupted = 1;
+    interrupted = true;
     (void)std::signal(signal, SIG_DFL);
 }
 
@@ -20,7 +23,7 @@ void CatchInterrupt() {
 }
 
 bool IsInterrupted() {
-    return interrupted != 0;
+    return interrupted;
 }
 
 }  // namespace ZentaraProgram

@@ -203,7 +203,8 @@ TEST_P(Measurements, AnInterruptEndsThemWithCode130) {
 
     program.Send(SIGINT);
 
-    EXPECT_EQ(130, program.Wait().exitCode);
+    const ProgramResult ended = program.Wait();
+    EXPECT_EQ(130, ended.exitCode) << ended.errors;
 }
 
 INSTANTIATE_TEST_SUITE_P(Commands, Measurements, testing::Values("white-balance", "auto-expose"),
@@ -225,7 +226,8 @@ TEST(GrabCommand, AnInterruptInTheWhiteBalanceLeavesNoFile) {
 
     program.Send(SIGINT);
 
-    EXPECT_EQ(130, program.Wait().exitCode);
+    const ProgramResult ended = program.Wait();
+    EXPECT_EQ(130, ended.exitCode) << ended.errors;
     EXPECT_THAT(ReadFile(path), IsEmpty());
 }
 
