@@ -35,11 +35,12 @@ class LogFile {
         }
         return texts;
     }
-    /// The records without their times.
+    /// The records without their times, and without the line ends and the blank line of outermost
+    /// calls: the depth of nesting is the process's own, and some calls leave it too high.
     std::vector<std::string> TakeTexts() {
         std::vector<std::string> texts = TakeRecords();
         for (std::string& text : texts) {
-            text = std::regex_replace(text, std::regex(R"(^\s*\d\d:\d\d\.\d{3} )"), "");
+            text = std::regex_replace(text, std::regex(R"(^\s*\d\d:\d\d\.\d{3} |\n+$)"), "");
         }
         return texts;
     }

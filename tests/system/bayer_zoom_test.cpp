@@ -281,7 +281,7 @@ class LoggedBayerZoomVert : public LogFile, public BayerZoomVert {};
 TEST_F(LoggedBayerZoomVert, WritesItsStartAndItsEndAlsoWhenItIsRefused) {
     const auto expectRecords = [&](const std::string& end) {
         const std::vector<std::string> expected = {"Zentara_BayerZoomVert start",
-                                                   "Zentara_BayerZoomVert " + end + "\n\n"};
+                                                   "Zentara_BayerZoomVert " + end};
         EXPECT_EQ(expected, TakeTexts());
     };
     Make(8, 6);
