@@ -1,0 +1,41 @@
+# The libraries around the driver library, under the same names on each system: image files, JSON, the command line.
+# The driver library itself links none of them.
+if(NOT WIN32)
+  if(ZENTARA_TOOLS)
+    find_package(CLI11 REQUIRED)
+    find_package(fmt REQUIRED)
+  endif()
+  find_package(nlohmann_json REQUIRED)
+  find_package(PNG REQUIRED)
+  find_package(TIFF REQUIRED)
+  find_package(PkgConfig REQUIRED)
+  pkg_check_modules(CFITSIO REQUIRED IMPORTED_TARGET cfitsio)
+  return()
+endif()
+
+set(ZENTARA_WINDOWS_LIBRARIES ${CMAKE_SOURCE_DIR}/build/windows-libraries CACHE PATH
+  "What scripts/build-windows-libraries has built")
+if(NOT EXISTS ${ZENTARA_WINDOWS_LIBRARIES}/stamp)
+  message(FATAL_ERROR "There are no libraries in ${ZENTARA_WINDOWS_LIBRARIES}: run scripts/build-windows-libraries")
+endif()
+
+# A static library, or headers alone where no file is named.
+function(zentara_import name file)
+  if(TARGET ${name})
+    return()
+  endif()
+  add_library(${name} INTERFACE IMPORTED)
+  target_include_directories(${name} SYSTEM INTERFACE ${ZENTARA_WINDOWS_LIBRARIES}/include)
+  if(file)
+    target_link_libraries(${name} INTERFACE ${ZENTARA_WINDOWS_LIBRARIES}/lib/${file} ${ARGN})
+  endif()
+endfunction()
+
+set(zlib /usr/x86_64-w64-mingw32/lib/libz.a)
+zentara_import(PNG::PNG libpng16.a ${zlib})
+zentara_import(TIFF::TIFF libtiff.a ${zlib})
+zentara_import(PkgConfig::CFITSIO libcfitsio.a ${zlib} pthread ws2_32)
+zentara_import(CLI11::CLI11 "")
+zentara_import(nlohmann_json::nlohmann_json "")
+zentara_import(fmt::fmt "")
+target_compile_definitions(fmt::fmt INTERFACE FMT_HEADER_ONLY)
