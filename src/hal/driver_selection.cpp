@@ -98,13 +98,11 @@ std::uint32_t ListClassDeviceIds(const std::uint8_t classId[16], std::uint32_t* 
 }
 
 std::uint32_t InstallDriverOnDevice(const char* instanceId, const char* infPath) {
-    if (instanceId == nullptr || infPath == nullptr) return HALOk;
     InstallDriver(instanceId, infPath, /*bySystemVersion=*/false, /*isVistaExactly=*/false);
     return HALOk;
 }
 
 std::uint32_t InstallDriverOnDeviceForOS(const char* instanceId, const char* infPath) {
-    if (instanceId == nullptr || infPath == nullptr) return HALOk;
     InstallDriver(instanceId, infPath, /*bySystemVersion=*/true, IsVistaExactly());
     return HALOk;
 }

@@ -36,7 +36,8 @@ std::uint32_t AppendClassDeviceIds(const std::uint8_t classId[16], std::uint32_t
 
 /// Installs the driver of the inf file at `infPath` on the device `instanceId`. With
 /// `bySystemVersion` the call depends on the version of the system: `isVistaExactly` selects the
-/// newer one. Progress and failures go to the debugger output alone.
+/// newer one. Progress and failures go to the debugger output alone. A null text is a step that
+/// fails: an id of no device, a path that does not fit.
 void InstallDriver(const char* instanceId, const char* infPath, bool bySystemVersion,
                    bool isVistaExactly);
 
