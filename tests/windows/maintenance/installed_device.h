@@ -16,9 +16,10 @@ inline constexpr GUID TestDeviceClass = {
 /// A device without a driver that the system's setup interface knows while the object lives.
 class InstalledDevice {
   public:
-    InstalledDevice() {
+    explicit InstalledDevice(const GUID& classId = TestDeviceClass)
+        : set(SetupDiCreateDeviceInfoList(&classId, nullptr)) {
         device.cbSize = sizeof device;
-        EXPECT_TRUE(SetupDiCreateDeviceInfoA(set, "ZENTARATEST", &TestDeviceClass, nullptr, nullptr,
+        EXPECT_TRUE(SetupDiCreateDeviceInfoA(set, "ZENTARATEST", &classId, nullptr, nullptr,
                                              DICD_GENERATE_ID, &device));
         EXPECT_TRUE(SetupDiSetDeviceRegistryPropertyA(set, &device, SPDRP_HARDWAREID, HardwareIds,
                                                       sizeof HardwareIds));
@@ -34,14 +35,13 @@ class InstalledDevice {
     InstalledDevice& operator=(const InstalledDevice&) = delete;
 
     [[nodiscard]] const char* GetInstanceId() const { return instanceId; }
-    [[nodiscard]] HDEVINFO GetSet() const { return set; }
-    [[nodiscard]] SP_DEVINFO_DATA* GetDevice() { return &device; }
+    [[nodiscard]] DEVINST GetNode() const { return device.DevInst; }
 
   private:
     /// A list of texts, ended by an empty one.
     static constexpr BYTE HardwareIds[] = "root\\zentara-test\0";
 
-    HDEVINFO set = SetupDiCreateDeviceInfoList(&TestDeviceClass, nullptr);
+    HDEVINFO set;
     SP_DEVINFO_DATA device{};
     char instanceId[260] = "";
 };

@@ -1,0 +1,270 @@
+#include <gtest/gtest.h>
+#include <windows.h>
+
+#include <shlobj.h>
+
+#include <cstdlib>
+#include <string>
+
+#include "hal/driver_selection.h"
+#include "hal/hal.h"
+#include "hal/platform/win32/maintenance_functions.h"
+#include "windows/support/child_process.h"
+
+namespace ZV::Test {
+namespace {
+
+std::string ReadMachineText(const char* key, const char* name) {
+    char text[MAX_PATH] = "";
+    DWORD bytes = sizeof text;
+    (void)RegGetValueA(HKEY_LOCAL_MACHINE, key, name, RRF_RT_ANY, nullptr, text, &bytes);
+    return text;
+}
+
+// ---- Folders ----
+
+TEST(CommonProgramFiles, AreWhereTheRegistryAndTheEnvironmentHaveThem) {
+    char path[260] = "";
+
+    GetCommonProgramFilesFolder(path);
+
+    EXPECT_EQ(path,
+              ReadMachineText("SOFTWARE\\Microsoft\\Windows\\CurrentVersion", "CommonFilesDir"));
+    EXPECT_STREQ(path, std::getenv("CommonProgramFiles"));
+}
+
+TEST(CommonProgramFiles, HoldTheInstallationFiles) {
+    const std::string folder = std::getenv("CommonProgramFiles");
+    const struct {
+        char* path;
+        const char* tail;
+    } rows[] = {
+        {GetInfPath(), "\\Morvane\\inf\\1394.inf"},
+        {GetUBInfPath(), "\\Morvane\\inf\\ub1394.inf"},
+        {GetUBHelperPath(), "\\Morvane\\UBHelper.exe"},
+    };
+
+    for (const auto& row : rows) {
+        ASSERT_NE(row.path, nullptr);
+        EXPECT_EQ(row.path, folder + row.tail);
+        EXPECT_EQ(HAL_MemoryFree(row.path), HALOk);
+    }
+}
+
+// ---- Privileges ----
+
+/// Whether the token of this process says so of its kind, which is another value than the one that
+/// the library asks for.
+bool IsElevatedByKind() {
+    HANDLE token = nullptr;
+    EXPECT_TRUE(OpenProcessToken(GetCurrentProcess(), TOKEN_QUERY, &token));
+    TOKEN_ELEVATION_TYPE kind{};
+    DWORD bytes = 0;
+    EXPECT_TRUE(GetTokenInformation(token, TokenElevationType, &kind, sizeof kind, &bytes));
+    CloseHandle(token);
+    return kind == TokenElevationTypeFull || (kind == TokenElevationTypeDefault && IsUserAnAdmin());
+}
+
+class PrivilegesOfTheProcess : public testing::Test {
+  protected:
+    MaintenanceFunctions functions = GetMaintenanceFunctions();
+};
+
+TEST_F(PrivilegesOfTheProcess, AreThoseOfAnAdministratorWhereTheShellSaysSo) {
+    EXPECT_EQ(IsAdministrator(), IsUserAnAdmin() != FALSE);
+}
+
+TEST_F(PrivilegesOfTheProcess, AreElevatedAsTheTokensKindSays) {
+    bool isElevated = !IsElevatedByKind();
+
+    EXPECT_EQ(IsNotElevated(&isElevated), !IsElevatedByKind());
+    EXPECT_EQ(isElevated, IsElevatedByKind());
+    EXPECT_EQ(IsNotElevated(nullptr), !IsElevatedByKind());
+}
+
+TEST_F(PrivilegesOfTheProcess, AreNotAnAdministratorsWhenTheGroupCannotBeNamed) {
+    functions.makeSid = [](PSID_IDENTIFIER_AUTHORITY, BYTE, DWORD, DWORD, DWORD, DWORD, DWORD,
+                           DWORD, DWORD, DWORD, PSID*) -> BOOL { return FALSE; };
+
+    EXPECT_FALSE(IsProcessAdministrator(functions));
+}
+
+TEST_F(PrivilegesOfTheProcess, AreAnAdministratorsByTheMembershipInTheBuiltInGroup) {
+    functions.checkMembership = [](HANDLE token, PSID group, PBOOL isMember) -> BOOL {
+        EXPECT_EQ(token, nullptr);
+        EXPECT_TRUE(IsWellKnownSid(group, WinBuiltinAdministratorsSid));
+        *isMember = TRUE;
+        return TRUE;
+    };
+    EXPECT_TRUE(IsProcessAdministrator(functions));
+
+    functions.checkMembership = [](HANDLE, PSID, PBOOL isMember) -> BOOL {
+        *isMember = FALSE;
+        return TRUE;
+    };
+    EXPECT_FALSE(IsProcessAdministrator(functions));
+
+    functions.checkMembership = [](HANDLE, PSID, PBOOL isMember) -> BOOL {
+        *isMember = TRUE;
+        return FALSE;
+    };
+    EXPECT_FALSE(IsProcessAdministrator(functions));
+}
+
+TEST_F(PrivilegesOfTheProcess, AreUnknownWithoutItsToken) {
+    bool isElevated = true;
+    functions.openProcessToken = [](HANDLE, DWORD access, PHANDLE) -> BOOL {
+        EXPECT_EQ(access, DWORD{TOKEN_QUERY});
+        return FALSE;
+    };
+
+    EXPECT_FALSE(QueryProcessElevation(functions, &isElevated));
+
+    EXPECT_TRUE(isElevated);
+}
+
+TEST_F(PrivilegesOfTheProcess, AreUnknownWhereTheTokenDoesNotTellAndTheTokenIsClosed) {
+    static HANDLE asked;
+    bool isElevated = true;
+    functions.getTokenInformation = [](HANDLE token, TOKEN_INFORMATION_CLASS kind, void*, DWORD,
+                                       PDWORD) -> BOOL {
+        EXPECT_EQ(kind, TokenElevation);
+        asked = token;
+        return FALSE;
+    };
+
+    EXPECT_FALSE(QueryProcessElevation(functions, &isElevated));
+
+    EXPECT_TRUE(isElevated);
+    DWORD flags = 0;
+    EXPECT_FALSE(GetHandleInformation(asked, &flags));
+}
+
+// ---- Version ----
+
+class VersionOfTheSystem : public testing::Test {
+  protected:
+    MaintenanceFunctions functions = GetMaintenanceFunctions();
+    SystemVersion version{7, 7, 7};
+};
+
+TEST_F(VersionOfTheSystem, IsThatOfTheNTFamilyWhichTheSystemGivesInOneWordToo) {
+    const DWORD word = GetVersion();
+
+    ASSERT_TRUE(QuerySystemVersion(&version));
+
+    EXPECT_EQ(version.platform, 2u);
+    EXPECT_EQ(version.major, word & 0xFFu);
+    EXPECT_EQ(version.minor, (word >> 8) & 0xFFu);
+}
+
+TEST_F(VersionOfTheSystem, IsReadFromTheBasicRecordWhereTheExtendedOneIsUnknown) {
+    functions.getVersion = [](OSVERSIONINFOA* record) -> BOOL {
+        if (record->dwOSVersionInfoSize == 156) return FALSE;
+        EXPECT_EQ(record->dwOSVersionInfoSize, 148u);
+        record->dwPlatformId = 2;
+        record->dwMajorVersion = 6;
+        record->dwMinorVersion = 0;
+        return TRUE;
+    };
+
+    ASSERT_TRUE(QuerySystemVersion(functions, &version));
+
+    EXPECT_TRUE(IsVistaExactly(version));
+}
+
+TEST_F(VersionOfTheSystem, IsUnknownWhereBothRecordsAre) {
+    functions.getVersion = [](OSVERSIONINFOA*) -> BOOL { return FALSE; };
+
+    EXPECT_FALSE(QuerySystemVersion(functions, &version));
+
+    EXPECT_EQ(version.major, 7u);
+}
+
+int ordinaryCount;
+int nativeCount;
+
+void WINAPI CountNative(SYSTEM_INFO*) {
+    ++nativeCount;
+}
+
+TEST_F(VersionOfTheSystem, KeptReadsTheNativeSystemInformationWhereThereIsSuchAFunction) {
+    ordinaryCount = nativeCount = 0;
+    functions.getSystemInfo = [](SYSTEM_INFO*) { ++ordinaryCount; };
+    functions.getProcAddress = [](HMODULE library, const char* name) {
+        EXPECT_EQ(library, GetModuleHandleA("kernel32.dll"));
+        EXPECT_STREQ(name, "GetNativeSystemInfo");
+        return reinterpret_cast<FARPROC>(reinterpret_cast<void*>(CountNative));
+    };
+
+    EXPECT_TRUE(QuerySystemVersion(functions, &version));
+    EXPECT_EQ(nativeCount, 1);
+    EXPECT_EQ(ordinaryCount, 0);
+
+    functions.getProcAddress = [](HMODULE, const char*) -> FARPROC { return nullptr; };
+    EXPECT_TRUE(QuerySystemVersion(functions, &version));
+    EXPECT_EQ(nativeCount, 1);
+    EXPECT_EQ(ordinaryCount, 1);
+}
+
+// ---- Version of another system ----
+
+constexpr UINT VistaExitCode = 60;
+constexpr UINT OtherExitCode = 61;
+
+TEST(VersionOfAChild, DISABLED_TellsByItsExitCode) {
+    ExitProcess(IsVistaExactly() ? VistaExitCode : OtherExitCode);
+}
+
+/// A copy of this program under a name of its own, for which Wine plays another system.
+class ProgramOnAnotherSystem {
+  public:
+    explicit ProgramOnAnotherSystem(const char* system) {
+        EXPECT_TRUE(CopyFileA(GetOwnPath().c_str(), GetPath().c_str(), FALSE));
+        EXPECT_EQ(RegSetKeyValueA(HKEY_CURRENT_USER, Key, "Version", REG_SZ, system,
+                                  static_cast<DWORD>(std::string(system).size() + 1)),
+                  ERROR_SUCCESS);
+    }
+    ~ProgramOnAnotherSystem() {
+        RegDeleteTreeA(HKEY_CURRENT_USER, Key);
+        DeleteFileA(GetPath().c_str());
+    }
+    ProgramOnAnotherSystem(const ProgramOnAnotherSystem&) = delete;
+    ProgramOnAnotherSystem& operator=(const ProgramOnAnotherSystem&) = delete;
+
+    [[nodiscard]] static UINT Run() {
+        ChildProcess child(GetPath(), "VersionOfAChild.DISABLED_TellsByItsExitCode");
+        return child.WaitForExitCode();
+    }
+
+  private:
+    static constexpr char Key[] = "Software\\Wine\\AppDefaults\\zentara-other-system.exe";
+
+    /// Beside this program, where its libraries are.
+    static std::string GetPath() {
+        const std::string own = GetOwnPath();
+        return own.substr(0, own.rfind('\\') + 1) + "zentara-other-system.exe";
+    }
+};
+
+TEST(VersionOfAnotherSystem, IsVistaForSixPointZeroAloneAndNotForALaterOne) {
+    if (GetProcAddress(GetModuleHandleA("ntdll.dll"), "wine_get_version") == nullptr) {
+        GTEST_SKIP() << "this system plays no other one";
+    }
+    constexpr struct {
+        const char* system;
+        UINT exitCode;
+    } Rows[] = {
+        {"winxp64", OtherExitCode}, {"vista", VistaExitCode}, {"win2008", VistaExitCode},
+        {"win7", OtherExitCode},    {"win10", OtherExitCode},
+    };
+
+    for (const auto& row : Rows) {
+        const ProgramOnAnotherSystem program(row.system);
+
+        EXPECT_EQ(ProgramOnAnotherSystem::Run(), row.exitCode) << row.system;
+    }
+}
+
+}  // namespace
+}  // namespace ZV::Test
