@@ -53,6 +53,34 @@ ZCamera::~ZCamera() {
     delete bayerFilter;
 }
 
+ZImagePipeline* ZCamera::GetImagePipeline() {
+    return imagePipeline;
+}
+
+ZImagePipeline* ZCamera::GetBayerPipeline() {
+    return bayerPipeline;
+}
+
+ZBayerInterpolation* ZCamera::GetBayerFilter() {
+    return bayerFilter;
+}
+
+ZFolaryRatioCorrection* ZCamera::GetFYRatioCorrectionFilter() {
+    return ratioCorrection;
+}
+
+void* ZCamera::GetRefCon() {
+    return refCon;
+}
+
+void ZCamera::SetRefCon(void* value) {
+    refCon = value;
+}
+
+bool ZCamera::DoWeHaveExclusiveAccess() {
+    return exclusiveAccess;
+}
+
 ZCamera::SerialNumberText ZCamera::CopySerialNumber() {
     (void)GetSerialNumberString();  // the text is read from the place where this puts it
     const std::lock_guard hold(serialMutex);

@@ -61,14 +61,14 @@ class ZENTARA_API ZCamera : public ZObject {
     static void SetShouldOutputReads(bool isOn);
     static void SetShouldOutputWrites(bool isOn);
 
-    ZImagePipeline* GetImagePipeline() { return imagePipeline; }
-    ZImagePipeline* GetBayerPipeline() { return bayerPipeline; }
-    ZBayerInterpolation* GetBayerFilter() { return bayerFilter; }
-    ZFolaryRatioCorrection* GetFYRatioCorrectionFilter() { return ratioCorrection; }
-    void* GetRefCon() { return refCon; }
-    void SetRefCon(void* value) { refCon = value; }
+    ZImagePipeline* GetImagePipeline();
+    ZImagePipeline* GetBayerPipeline();
+    ZBayerInterpolation* GetBayerFilter();
+    ZFolaryRatioCorrection* GetFYRatioCorrectionFilter();
+    void* GetRefCon();
+    void SetRefCon(void* value);
     /// Set only by a successful OpenCamera.
-    bool DoWeHaveExclusiveAccess() { return exclusiveAccess; }
+    bool DoWeHaveExclusiveAccess();
 
     // Lifetime.
     virtual CameraResult OpenCamera() = 0;

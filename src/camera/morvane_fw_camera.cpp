@@ -35,6 +35,15 @@ constexpr ConditionRow Conditions[] = {
 
 }  // namespace
 
+// Clients link to these by name, so that each has its place.
+const std::uint32_t MorvaneFWCamera::m_cameraModelAddress;
+const std::uint32_t MorvaneFWCamera::m_cameraModelAddressAlt;
+const std::uint16_t MorvaneFWCamera::m_cameraModelShift;
+const std::uint32_t MorvaneFWCamera::m_registersAddress;
+const std::uint32_t MorvaneFWCamera::m_bulkDataControlOffset;
+const std::uint32_t MorvaneFWCamera::m_asyncWriteAddressLow;
+const std::uint32_t MorvaneFWCamera::m_asyncWriteAddressLength;
+
 MorvaneFWCamera::MorvaneFWCamera(HALCamera newRecord) : halCamera(newRecord) {
     isOpen = newRecord.connected != 0;
     MakeSynchronisation();

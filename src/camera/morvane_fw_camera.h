@@ -20,13 +20,13 @@ struct BusConnection;
 /// HAL. Models override what they do differently.
 class ZENTARA_API MorvaneFWCamera : public ZCamera {
   public:
-    static constexpr std::uint32_t m_cameraModelAddress = 0xE0010038;
-    static constexpr std::uint32_t m_cameraModelAddressAlt = 0xE0001138;
-    static constexpr std::uint16_t m_cameraModelShift = 16;
-    static constexpr std::uint32_t m_registersAddress = 0xD0000000;
-    static constexpr std::uint32_t m_bulkDataControlOffset = 4;
-    static constexpr std::uint32_t m_asyncWriteAddressLow = 0xFA000000;
-    static constexpr std::uint32_t m_asyncWriteAddressLength = 4;
+    static const std::uint32_t m_cameraModelAddress = 0xE0010038;
+    static const std::uint32_t m_cameraModelAddressAlt = 0xE0001138;
+    static const std::uint16_t m_cameraModelShift = 16;
+    static const std::uint32_t m_registersAddress = 0xD0000000;
+    static const std::uint32_t m_bulkDataControlOffset = 4;
+    static const std::uint32_t m_asyncWriteAddressLow = 0xFA000000;
+    static const std::uint32_t m_asyncWriteAddressLength = 4;
 
     explicit MorvaneFWCamera(HALCamera newRecord);
     /// A copy owns nothing: no device, no registers, no threads. It serves for nothing else.

@@ -317,6 +317,18 @@ bool ZAutoWhiteBalance::AreMeansInBand(std::uint32_t bitDepth) const {
 
 // ---- Scales and tables ----
 
+float ZAutoWhiteBalance::GetRedScale() const {
+    return red.scale.load(std::memory_order_relaxed);
+}
+
+float ZAutoWhiteBalance::GetGreenScale() const {
+    return green.scale.load(std::memory_order_relaxed);
+}
+
+float ZAutoWhiteBalance::GetBlueScale() const {
+    return blue.scale.load(std::memory_order_relaxed);
+}
+
 void ZAutoWhiteBalance::SetRedScale(float scale) {
     const Change change{&red, scale};
     Exchange({&change, 1});

@@ -85,9 +85,9 @@ class ZENTARA_API ZAutoWhiteBalance : public ZImageFilter {
     std::uint32_t GetGreenMean() const { return greenMean.load(std::memory_order_relaxed); }
     std::uint32_t GetBlueMean() const { return blueMean.load(std::memory_order_relaxed); }
 
-    float GetRedScale() const { return red.scale.load(std::memory_order_relaxed); }
-    float GetGreenScale() const { return green.scale.load(std::memory_order_relaxed); }
-    float GetBlueScale() const { return blue.scale.load(std::memory_order_relaxed); }
+    float GetRedScale() const;
+    float GetGreenScale() const;
+    float GetBlueScale() const;
     /// Each builds both tables of its colour anew, which then take the place of the old ones at
     /// once: a frame is balanced by the old tables or by the new ones. Thread-safe.
     void SetRedScale(float scale);

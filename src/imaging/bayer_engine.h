@@ -6,7 +6,6 @@
 #include "imaging/kernels/enlarge_rows.h"
 #include "imaging/kernels/kernels.h"
 #include "imaging/pixel_buffer.h"
-#include "zentara/zentara.h"
 
 namespace ZV {
 
@@ -34,7 +33,7 @@ struct BayerTarget {
 ///
 /// The last column and row of an odd size have no part in it: those of the image repeat their
 /// neighbours. A mosaic of a single row or column has no cell, and its image is black.
-class ZENTARA_API BayerEngine {
+class BayerEngine {
   public:
     /// Bytes of the image that the engine for samples of 1 or 2 bytes makes of a mosaic of this
     /// size: 0 for no pixels, and where it refuses the format or the size.

@@ -38,7 +38,107 @@ ZExImage::ZExImage(std::uint8_t* newImageData, std::uint32_t newImageSize, std::
     if (newOwnsBuffer && newImageData != nullptr) ownedBuffer.reset(newImageData, std::free);
 }
 
+ZExImage::ZExImage(const ZExImage& other) = default;
+
+ZExImage& ZExImage::operator=(const ZExImage& other) = default;
+
 ZExImage::~ZExImage() = default;
+
+std::uint8_t* ZExImage::GetImageData() const {
+    return imageData;
+}
+
+std::uint32_t ZExImage::GetImageSize() const {
+    return imageSize;
+}
+
+std::uint32_t ZExImage::GetWidth() const {
+    return width;
+}
+
+std::uint32_t ZExImage::GetHeight() const {
+    return height;
+}
+
+std::uint16_t ZExImage::GetBitDepth() const {
+    return bitDepth;
+}
+
+std::uint64_t ZExImage::GetExposure() const {
+    return exposure;
+}
+
+double ZExImage::GetGain() const {
+    return gain;
+}
+
+std::uint32_t ZExImage::GetImageFormat() const {
+    return imageFormat;
+}
+
+std::uint16_t ZExImage::GetCameraImageFormat() const {
+    return cameraImageFormat;
+}
+
+std::uint16_t ZExImage::GetColourPattern() const {
+    return colourPattern;
+}
+
+std::uint16_t ZExImage::GetRGBFilterStartColour() const {
+    return rgbFilterStartColour;
+}
+
+bool ZExImage::IsBigEndian() const {
+    return isBigEndian;
+}
+
+std::uint16_t ZExImage::GetCameraModel() const {
+    return cameraModel;
+}
+
+std::uint16_t ZExImage::GetCameraNumber() const {
+    return cameraNumber;
+}
+
+std::uint16_t ZExImage::GetSymmetricalBinningMode() const {
+    return symmetricalBinningMode;
+}
+
+bool ZExImage::IsRTV() const {
+    return isRTV;
+}
+
+std::uint16_t ZExImage::GetRollingFrameNumber() const {
+    return rollingFrameNumber;
+}
+
+std::uint16_t ZExImage::GetErrorCode() const {
+    return errorCode;
+}
+
+void* ZExImage::GetCamera() const {
+    return camera;
+}
+
+void ZExImage::SetImageFormat(std::uint32_t newFormat) {
+    imageFormat = newFormat;
+}
+
+void ZExImage::SetImageSize(std::uint32_t newSize) {
+    imageSize = newSize;
+}
+
+void ZExImage::SetCameraImageFormat(ZCameraImageFormatEnum newFormat) {
+    cameraImageFormat = newFormat;
+}
+
+void ZExImage::SetWidth(std::uint16_t newWidth) {
+    width = newWidth;
+}
+
+void ZExImage::SetHeight(std::uint16_t newHeight) {
+    height = newHeight;
+}
 
 void ZExImage::ReplaceImageBufferWith(const std::uint8_t* data, std::uint32_t size) {
     // Kept: an equal size copies nothing, so a client that replaces pixels one for one keeps the

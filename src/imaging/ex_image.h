@@ -24,38 +24,39 @@ class ZENTARA_API ZExImage : public ZObject {
              std::uint16_t cameraModel, std::uint16_t cameraNumber,
              std::uint16_t symmetricalBinningMode, bool isRTV, std::uint16_t rollingFrameNumber,
              std::uint16_t errorCode, void* camera, bool ownsBuffer);
-    ZExImage(const ZExImage& other) = default;
-    ZExImage& operator=(const ZExImage& other) = default;
+    ZExImage(const ZExImage& other);
+    ZExImage& operator=(const ZExImage& other);
     virtual ~ZExImage();
 
-    std::uint8_t* GetImageData() const { return imageData; }
-    std::uint32_t GetImageSize() const { return imageSize; }
-    std::uint32_t GetWidth() const { return width; }
-    std::uint32_t GetHeight() const { return height; }
-    std::uint16_t GetBitDepth() const { return bitDepth; }
-    std::uint64_t GetExposure() const { return exposure; }  ///< Nanoseconds.
-    double GetGain() const { return gain; }
-    std::uint32_t GetImageFormat() const { return imageFormat; }
-    std::uint16_t GetCameraImageFormat() const { return cameraImageFormat; }
-    std::uint16_t GetColourPattern() const { return colourPattern; }
-    std::uint16_t GetRGBFilterStartColour() const { return rgbFilterStartColour; }
-    bool IsBigEndian() const { return isBigEndian; }
-    std::uint16_t GetCameraModel() const { return cameraModel; }
-    std::uint16_t GetCameraNumber() const { return cameraNumber; }
-    std::uint16_t GetSymmetricalBinningMode() const { return symmetricalBinningMode; }
-    bool IsRTV() const { return isRTV; }
-    std::uint16_t GetRollingFrameNumber() const { return rollingFrameNumber; }
-    std::uint16_t GetErrorCode() const { return errorCode; }
-    void* GetCamera() const { return camera; }
+    // None of these is inline: clients link to them by name.
+    std::uint8_t* GetImageData() const;
+    std::uint32_t GetImageSize() const;
+    std::uint32_t GetWidth() const;
+    std::uint32_t GetHeight() const;
+    std::uint16_t GetBitDepth() const;
+    std::uint64_t GetExposure() const;  ///< Nanoseconds.
+    double GetGain() const;
+    std::uint32_t GetImageFormat() const;
+    std::uint16_t GetCameraImageFormat() const;
+    std::uint16_t GetColourPattern() const;
+    std::uint16_t GetRGBFilterStartColour() const;
+    bool IsBigEndian() const;
+    std::uint16_t GetCameraModel() const;
+    std::uint16_t GetCameraNumber() const;
+    std::uint16_t GetSymmetricalBinningMode() const;
+    bool IsRTV() const;
+    std::uint16_t GetRollingFrameNumber() const;
+    std::uint16_t GetErrorCode() const;
+    void* GetCamera() const;
 
     /// Bytes that the buffer really holds, whatever `SetImageSize` has said.
     std::uint32_t GetBufferBytes() const { return bufferBytes; }
 
-    void SetImageFormat(std::uint32_t newFormat) { imageFormat = newFormat; }
-    void SetImageSize(std::uint32_t newSize) { imageSize = newSize; }
-    void SetCameraImageFormat(ZCameraImageFormatEnum newFormat) { cameraImageFormat = newFormat; }
-    void SetWidth(std::uint16_t newWidth) { width = newWidth; }
-    void SetHeight(std::uint16_t newHeight) { height = newHeight; }
+    void SetImageFormat(std::uint32_t newFormat);
+    void SetImageSize(std::uint32_t newSize);
+    void SetCameraImageFormat(ZCameraImageFormatEnum newFormat);
+    void SetWidth(std::uint16_t newWidth);
+    void SetHeight(std::uint16_t newHeight);
 
     /// Gives the image a copy of `size` bytes at `data`. Nothing happens when `size` equals the
     /// present size: the old pixels stay. A size of 0 gives an empty buffer; null data or no memory

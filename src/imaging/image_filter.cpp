@@ -2,6 +2,8 @@
 
 namespace ZV {
 
+ZImageFilter::ZImageFilter() = default;
+
 ZImageFilter::~ZImageFilter() = default;
 
 void ZImageFilter::Reset() {}

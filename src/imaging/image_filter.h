@@ -68,7 +68,7 @@ class ZENTARA_API ZImageFilter : public ZObject {
     virtual std::uint32_t GetNeededOutputBufferSize(ZInImageBufferStruct* in);
 
   protected:
-    ZImageFilter() = default;
+    ZImageFilter();
 
   private:
     std::atomic<bool> enabled{true};
