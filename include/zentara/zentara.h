@@ -66,10 +66,13 @@
 #include <stddef.h>
 #include <stdint.h>
 
-/** Marks what leaves the library. The one platform test of the project above its platform seam. */
+/**
+ * Marks what leaves the library; the DLL exports it by its list of names. The one platform test of
+ * the project above its platform seam.
+ */
 #if defined(_WIN32)
 #if defined(ZENTARA_BUILDING_LIBRARY)
-#define ZENTARA_API __declspec(dllexport)
+#define ZENTARA_API
 #else
 #define ZENTARA_API __declspec(dllimport)
 #endif
