@@ -5,7 +5,10 @@
 namespace ZV {
 
 void WriteDebuggerOutput(const char* text) {
-    if (text != nullptr) OutputDebugStringA(text);
+    if (text == nullptr) return;
+    const DWORD savedError = GetLastError();
+    OutputDebugStringA(text);
+    SetLastError(savedError);
 }
 
 }  // namespace ZV
