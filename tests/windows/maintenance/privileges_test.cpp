@@ -233,7 +233,8 @@ class ProgramOnAnotherSystem {
     ProgramOnAnotherSystem& operator=(const ProgramOnAnotherSystem&) = delete;
 
     [[nodiscard]] static UINT Run() {
-        ChildProcess child(GetPath(), "VersionOfAChild.DISABLED_TellsByItsExitCode");
+        const ChildProcess child("VersionOfAChild.DISABLED_TellsByItsExitCode",
+                                 {.program = GetPath()});
         return child.WaitForExitCode();
     }
 

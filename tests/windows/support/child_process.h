@@ -13,21 +13,41 @@ namespace ZV::Test {
     return path;
 }
 
-/// A test of a suite, this one or another, in a process of its own. A disabled test runs too: it is
+/// A word that a test gives to its child.
+inline constexpr char ChildWordVariable[] = "ZENTARA_TEST_CHILD_WORD";
+
+[[nodiscard]] inline std::string GetChildWord() {
+    char word[MAX_PATH] = "";
+    (void)GetEnvironmentVariableA(ChildWordVariable, word, sizeof word);
+    return word;
+}
+
+/// A test of a suite in a process of its own, with a word for it. A disabled test runs too: it is
 /// one that makes sense as a child alone.
 class ChildProcess {
   public:
-    ChildProcess(const std::string& program, const std::string& test) {
+    struct Options {
+        std::string program = GetOwnPath();
+        std::string word = {};
+        HANDLE standardOutput = GetStdHandle(STD_OUTPUT_HANDLE);
+    };
+
+    ChildProcess(const std::string& test, const Options& options) {
         std::string line =
-            "\"" + program +
+            "\"" + options.program +
             "\" --gtest_brief=1 --gtest_also_run_disabled_tests --gtest_filter=" + test;
         STARTUPINFOA start{};
         start.cb = sizeof start;
-        EXPECT_TRUE(CreateProcessA(program.c_str(), line.data(), nullptr, nullptr,
+        start.dwFlags = STARTF_USESTDHANDLES;
+        start.hStdInput = GetStdHandle(STD_INPUT_HANDLE);
+        start.hStdOutput = options.standardOutput;
+        start.hStdError = GetStdHandle(STD_ERROR_HANDLE);
+        SetEnvironmentVariableA(ChildWordVariable, options.word.c_str());
+        EXPECT_TRUE(CreateProcessA(options.program.c_str(), line.data(), nullptr, nullptr,
                                    /*bInheritHandles=*/TRUE, 0, nullptr, nullptr, &start, &process))
             << GetLastError();
+        SetEnvironmentVariableA(ChildWordVariable, nullptr);
     }
-    explicit ChildProcess(const std::string& test) : ChildProcess(GetOwnPath(), test) {}
     /// Ends a child that still runs.
     ~ChildProcess() {
         if (process.hProcess == nullptr) return;
@@ -38,8 +58,12 @@ class ChildProcess {
     ChildProcess(const ChildProcess&) = delete;
     ChildProcess& operator=(const ChildProcess&) = delete;
 
+    [[nodiscard]] DWORD GetId() const { return process.dwProcessId; }
+    [[nodiscard]] bool HasEnded() const {
+        return WaitForSingleObject(process.hProcess, 0) == WAIT_OBJECT_0;
+    }
     /// 0 for a test that passed.
-    [[nodiscard]] DWORD WaitForExitCode() {
+    [[nodiscard]] DWORD WaitForExitCode() const {
         DWORD code = STILL_ACTIVE;
         EXPECT_EQ(WaitForSingleObject(process.hProcess, DeadlineMs), DWORD{WAIT_OBJECT_0});
         GetExitCodeProcess(process.hProcess, &code);
