@@ -7,8 +7,9 @@
 
 #include "diagnostics/log.h"
 #include "diagnostics/log_state.h"
+#include "support/debugger_output.h"
 #include "support/log_text.h"
-#include "support/scoped_variable.h"
+#include "support/stored_settings.h"
 #include "support/temporary_folder.h"
 
 namespace ZV::Test {
@@ -26,7 +27,7 @@ class OpenLog : public testing::Test {
 
     /// Opens the log with a store of these lines.
     void Open(std::string_view lines) const {
-        folder.WriteFile("zentara.conf", lines);
+        settings.Write(lines);
         ZLogOpen();
     }
     /// The same with the log on, to its file, and with further lines.
@@ -36,15 +37,15 @@ class OpenLog : public testing::Test {
     }
     std::string GetFilePath() const { return folder.GetPath("log.txt"); }
     std::string ReadFile() const { return folder.ReadFile("log.txt"); }
-    std::string ReadDebuggerOutput() const { return folder.ReadFile("debugger.txt"); }
+    std::string ReadDebuggerOutput() const { return debugger.Read(); }
     /// The file's records for a reader.
     std::string DescribeFile() const { return DescribeLog(ReadFile()); }
 
     TemporaryFolder folder;
+    StoredSettings settings;
 
   private:
-    ScopedVariable config{"ZENTARA_CONFIG", folder.GetPath("zentara.conf").c_str()};
-    ScopedVariable debugger{"ZENTARA_DEBUG_OUTPUT", folder.GetPath("debugger.txt").c_str()};
+    DebuggerOutput debugger;
 };
 
 }  // namespace ZV::Test

@@ -4,10 +4,8 @@
 
 #include <algorithm>
 #include <atomic>
-#include <cstdlib>
 #include <cstring>
-#include <filesystem>
-#include <fstream>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -17,8 +15,7 @@
 #include "hal/open_camera_table.h"
 #include "hal/stream_format.h"
 #include "hal/table_lock.h"
-#include "support/scoped_variable.h"
-#include "support/temporary_folder.h"
+#include "support/stored_settings.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
@@ -71,10 +68,7 @@ struct AdapterCamera : testing::Test {
 
     /// Bytes that a request offers to the source while `stored` packets are stored.
     std::uint32_t GetCapacityWith(const char* stored) {
-        const TemporaryFolder folder;
-        const auto path = folder.GetPath("settings");
-        std::ofstream(path) << "MaxPacketsPerRequest = " << stored << "\n";
-        const ScopedVariable config("ZENTARA_CONFIG", path.c_str());
+        const StoredSettings settings(std::string("MaxPacketsPerRequest = ") + stored + "\n");
         OnePacket source;
         source.isSent = true;
         SetAdapterPacketSource({OnePacket::Get, &source});
@@ -144,7 +138,7 @@ TEST_F(AdapterCamera, WithAFullTableACameraIsSimplyNotRecorded) {
 }
 
 TEST_F(AdapterCamera, TheLastDisconnectMakesADriverSwitchDue) {
-    setenv("ZENTARA_CONFIG", "/nowhere/zentara.conf", 1);
+    const StoredSettings missing;
     HALCamera second = MakeAdapterCamera(0, 2);
     ASSERT_EQ(HALOk, Connect(&camera));
     ASSERT_EQ(HALOk, Connect(&second));
@@ -155,7 +149,6 @@ TEST_F(AdapterCamera, TheLastDisconnectMakesADriverSwitchDue) {
     EXPECT_TRUE(DriverSwitchDue());
 
     (void)HAL_CameraRelease(&second);
-    unsetenv("ZENTARA_CONFIG");
 }
 
 TEST_F(AdapterCamera, AStreamFeedsTheAssemblerFromItsSource) {

@@ -2,42 +2,21 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
-#include <filesystem>
-#include <fstream>
 #include <string>
 
 #include "hal/hal.h"
 #include "hal/open_camera_table.h"
 #include "hal/table_lock.h"
+#include "support/stored_settings.h"
 
 namespace ZV::Test {
 namespace {
-
-/// A settings store of its own, at first not there.
-class OwnSettings {
-  public:
-    OwnSettings() {
-        std::string folder = (std::filesystem::temp_directory_path() / "zentara-XXXXXX").string();
-        path = std::filesystem::path(mkdtemp(folder.data())) / "zentara.conf";
-        setenv("ZENTARA_CONFIG", path.c_str(), 1);
-    }
-    ~OwnSettings() {
-        unsetenv("ZENTARA_CONFIG");
-        std::error_code ignored;
-        std::filesystem::remove_all(path.parent_path(), ignored);
-    }
-    void Write(const std::string& text) { std::ofstream(path) << text; }
-
-  private:
-    std::filesystem::path path;
-};
 
 struct DriverSelection : testing::Test {
     ~DriverSelection() override { SetLastCameraFlag(false); }
 
     TableLock lock;
-    OwnSettings settings;
+    StoredSettings settings;
 };
 
 TEST_F(DriverSelection, NoSwitchIsDueBeforeALastCameraHasClosed) {

@@ -6,11 +6,11 @@
 #include <vector>
 
 #include "hal/control_records.h"
-#include "hal/debug_output_file.h"
 #include "hal/fw_camera.h"
 #include "hal/fw_device_context.h"
 #include "hal/hal_world.h"
 #include "hal/platform/last_error.h"
+#include "support/debugger_output.h"
 
 namespace ZV::Test {
 namespace {
@@ -263,7 +263,7 @@ TEST_F(FWCameraConnection, AReleaseClosesADeviceThatIsStillOpen) {
 }
 
 TEST_F(FWCameraConnection, TheDebuggerOutputTellsOfTheBandwidth) {
-    DebugOutputFile output(mono.world.GetFolder());
+    DebuggerOutput output;
     ASSERT_TRUE(mono.world.AddFault(FailRequest("FW_IOCTL_ALLOC_BANDWIDTH")));
 
     (void)ConnectPlain(camera, 100);

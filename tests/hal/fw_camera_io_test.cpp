@@ -8,9 +8,9 @@
 #include <vector>
 
 #include "hal/control_records.h"
-#include "hal/debug_output_file.h"
 #include "hal/fw_device_context.h"
 #include "hal/hal_world.h"
+#include "support/debugger_output.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
@@ -315,7 +315,7 @@ bool IsTime(const std::string& text) {
 }
 
 struct RegisterTrace : FWCameraIO {
-    RegisterTrace() : output(mono.world.GetFolder()) {
+    RegisterTrace() {
         (void)HAL_CameraSetShouldOutputReads(0, 0);
         (void)HAL_CameraSetShouldOutputWrites(0, 0);
     }
@@ -335,7 +335,7 @@ struct RegisterTrace : FWCameraIO {
         return text;
     }
 
-    DebugOutputFile output;
+    DebuggerOutput output;
 };
 
 TEST_F(RegisterTrace, AWriteShowsTheValuesBeforeTheirReversal) {

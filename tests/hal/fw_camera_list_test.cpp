@@ -5,9 +5,9 @@
 #include <vector>
 
 #include "hal/control_records.h"
-#include "hal/debug_output_file.h"
 #include "hal/hal_world.h"
 #include "hal/platform/last_error.h"
+#include "support/debugger_output.h"
 
 namespace ZV::Test {
 namespace {
@@ -125,7 +125,7 @@ TEST(FWCameraList, AnIdentityThatIsAnsweredAtOnceStaysInBusOrder) {
 
 TEST(FWCameraList, TheDebuggerOutputTellsTheCount) {
     HALWorld held("held");
-    DebugOutputFile output(held.world.GetFolder());
+    DebuggerOutput output;
 
     ASSERT_EQ(HALOk, held.List());
 
@@ -226,7 +226,7 @@ TEST(FWCameraList, ALongerPathIsCutAndDoesNotOpen) {
 TEST(FWCameraList, APathAboveTheRecordEndsTheWalkAndFailsAfterTheDevicesBeforeItAreProbed) {
     for (const std::uint32_t length : {259u, 4096u}) {
         HALWorld two(MakePathScenario(length));
-        DebugOutputFile output(two.world.GetFolder());
+        DebuggerOutput output;
 
         EXPECT_EQ(HALDeviceNotOpen, two.List());
 

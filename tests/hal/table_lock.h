@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstdint>
+
 namespace ZV::Test {
 
 /// Keeps other processes of this suite away from the system-wide open-camera table for its life.
@@ -11,7 +13,7 @@ class TableLock {
     TableLock& operator=(const TableLock&) = delete;
 
   private:
-    int file = -1;
+    std::intptr_t file = -1;
 };
 
 }  // namespace ZV::Test

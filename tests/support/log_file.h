@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "support/scoped_variable.h"
+#include "support/stored_settings.h"
 #include "support/temporary_folder.h"
 
 namespace ZV::Test {
@@ -16,14 +16,9 @@ class LogFile {
   protected:
     /// `switches`: further lines of the configuration.
     explicit LogFile(const std::string& switches = {})
-        : config(
-              "ZENTARA_CONFIG",
-              folder
-                  .WriteFile("zentara.conf",
-                             "outputEnabled = 1\noutputToFile = 1\noutputSettings = 1\n"
-                             "outputNestedCalls = 1\n" +
-                                 switches + "outputFilePath = " + folder.GetPath("log.txt") + "\n")
-                  .c_str()) {}
+        : settings(
+              "outputEnabled = 1\noutputToFile = 1\noutputSettings = 1\noutputNestedCalls = 1\n" +
+              switches + "outputFilePath = " + folder.GetPath("log.txt") + "\n") {}
 
     /// Texts of the messages of `function` since the last call.
     std::vector<std::string> TakeMessages(const std::string& function) {
@@ -59,7 +54,7 @@ class LogFile {
 
     TemporaryFolder folder;
     std::size_t taken = 0;
-    ScopedVariable config;
+    StoredSettings settings;
 };
 
 }  // namespace ZV::Test

@@ -3,6 +3,8 @@
 #include <cstdlib>
 #include <string>
 
+#include "support/environment_variable.h"
+
 namespace ZV::Test {
 
 /// A variable of the environment for the life of the object; null removes it. The former value
@@ -20,13 +22,7 @@ class ScopedVariable {
     ScopedVariable(const ScopedVariable&) = delete;
     ScopedVariable& operator=(const ScopedVariable&) = delete;
 
-    void Set(const char* value) const {
-        if (value != nullptr) {
-            setenv(name.c_str(), value, 1);
-        } else {
-            unsetenv(name.c_str());
-        }
-    }
+    void Set(const char* value) const { SetVariable(name.c_str(), value); }
 
   private:
     std::string name;

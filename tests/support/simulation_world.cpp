@@ -1,12 +1,12 @@
 #include "support/simulation_world.h"
 
-#include <cstdlib>
 #include <cstring>
 #include <fstream>
 #include <nlohmann/json.hpp>
 
 #include "hal/control_records.h"
 #include "hal/platform/kernel_driver.h"
+#include "support/environment_variable.h"
 
 extern "C" const ZV::KernelDriver* ZentaraSimulation_GetKernelDriver(std::uint32_t version);
 
@@ -134,12 +134,12 @@ std::uint64_t CalculateChecksum(const void* bytes, std::size_t count) {
 
 SimulationWorld::SimulationWorld(std::string_view scenario) {
     std::ofstream(GetScenarioPath()) << MakeDocument(scenario).dump(2);
-    setenv(Variable, GetScenarioPath().c_str(), 1);
+    SetVariable(Variable, GetScenarioPath().c_str());
 }
 
 SimulationWorld::~SimulationWorld() {
     End();
-    unsetenv(Variable);
+    SetVariable(Variable, nullptr);
 }
 
 std::string SimulationWorld::GetScenarioPath() const {

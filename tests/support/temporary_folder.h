@@ -3,10 +3,10 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <random>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -17,9 +17,13 @@ namespace ZV::Test {
 class TemporaryFolder {
   public:
     TemporaryFolder() {
-        std::string pattern = (std::filesystem::temp_directory_path() / "zentara-XXXXXX").string();
-        if (mkdtemp(pattern.data()) == nullptr) ADD_FAILURE() << "no folder " << pattern;
-        path = pattern;
+        std::random_device random;
+        std::error_code failure;
+        do {
+            const std::string name = "zentara-" + std::to_string(random());
+            path = std::filesystem::temp_directory_path() / name;
+        } while (!std::filesystem::create_directory(path, failure) && !failure);
+        if (failure) ADD_FAILURE() << "no folder " << path;
     }
     ~TemporaryFolder() {
         std::error_code ignored;

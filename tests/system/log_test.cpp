@@ -9,7 +9,7 @@
 
 #include "support/flat_camera.h"
 #include "support/log_text.h"
-#include "support/scoped_variable.h"
+#include "support/stored_settings.h"
 #include "support/temporary_folder.h"
 
 // The log as a client's user sees it: switches in the settings store, a file at the end. Each
@@ -26,12 +26,8 @@ constexpr char AllDumps[] =
 class LoggedWorld {
   public:
     explicit LoggedWorld(const std::string& switches)
-        : config("ZENTARA_CONFIG", folder
-                                       .WriteFile("zentara.conf",
-                                                  "outputEnabled = 1\noutputToFile = 1\n"
-                                                  "outputFilePath = " +
-                                                      folder.GetPath("log.txt") + "\n" + switches)
-                                       .c_str()) {}
+        : settings("outputEnabled = 1\noutputToFile = 1\noutputFilePath = " +
+                   folder.GetPath("log.txt") + "\n" + switches) {}
 
     /// The records, without the number of the frame, which depends on how far the camera was.
     std::string DescribeFile() const {
@@ -41,7 +37,7 @@ class LoggedWorld {
 
   private:
     TemporaryFolder folder;
-    ScopedVariable config;
+    StoredSettings settings;
     SimulationWorld world{SmallMono};
 };
 

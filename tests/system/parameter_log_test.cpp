@@ -7,8 +7,8 @@
 
 #include "support/flat_camera.h"
 #include "support/parameter_worlds.h"
-#include "support/scoped_variable.h"
 #include "support/settings_words.h"
+#include "support/stored_settings.h"
 
 // What the functions of parameters and information print to the log. Calls inside calls are shown,
 // so that the depth that earlier tests left does not matter.
@@ -22,8 +22,8 @@ class ParameterLog : public OpenedCamera {
   protected:
     explicit ParameterLog(std::string_view scenario = SmallColour)
         : OpenedCamera(scenario),
-          logPath(world.GetFolder() / "log.txt"),
-          config("ZENTARA_CONFIG", WriteSwitches().c_str()) {}
+          logPath((world.GetFolder() / "log.txt").string()),
+          settings(ListSwitches()) {}
 
     void SetUp() override {
         OpenedCamera::SetUp();
@@ -45,13 +45,10 @@ class ParameterLog : public OpenedCamera {
     Zentara_Settings block{};
 
   private:
-    std::string WriteSwitches() const {
-        std::string path = world.GetFolder() / "zentara.conf";
-        std::ofstream(path)
-            << "outputEnabled = 1\noutputSettings = 1\noutputSparseTable = 1\n"
-               "outputGetInfo = 1\noutputNestedCalls = 1\noutputToFile = 1\noutputFilePath = "
-            << logPath << "\n";
-        return path;
+    std::string ListSwitches() const {
+        return "outputEnabled = 1\noutputSettings = 1\noutputSparseTable = 1\n"
+               "outputGetInfo = 1\noutputNestedCalls = 1\noutputToFile = 1\noutputFilePath = " +
+               logPath + "\n";
     }
     std::string ReadLog() const {
         std::ifstream file(logPath, std::ios::binary);
@@ -61,7 +58,7 @@ class ParameterLog : public OpenedCamera {
     }
 
     const std::string logPath;
-    const ScopedVariable config;
+    const StoredSettings settings;
     std::size_t shown = 0;
 };
 
