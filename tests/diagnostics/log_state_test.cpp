@@ -60,7 +60,7 @@ class LogSwitches : public Test::OpenLog {
     ~LogSwitches() override { Zentara_ReleaseDriver(); }
 
     void Load(std::string_view lines) const {
-        settings.Write(lines);
+        stored.Write(lines);
         ASSERT_ZERR(zerrNone, Zentara_LoadDriver());
     }
 
@@ -68,7 +68,7 @@ class LogSwitches : public Test::OpenLog {
 };
 
 TEST_F(LogSwitches, AreOffWithoutAStore) {
-    settings.Remove();
+    stored.Remove();
     ASSERT_ZERR(zerrNone, Zentara_LoadDriver());
 
     EXPECT_EQ(0, GetOutputReads());

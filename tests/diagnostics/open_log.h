@@ -27,7 +27,7 @@ class OpenLog : public testing::Test {
 
     /// Opens the log with a store of these lines.
     void Open(std::string_view lines) const {
-        settings.Write(lines);
+        stored.Write(lines);
         ZLogOpen();
     }
     /// The same with the log on, to its file, and with further lines.
@@ -42,7 +42,7 @@ class OpenLog : public testing::Test {
     std::string DescribeFile() const { return DescribeLog(ReadFile()); }
 
     TemporaryFolder folder;
-    StoredSettings settings;
+    StoredSettings stored;
 
   private:
     DebuggerOutput debugger;

@@ -16,7 +16,7 @@ class LogFile {
   protected:
     /// `switches`: further lines of the configuration.
     explicit LogFile(const std::string& switches = {})
-        : settings(
+        : stored(
               "outputEnabled = 1\noutputToFile = 1\noutputSettings = 1\noutputNestedCalls = 1\n" +
               switches + "outputFilePath = " + folder.GetPath("log.txt") + "\n") {}
 
@@ -54,7 +54,7 @@ class LogFile {
 
     TemporaryFolder folder;
     std::size_t taken = 0;
-    StoredSettings settings;
+    StoredSettings stored;
 };
 
 }  // namespace ZV::Test
