@@ -2,24 +2,14 @@
 
 #include <atomic>
 #include <cstdint>
-#include <fstream>
 #include <functional>
-#include <string>
 #include <utility>
 
 #include "hal/platform/thread.h"
+#include "support/system_threads.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
-
-/// True while the thread `id` of this process sleeps in the system.
-inline bool IsAsleep(std::uint32_t id) {
-    std::ifstream file("/proc/self/task/" + std::to_string(id) + "/stat");
-    std::string line;
-    std::getline(file, line);
-    const std::size_t name = line.rfind(')');
-    return name != std::string::npos && line.compare(name, 3, ") S") == 0;
-}
 
 /// A thread of the seam that runs a function; the destructor waits for its end.
 class TestThread {

@@ -2,29 +2,22 @@
 
 #include <gtest/gtest.h>
 
-#include <fstream>
-#include <iterator>
 #include <string>
 
 #include "camera/camera.h"
 #include "hal/hal.h"
+#include "support/debugger_output.h"
 #include "support/flat_camera.h"
-#include "support/scoped_variable.h"
 
 namespace ZV::Test {
 namespace {
 
 class RegisterTrace : public LoadedLibrary {
   protected:
-    RegisterTrace()
-        : path(world.GetFolder() / "debug_output"),
-          variable("ZENTARA_DEBUG_OUTPUT", path.c_str()) {}
     ~RegisterTrace() override { (void)HAL_CameraSetShouldOutputWrites(0, 0); }
 
     std::size_t CountWrites() const {
-        std::ifstream file(path, std::ios::binary);
-        const std::string text{std::istreambuf_iterator<char>(file),
-                               std::istreambuf_iterator<char>()};
+        const std::string text = output.Read();
         std::size_t count = 0;
         for (std::size_t at = text.find("Async write to"); at != std::string::npos;
              at = text.find("Async write to", at + 1)) {
@@ -33,8 +26,7 @@ class RegisterTrace : public LoadedLibrary {
         return count;
     }
 
-    const std::filesystem::path path;
-    const ScopedVariable variable;
+    const DebuggerOutput output;
 };
 
 TEST_F(RegisterTrace, KeptAListingSwitchesItOffAndTheExportSwitchesItOnAgain) {

@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <atomic>
-#include <filesystem>
 #include <memory>
 #include <string>
 #include <thread>
@@ -11,6 +10,7 @@
 
 #include "support/flat_camera.h"
 #include "support/settings_words.h"
+#include "support/system_threads.h"
 #include "system/streamed_camera.h"
 
 // Settings change while frames flow. What a frame was exposed with is known by its number: the
@@ -52,11 +52,6 @@ void ExpectChangesBehindTheirFrames(const std::vector<FlowEvent>& events) {
 
 std::uint64_t GetExposureNs(std::uint32_t change) {
     return 2000000 + std::uint64_t{100000} * change;
-}
-
-std::size_t CountThreads() {
-    const std::filesystem::directory_iterator tasks("/proc/self/task");
-    return static_cast<std::size_t>(std::distance(begin(tasks), end(tasks)));
 }
 
 /// Everything a stream holds; what is in the kernel driver's hands changes from moment to moment.

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "hal/platform/last_error.h"
+#include "support/debugger_output.h"
 #include "support/scoped_variable.h"
 #include "support/simulation_world.h"
 #include "support/temporary_folder.h"
@@ -13,6 +14,7 @@
 namespace ZV {
 namespace {
 
+using Test::DebuggerOutput;
 using Test::ScopedVariable;
 using Test::SimulationWorld;
 using Test::TemporaryFolder;
@@ -88,7 +90,7 @@ TEST_F(SimulationModule, GoesOnWithTheSameBusForTheSameValue) {
 
 TEST_F(SimulationModule, HasNoDevicesForARefusedScenarioAndSaysWhyOnTheDebuggerOutput) {
     const TemporaryFolder folder;
-    const ScopedVariable debug("ZENTARA_DEBUG_OUTPUT", folder.GetPath("debug").c_str());
+    DebuggerOutput output;
     variable.Set(folder.WriteFile("bad.json", R"({"unknownKey": 1})").c_str());
 
     const KernelDriver* driver = Select();
@@ -98,7 +100,7 @@ TEST_F(SimulationModule, HasNoDevicesForARefusedScenarioAndSaysWhyOnTheDebuggerO
     EXPECT_EQ(CountInterfaces(*driver), 0);
     void* handle = nullptr;
     EXPECT_EQ(driver->open("any", &handle), PlatformErrorFileNotFound);
-    const std::string message = folder.ReadFile("debug");
+    const std::string message = output.Take();
     EXPECT_NE(message.find("unknownKey"), std::string::npos) << message;
     EXPECT_EQ(message.back(), '\n');
 }
