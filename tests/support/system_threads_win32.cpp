@@ -28,13 +28,12 @@ Place Look(HANDLE thread) {
 // The system does not tell that a thread waits: one that stands still is taken for asleep.
 bool IsAsleep(std::uint32_t id) {
     constexpr int Looks = 5;
-    HANDLE thread = OpenThread(THREAD_SUSPEND_RESUME | THREAD_GET_CONTEXT, FALSE, id);
+    HANDLE thread = OpenThread(THREAD_SUSPEND_RESUME | THREAD_GET_CONTEXT | SYNCHRONIZE, FALSE, id);
     if (thread == nullptr) return false;
     const Place first = Look(thread);
     bool isStill = first.instruction != 0;
     for (int i = 0; isStill && i < Looks; ++i) {
-        Sleep(1);
-        isStill = Look(thread) == first;
+        isStill = WaitForSingleObject(thread, 1) == WAIT_TIMEOUT && Look(thread) == first;
     }
     CloseHandle(thread);
     return isStill;
