@@ -49,7 +49,7 @@ class MachineSwitches {
 
   private:
     static constexpr char StoreKey[] = "SOFTWARE\\Morvane\\Zentara";
-    static constexpr char SavedKey[] = "SOFTWARE\\ZentaraTests\\Saved";
+    static constexpr char SavedKey[] = "SOFTWARE\\ZentaraTestsSaved";
 
     static HKEY MakeKey(const char* path) {
         HKEY key = nullptr;

@@ -143,6 +143,38 @@ TEST(ConsoleOfAChild, DISABLED_WritesBeforeAndAfterTheLogHasPreparedIt) {
     (void)std::fflush(stdout);
 }
 
+TEST(ConsoleOfAChild, DISABLED_BearsTheTitleAndShowsWhatIsPrinted) {
+    // The log opens the standard output anew: the former handle is closed then.
+    HANDLE console =
+        CreateFileA("CONOUT$", GENERIC_READ | GENERIC_WRITE, FILE_SHARE_READ | FILE_SHARE_WRITE,
+                    nullptr, OPEN_EXISTING, 0, nullptr);
+    ASSERT_TRUE(SetConsoleTextAttribute(console, FOREGROUND_RED));
+    // What was printed before, the noise of the test's frame, is not looked at.
+    ASSERT_TRUE(SetConsoleCursorPosition(console, COORD{0, 5}));
+
+    PrepareLogConsole("Zentara : Debug Console");
+    (void)std::fputs("shown\n", stdout);
+    (void)std::fflush(stdout);
+
+    char title[64] = "";
+    EXPECT_NE(GetConsoleTitleA(title, sizeof title), 0u);
+    EXPECT_STREQ(title, "Zentara : Debug Console");
+    CONSOLE_SCREEN_BUFFER_INFO information{};
+    EXPECT_TRUE(GetConsoleScreenBufferInfo(console, &information));
+    EXPECT_EQ(information.wAttributes, 7);
+    char row[6] = "";
+    DWORD count = 0;
+    EXPECT_TRUE(ReadConsoleOutputCharacterA(console, row, 5, COORD{0, 5}, &count));
+    EXPECT_STREQ(row, "shown");
+    CloseHandle(console);
+}
+
+TEST(LogConsole, IsThatOfAProcessWhichHasOneWithoutRedirection) {
+    const ChildProcess child("ConsoleOfAChild.DISABLED_Bears*", {.hasConsole = true});
+
+    EXPECT_EQ(child.WaitForExitCode(), 0u);
+}
+
 TEST(LogConsole, DoesNotTakeAwayAnOutputThatGoesToAFile) {
     const TemporaryFolder folder;
     const std::string path = folder.GetPath("output.txt");
@@ -151,7 +183,7 @@ TEST(LogConsole, DoesNotTakeAwayAnOutputThatGoesToAFile) {
                               &inherited, CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr);
     ASSERT_NE(file, INVALID_HANDLE_VALUE);
 
-    const ChildProcess child("ConsoleOfAChild.*", {.standardOutput = file});
+    const ChildProcess child("ConsoleOfAChild.DISABLED_Writes*", {.standardOutput = file});
     EXPECT_EQ(child.WaitForExitCode(), 0u);
     CloseHandle(file);
 

@@ -30,6 +30,8 @@ class ChildProcess {
         std::string program = GetOwnPath();
         std::string word = {};
         HANDLE standardOutput = GetStdHandle(STD_OUTPUT_HANDLE);
+        /// A console of its own, without a window, takes the place of the standard output.
+        bool hasConsole = false;
     };
 
     ChildProcess(const std::string& test, const Options& options) {
@@ -38,13 +40,15 @@ class ChildProcess {
             "\" --gtest_brief=1 --gtest_also_run_disabled_tests --gtest_filter=" + test;
         STARTUPINFOA start{};
         start.cb = sizeof start;
-        start.dwFlags = STARTF_USESTDHANDLES;
+        if (!options.hasConsole) start.dwFlags = STARTF_USESTDHANDLES;
         start.hStdInput = GetStdHandle(STD_INPUT_HANDLE);
         start.hStdOutput = options.standardOutput;
         start.hStdError = GetStdHandle(STD_ERROR_HANDLE);
         SetEnvironmentVariableA(ChildWordVariable, options.word.c_str());
         EXPECT_TRUE(CreateProcessA(options.program.c_str(), line.data(), nullptr, nullptr,
-                                   /*bInheritHandles=*/TRUE, 0, nullptr, nullptr, &start, &process))
+                                   /*bInheritHandles=*/TRUE,
+                                   options.hasConsole ? DWORD{CREATE_NO_WINDOW} : 0, nullptr,
+                                   nullptr, &start, &process))
             << GetLastError();
         SetEnvironmentVariableA(ChildWordVariable, nullptr);
     }
