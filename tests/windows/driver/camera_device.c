@@ -1,0 +1,139 @@
+#include "driver_state.h"
+
+static Message* FindOfIrp(const IRP* irp) {
+    LIST_ENTRY* entry;
+    for (entry = driverState.pended.Flink; entry != &driverState.pended; entry = entry->Flink) {
+        Message* message = CONTAINING_RECORD(entry, Message, pendedEntry);
+        if (message->irp == irp) return message;
+    }
+    return NULL;
+}
+
+static void NTAPI CancelCameraRequest(DEVICE_OBJECT* device, IRP* irp) {
+    KIRQL irql;
+    Message* message;
+    BOOLEAN wasTaken = FALSE;
+    IoReleaseCancelSpinLock(irp->CancelIrql);
+    KeAcquireSpinLock(&driverState.lock, &irql);
+    message = FindOfIrp(irp);
+    if (message != NULL) {
+        wasTaken = !message->isQueued;
+        Unlink(message);
+        driverState.cancelledCount++;
+    }
+    KeReleaseSpinLock(&driverState.lock, irql);
+    if (message != NULL && wasTaken) {
+        Tell(RoadCancel, GetExtension(device)->index, message->record.id, message->record.file);
+    }
+    if (message != NULL) ExFreePoolWithTag(message, ROAD_TAG);
+    Complete(irp, STATUS_CANCELLED, 0);
+}
+
+/* Lists the request of `message` with a routine for its cancellation, unless nobody would answer.
+ * The caller holds the lock. */
+static UINT32 Pend(Message* message, const DeviceExtension* camera) {
+    IRP* irp = message->irp;
+    if (driverState.helper == NULL || !camera->isPlugged) return ERROR_DEVICE_NOT_CONNECTED;
+    message->record.id = ++driverState.lastId;
+    IoSetCancelRoutine(irp, CancelCameraRequest);
+    if (irp->Cancel && IoSetCancelRoutine(irp, NULL) != NULL) return ERROR_OPERATION_ABORTED;
+    IoMarkIrpPending(irp);
+    Enqueue(message);
+    return 0;
+}
+
+static NTSTATUS PendCameraRequest(const DeviceExtension* camera, Message* message) {
+    IRP* irp = message->irp;
+    KIRQL irql;
+    UINT32 error;
+    KeAcquireSpinLock(&driverState.lock, &irql);
+    error = Pend(message, camera);
+    KeReleaseSpinLock(&driverState.lock, irql);
+    if (error != 0) {
+        ExFreePoolWithTag(message, ROAD_TAG);
+        return Complete(irp, GetStatusOfError(error), 0);
+    }
+    ServeHelper();
+    return STATUS_PENDING;
+}
+
+static NTSTATUS SendToHelper(DEVICE_OBJECT* device, IRP* irp, UINT32 kind) {
+    const DeviceExtension* camera = GetExtension(device);
+    const IO_STACK_LOCATION* stack = IoGetCurrentIrpStackLocation(irp);
+    Message* message = MakeMessage(kind, camera->index);
+    if (message == NULL) return Complete(irp, STATUS_INSUFFICIENT_RESOURCES, 0);
+    message->irp = irp;
+    message->record.file = (UINT64)(ULONG_PTR)stack->FileObject;
+    if (kind == RoadControl) {
+        message->record.code = stack->Parameters.DeviceIoControl.IoControlCode;
+        message->record.inputBytes = stack->Parameters.DeviceIoControl.InputBufferLength;
+        message->record.outputBytes = stack->Parameters.DeviceIoControl.OutputBufferLength;
+    }
+    return PendCameraRequest(camera, message);
+}
+
+/* Answers a request for which an answer was prepared. The caller holds no lock. */
+static BOOLEAN AnswerPrepared(DEVICE_OBJECT* device, IRP* irp, NTSTATUS* status) {
+    DeviceExtension* camera = GetExtension(device);
+    const IO_STACK_LOCATION* stack = IoGetCurrentIrpStackLocation(irp);
+    RoadRequest record = {0};
+    RoadPrepared prepared;
+    KIRQL irql;
+    BOOLEAN isMeant;
+    record.code = stack->Parameters.DeviceIoControl.IoControlCode;
+    record.outputBytes = stack->Parameters.DeviceIoControl.OutputBufferLength;
+    KeAcquireSpinLock(&driverState.lock, &irql);
+    isMeant = camera->isPrepared && camera->prepared.code == record.code;
+    if (isMeant) {
+        prepared = camera->prepared;
+        camera->isPrepared = FALSE;
+    }
+    KeReleaseSpinLock(&driverState.lock, irql);
+    if (!isMeant) return FALSE;
+    if (prepared.error != 0) {
+        *status = Complete(irp, GetStatusOfError(prepared.error), 0);
+    } else {
+        *status =
+            Complete(irp, STATUS_SUCCESS, CopyOutput(irp, &record, prepared.data, prepared.bytes));
+    }
+    return TRUE;
+}
+
+static void CountFiles(INT32 step) {
+    KIRQL irql;
+    KeAcquireSpinLock(&driverState.lock, &irql);
+    driverState.openFileCount += step;
+    KeReleaseSpinLock(&driverState.lock, irql);
+}
+
+static NTSTATUS CloseCamera(DEVICE_OBJECT* device, IRP* irp) {
+    FILE_OBJECT* file = IoGetCurrentIrpStackLocation(irp)->FileObject;
+    CountFiles(-1);
+    EndAll(IsOfFile, file, ERROR_OPERATION_ABORTED);
+    Tell(RoadClose, GetExtension(device)->index, 0, (UINT64)(ULONG_PTR)file);
+    return Complete(irp, STATUS_SUCCESS, 0);
+}
+
+/* How the system passes the buffers of a control request. */
+static UINT32 GetMethod(IRP* irp) {
+    return IoGetCurrentIrpStackLocation(irp)->Parameters.DeviceIoControl.IoControlCode & 3;
+}
+
+NTSTATUS DispatchCamera(DEVICE_OBJECT* device, IRP* irp) {
+    NTSTATUS status;
+    switch (IoGetCurrentIrpStackLocation(irp)->MajorFunction) {
+        case IRP_MJ_CREATE:
+            CountFiles(1);
+            return SendToHelper(device, irp, RoadOpen);
+        case IRP_MJ_CLOSE:
+            return CloseCamera(device, irp);
+        case IRP_MJ_DEVICE_CONTROL:
+            if (GetMethod(irp) == METHOD_NEITHER) {
+                return Complete(irp, STATUS_INVALID_DEVICE_REQUEST, 0);
+            }
+            if (AnswerPrepared(device, irp, &status)) return status;
+            return SendToHelper(device, irp, RoadControl);
+        default:
+            return Complete(irp, STATUS_SUCCESS, 0);
+    }
+}
