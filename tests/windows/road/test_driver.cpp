@@ -19,6 +19,8 @@ constexpr char InterfaceKey[] =
 /// Class of the systems' own devices; any will do.
 constexpr GUID SystemClass{
     0x4D36E97D, 0xE325, 0x11CE, {0xBF, 0xC1, 0x08, 0x00, 0x2B, 0xE1, 0x03, 0x18}};
+constexpr char TurnName[] = "ZentaraTestDriverTurn";
+constexpr DWORD TurnLimitMs = 400000;
 constexpr std::size_t PathPrefixLength = 4;  // of "\\?\"
 
 bool IsStopped(SC_HANDLE service) {
@@ -94,7 +96,11 @@ std::string GetProgramFolder() {
     return text.substr(0, text.find_last_of('\\'));
 }
 
-TestDriver::TestDriver() : manager(OpenSCManagerA(nullptr, nullptr, SC_MANAGER_ALL_ACCESS)) {
+TestDriver::TestDriver()
+    : turn(CreateMutexA(nullptr, FALSE, TurnName)),
+      manager(OpenSCManagerA(nullptr, nullptr, SC_MANAGER_ALL_ACCESS)) {
+    const DWORD outcome = WaitForSingleObject(turn, TurnLimitMs);
+    EXPECT_TRUE(outcome == WAIT_OBJECT_0 || outcome == WAIT_ABANDONED) << outcome;
     StopAndDelete(OpenServiceA(manager, ROAD_SERVICE_NAME, SERVICE_ALL_ACCESS));
     service = InstallService(manager);
     if (service == nullptr || !Start(service)) {
@@ -108,6 +114,8 @@ TestDriver::~TestDriver() {
     if (IsRunning()) CloseHandle(control);
     StopAndDelete(service);
     CloseServiceHandle(manager);
+    ReleaseMutex(turn);
+    CloseHandle(turn);
 }
 
 bool TestDriver::Control(DWORD code, const void* input, DWORD inputBytes, void* output,

@@ -10,7 +10,7 @@
 namespace ZV::Test {
 
 /// The test driver as a running service, for the life of the object. What an earlier run has left
-/// is removed first.
+/// is removed first. There is one on a machine: another process waits for its turn.
 class TestDriver {
   public:
     TestDriver();
@@ -31,6 +31,7 @@ class TestDriver {
     bool Control(DWORD code, const void* input, DWORD inputBytes, void* output,
                  DWORD outputBytes) const;
 
+    HANDLE turn = nullptr;
     SC_HANDLE manager = nullptr;
     SC_HANDLE service = nullptr;
     HANDLE control = INVALID_HANDLE_VALUE;
