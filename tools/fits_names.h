@@ -4,6 +4,10 @@
 #include <filesystem>
 #include <string>
 #include <string_view>
+#include <system_error>
+
+#include "paths.h"
+#include "platform.h"
 
 /// What the writer and the reader of FITS files share.
 namespace ZentaraProgram {
@@ -18,7 +22,7 @@ inline constexpr std::array<const char*, 3> FitsScaleKeys{"WBRED", "WBGREEN", "W
 /// tilde and leaves blanks out. Empty when there is no current folder.
 inline std::string GetLiteralPath(const std::string& path) {
     std::error_code failure;
-    return std::filesystem::absolute(path, failure).string();
+    return GetNarrowPath(GetPathText(std::filesystem::absolute(MakePath(path), failure)));
 }
 
 }  // namespace ZentaraProgram

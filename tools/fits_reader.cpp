@@ -13,6 +13,7 @@
 
 #include "fits_names.h"
 #include "output.h"
+#include "paths.h"
 #include "zentara/zentara.h"
 
 namespace ZentaraProgram {
@@ -77,10 +78,10 @@ class FitsInput {
 std::string FindDoorProblem(const std::string& path) {
     constexpr std::string_view Begin = "SIMPLE  =";
     std::error_code failure;
-    const auto status = std::filesystem::status(path, failure);
+    const auto status = std::filesystem::status(MakePath(path), failure);
     if (!std::filesystem::exists(status)) return "there is no such file";
     if (!std::filesystem::is_regular_file(status)) return "it is no file";
-    std::ifstream file(path, std::ios::binary);
+    std::ifstream file(MakePath(path), std::ios::binary);
     if (!file) return "it cannot be opened";
     std::array<char, Begin.size()> begin{};
     file.read(begin.data(), begin.size());
@@ -108,7 +109,7 @@ std::string ReadShape(const FitsInput& input, const std::string& path, Image* im
     image->bytesPerSample = type == BYTE_IMG ? 1 : 2;
     const auto samples = static_cast<std::uint64_t>(size[0] * size[1] * size[2]);
     std::error_code failure;
-    const std::uint64_t held = std::filesystem::file_size(path, failure);
+    const std::uint64_t held = std::filesystem::file_size(MakePath(path), failure);
     if (failure || held < samples * image->bytesPerSample)
         return "the file is shorter than its header says";
     const bool isDeep = image->bytesPerSample == 2;

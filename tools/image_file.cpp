@@ -14,6 +14,8 @@
 #include <system_error>
 
 #include "image_writers.h"
+#include "paths.h"
+#include "platform.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -32,7 +34,7 @@ constexpr std::array Kinds{
 };
 
 const KindRow* FindKind(const std::string& path) {
-    std::string ending = std::filesystem::path(path).extension().string();
+    std::string ending = GetPathText(MakePath(path).extension());
     std::transform(ending.begin(), ending.end(), ending.begin(),
                    [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
     const auto* row = std::find_if(Kinds.begin(), Kinds.end(),
@@ -58,7 +60,7 @@ class UnfinishedFolder {
     UnfinishedFolder& operator=(const UnfinishedFolder&) = delete;
 
     [[nodiscard]] const std::error_code& GetFailure() const { return failure; }
-    [[nodiscard]] std::string GetPath(const char* name) const { return (path / name).string(); }
+    [[nodiscard]] std::string GetPath(const char* name) const { return GetPathText(path / name); }
 
   private:
     /// A folder of the name is no failure to the standard library, a file of the name is one.
@@ -79,14 +81,18 @@ std::string WriteImage(const std::string& path, const Image& image) {
     const KindRow* row = FindKind(path);
     if (row == nullptr) return "the ending of the name is none of .fits, .tiff, .png, .raw";
     // The finished file takes its name in one step, so that nobody ever sees half of it.
-    const UnfinishedFolder folder(std::filesystem::path(path).parent_path());
-    if (folder.GetFailure()) return folder.GetFailure().message();
+    const UnfinishedFolder folder(MakePath(path).parent_path());
+    if (folder.GetFailure()) return DescribeFailure(folder.GetFailure());
     const std::string unfinished = folder.GetPath("image");
     std::string reason = row->write(unfinished, image);
     if (!reason.empty()) return reason;
     std::error_code renamed;
-    std::filesystem::rename(unfinished, path, renamed);
-    return renamed ? renamed.message() : std::string{};
+    std::filesystem::rename(MakePath(unfinished), MakePath(path), renamed);
+    return renamed ? DescribeFailure(renamed) : std::string{};
+}
+
+std::string DescribeFailure(const std::error_code& failure) {
+    return failure.default_error_condition().message();  // The same texts on each system.
 }
 
 std::string DescribeFileFailure() {
@@ -95,7 +101,7 @@ std::string DescribeFileFailure() {
 
 std::string WriteRaw(const std::string& path, const Image& image) {
     errno = 0;
-    std::FILE* file = std::fopen(path.c_str(), "wb");
+    std::FILE* file = OpenFile(path, "wb");
     if (file == nullptr) return DescribeFileFailure();
     const bool isWritten =
         std::fwrite(image.pixels.data(), 1, image.pixels.size(), file) == image.pixels.size();

@@ -5,6 +5,7 @@
 #include <filesystem>
 
 #include "fits_reader.h"
+#include "paths.h"
 #include "zentara/zentara.h"
 
 namespace ZentaraProgram {
@@ -32,7 +33,7 @@ std::string ReadImage(const std::string& path, Image* image) {
                                       [&](const ReaderRow& row) { return row.kind == kind; });
     if (reader == Readers.end()) return "the ending of the name is none of .fits, .tiff, .png";
     std::error_code failure;
-    const auto status = std::filesystem::status(path, failure);
+    const auto status = std::filesystem::status(MakePath(path), failure);
     if (!std::filesystem::exists(status)) return "there is no such file";
     if (!std::filesystem::is_regular_file(status)) return "it is no file";
     return reader->read(path, image);

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <string>
+#include <system_error>
 
 #include "image_file.h"
 
@@ -14,5 +15,7 @@ std::string WriteRaw(const std::string& path, const Image& image);
 
 /// The system's words for the last failure of a file operation.
 std::string DescribeFileFailure();
+/// The same of a failure that came back as a code.
+std::string DescribeFailure(const std::error_code& failure);
 
 }  // namespace ZentaraProgram

@@ -7,6 +7,7 @@
 #include <cstdio>
 #include <exception>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "commands.h"
@@ -323,7 +324,7 @@ ExitCode RunCommand(const CLI::App& app, Arguments arguments) {
     return ExitWrongUse;
 }
 
-ExitCode Run(int count, char** values) {
+ExitCode Run(std::vector<std::string> words) {
     Arguments arguments;
     CLI::App app{"Cameras on the command line"};
     app.name("zentara");
@@ -344,7 +345,8 @@ ExitCode Run(int count, char** values) {
     AddProcess(app, &arguments);
     AddHistogram(app, &arguments);
     try {
-        app.parse(count, values);
+        std::reverse(words.begin(), words.end());  // The parser takes the last one first.
+        app.parse(std::move(words));
     } catch (const CLI::Success& success) {
         Print(app.help());
         (void)success;
@@ -365,7 +367,7 @@ int main(int count, char** values) {
     SetOutput(TakeStandardOutput());
     CatchInterrupt();
     try {
-        const ExitCode code = Run(count, values);
+        const ExitCode code = Run(GetArguments(count, values));
         if (FlushOutput()) return code;
         PrintError("the result cannot be written to standard output");
         return code == ExitDone ? ExitFailed : code;

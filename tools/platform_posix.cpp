@@ -23,6 +23,10 @@ std::string GetLibraryFolder() {
 
 }  // namespace
 
+std::vector<std::string> GetArguments(int count, char** values) {
+    return {values + (count > 0 ? 1 : 0), values + count};
+}
+
 std::FILE* TakeStandardOutput() {
     std::fflush(stdout);
     const int own = dup(STDOUT_FILENO);
@@ -38,6 +42,14 @@ void SetVariable(const char* name, const std::string& value) {
 
 bool IsTerminal(std::FILE* stream) {
     return isatty(fileno(stream)) == 1;
+}
+
+std::FILE* OpenFile(const std::string& path, const char* mode) {
+    return std::fopen(path.c_str(), mode);
+}
+
+std::string GetNarrowPath(const std::string& path) {
+    return path;
 }
 
 bool CheckScenario(const std::string& scenario, std::string* message) {

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "image_readers.h"
+#include "platform.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -60,7 +61,7 @@ std::string ReadOpened(png_structp png, png_infop info, std::FILE* file, Image* 
 }  // namespace
 
 std::string ReadPng(const std::string& path, Image* image) {
-    std::FILE* file = std::fopen(path.c_str(), "rb");
+    std::FILE* file = OpenFile(path, "rb");
     if (file == nullptr) return "it cannot be opened";
     png_structp png =
         png_create_read_struct(PNG_LIBPNG_VER_STRING, nullptr, &FailQuietly, &IgnoreWarning);

@@ -9,6 +9,7 @@
 
 #include "image_samples.h"
 #include "image_writers.h"
+#include "platform.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -47,7 +48,7 @@ std::string WritePng(const std::string& path, const Image& image) {
     std::vector<std::uint8_t> scratch;
     const std::uint8_t* samples = GetPixelSamples(image, &scratch).data();
     errno = 0;
-    std::FILE* file = std::fopen(path.c_str(), "wb");
+    std::FILE* file = OpenFile(path, "wb");
     if (file == nullptr) return DescribeFileFailure();
     png_structp png =
         png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, &FailQuietly, &IgnoreWarning);

@@ -13,6 +13,7 @@
 
 #include "image_writers.h"
 #include "output.h"
+#include "paths.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -189,7 +190,7 @@ class SettingsReader : public nlohmann::json_sax<nlohmann::json> {
 };
 
 bool ReadText(const std::string& path, std::string* text) {
-    std::ifstream file(path, std::ios::binary);
+    std::ifstream file(MakePath(path), std::ios::binary);
     if (!file) return false;
     text->resize(GreatestFile + 1);
     file.read(text->data(), static_cast<std::streamsize>(text->size()));
@@ -207,7 +208,7 @@ ordered_json GetSettingsAsJson(const SettingsBlock& block) {
 }
 
 bool WriteText(const std::string& path, const std::string& text) {
-    std::ofstream file(path, std::ios::binary | std::ios::trunc);
+    std::ofstream file(MakePath(path), std::ios::binary | std::ios::trunc);
     file << text;
     file.close();
     return !file.fail();
@@ -250,14 +251,14 @@ std::string WriteSettingsFile(const std::string& path, const Camera& camera,
     errno = 0;
     if (!WriteText(unfinished, text)) {
         std::string reason = DescribeFileFailure();
-        std::filesystem::remove(unfinished, failure);
+        std::filesystem::remove(MakePath(unfinished), failure);
         return reason;
     }
-    std::filesystem::rename(unfinished, path, failure);
+    std::filesystem::rename(MakePath(unfinished), MakePath(path), failure);
     if (!failure) return {};
     std::error_code ignored;
-    std::filesystem::remove(unfinished, ignored);
-    return failure.message();
+    std::filesystem::remove(MakePath(unfinished), ignored);
+    return DescribeFailure(failure);
 }
 
 ordered_json GetValueAsJson(const Setting& setting, SettingValue value) {

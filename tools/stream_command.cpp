@@ -16,6 +16,7 @@
 #include "commands.h"
 #include "interrupt.h"
 #include "output.h"
+#include "paths.h"
 #include "platform.h"
 
 namespace ZentaraProgram {
@@ -147,10 +148,10 @@ class ProgressLine {
 };
 
 std::string GetNumberedName(const std::string& output, std::uint64_t number) {
-    const std::filesystem::path path(output);
-    const std::filesystem::path name =
-        fmt::format("{}-{:06}{}", path.stem().string(), number, path.extension().string());
-    return (path.parent_path() / name).string();
+    const std::filesystem::path path = MakePath(output);
+    const std::string name =
+        fmt::format("{}-{:06}{}", GetPathText(path.stem()), number, GetPathText(path.extension()));
+    return GetPathText(path.parent_path() / MakePath(name));
 }
 
 class Stream {

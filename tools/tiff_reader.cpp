@@ -3,6 +3,7 @@
 #include <string>
 
 #include "image_readers.h"
+#include "platform.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -51,7 +52,8 @@ std::string ReadOpened(TIFF* file, Image* image) {
 std::string ReadTiff(const std::string& path, Image* image) {
     TIFFSetErrorHandler(nullptr);
     TIFFSetWarningHandler(nullptr);
-    TIFF* file = TIFFOpen(path.c_str(), "rm");  // Without a memory map, which a cut file breaks.
+    TIFF* file = TIFFOpen(GetNarrowPath(path).c_str(),
+                          "rm");  // Without a memory map, which a cut file breaks.
     if (file == nullptr) return "it is no TIFF file, or damaged";
     std::string problem = ReadOpened(file, image);
     TIFFClose(file);

@@ -7,6 +7,7 @@
 
 #include "image_samples.h"
 #include "image_writers.h"
+#include "platform.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -53,7 +54,7 @@ std::string WriteTiff(const std::string& path, const Image& image) {
     TIFFSetErrorHandler(nullptr);
     TIFFSetWarningHandler(nullptr);
     errno = 0;
-    TIFF* file = TIFFOpen(path.c_str(), "w");
+    TIFF* file = TIFFOpen(GetNarrowPath(path).c_str(), "w");
     if (file == nullptr) return DescribeFileFailure();
     const std::size_t rowBytes = std::max<std::size_t>(1, GetRowBytes(image));
     const auto rowsPerStrip =
