@@ -377,11 +377,15 @@ bool ReadFile(const std::string& path, std::string* text, std::string* message) 
     return true;
 }
 
-// Files that a scenario names lie beside it.
+// Files that a scenario names lie beside it. Texts are joined, whatever code page their letters are
+// of.
 void ResolvePaths(const std::string& scenarioPath, Scenario* scenario) {
-    const std::filesystem::path folder = std::filesystem::path(scenarioPath).parent_path();
+    const char separators[] = {'/', static_cast<char>(std::filesystem::path::preferred_separator),
+                               '\0'};
+    const std::size_t folderLength = scenarioPath.find_last_of(separators) + 1;
     const auto resolve = [&](std::string* path) {
-        if (!path->empty()) *path = (folder / *path).string();
+        if (path->empty() || std::filesystem::path(*path).is_absolute()) return;
+        path->insert(0, scenarioPath, 0, folderLength);
     };
     resolve(&scenario->trace);
     for (CameraScenario& camera : scenario->cameras) resolve(&camera.scene.path);
