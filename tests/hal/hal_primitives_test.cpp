@@ -37,11 +37,15 @@ TEST(HALErrorMessage, IsTheTextOfTheLastErrorWhateverTheStatus) {
     EXPECT_NE(HAL_ErrorMessage(HALDeviceInUse), text);
 }
 
-TEST(HALErrorMessage, IsEmptyWithoutATextForTheLastError) {
+TEST(HALErrorMessage, IsEmptyWithoutALastError) {
     SetLastPlatformError(PlatformErrorNone);
-    EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "");
 
+    EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "");
+}
+
+TEST(HALErrorMessage, IsEmptyWithoutATextForTheLastError) {
     SetLastPlatformError(0xFFFFFFFE);
+
     EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "");
 }
 

@@ -2,7 +2,9 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <cstring>
+#include <thread>
 
 #include "support/test_thread.h"
 
@@ -17,19 +19,28 @@ TEST(LastPlatformError, IsWhatWasSetLast) {
     EXPECT_EQ(GetLastPlatformError(), PlatformErrorBusy);
 }
 
+// Nothing but the other thread comes between the setting and the look: making a thread or waiting
+// for it may have an error of its own.
 TEST(LastPlatformError, BelongsToItsThread) {
-    SetLastPlatformError(PlatformErrorBusy);
+    std::atomic<bool> isOwnSet{false}, isOtherSet{false};
     std::uint32_t ofOtherThread = PlatformErrorBusy;
+    std::uint32_t ofOwnThread = PlatformErrorNone;
 
     {
-        const TestThread other([&ofOtherThread] {
+        const TestThread other([&] {
+            while (!isOwnSet) std::this_thread::yield();
             ofOtherThread = GetLastPlatformError();
             SetLastPlatformError(PlatformErrorBadLength);
+            isOtherSet = true;
         });
+        SetLastPlatformError(PlatformErrorBusy);
+        isOwnSet = true;
+        while (!isOtherSet) std::this_thread::yield();
+        ofOwnThread = GetLastPlatformError();
     }
 
     EXPECT_EQ(ofOtherThread, PlatformErrorNone);
-    EXPECT_EQ(GetLastPlatformError(), PlatformErrorBusy);
+    EXPECT_EQ(ofOwnThread, PlatformErrorBusy);
 }
 
 TEST(PlatformErrorText, StandsForEveryErrorOfTheSeam) {

@@ -11,6 +11,8 @@
 namespace ZV {
 namespace {
 
+using Test::StoredSettings;
+
 constexpr char StoreKey[] = "SOFTWARE\\Morvane\\Zentara";
 constexpr std::uint32_t Untouched = 0xABCDABCD;
 
@@ -46,7 +48,7 @@ class SettingsKey : public testing::Test {
         return text;
     }
 
-    Test::StoredSettings settings;
+    StoredSettings settings;
 };
 
 TEST_F(SettingsKey, IsNoStoreWhenItIsMissing) {
