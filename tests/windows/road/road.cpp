@@ -18,6 +18,13 @@ class DriverEnvironment : public testing::Environment {
     void SetUp() override { driver = std::make_unique<TestDriver>(); }
     void TearDown() override { driver.reset(); }
 
+    /// One test's loss of the driver is not the next one's.
+    void Renew() {
+        if (driver->IsRunning()) return;
+        driver.reset();
+        driver = std::make_unique<TestDriver>();
+    }
+
     std::unique_ptr<TestDriver> driver;
 };
 
@@ -50,6 +57,7 @@ Road::~Road() {
 }
 
 void Road::SetUp() {
+    GetEnvironment().Renew();
     ASSERT_TRUE(GetDriver().IsRunning());
     ASSERT_EQ(nullptr, std::getenv("ZENTARA_SIMULATION"));
     for (std::uint32_t i = 0; i < interfaces.size(); ++i) {

@@ -3,7 +3,9 @@
 //
 // Left to the simulated driver: Wine does not wait for a driver's answer to an open, so that an
 // open which the driver itself refuses reads there as one that succeeded. What is refused here is
-// the device's name.
+// the device's name. Its cancellation of a request may also meet one that the driver has just
+// completed, and ends the driver's process then: where a process is killed here, its stream stands
+// still. A running one is cut off over the simulated driver.
 
 #include "windows/road/road.h"
 
@@ -20,6 +22,8 @@ namespace ZV::Test {
 namespace {
 
 constexpr std::size_t RingFrames = 8;
+/// Requests that a stream keeps with the driver.
+constexpr std::uint32_t RingRequests = 60;
 
 class RoadClient : public Road {
   protected:
@@ -52,6 +56,12 @@ class RoadClient : public Road {
         std::uint32_t bytes = 0;
         EXPECT_ZERR(zerrNone, Zentara_GetInfo(handle, zinfImageSize, &bytes));
         return bytes;
+    }
+    /// Leaves a running stream with all of its requests in the driver's hands.
+    void StallStream() {
+        ASSERT_TRUE(
+            AddFault(R"({"kind": "neverComplete", "code": "FW_IOCTL_ATTACH_BUFFER", "count": 0})"));
+        ASSERT_TRUE(WaitUntil([&] { return GetDriver().GetState().pended >= RingRequests; }));
     }
     /// True when nothing of a camera is open, pended or reserved any longer.
     bool IsAllGiven() {
@@ -212,19 +222,17 @@ TEST_F(RoadClient, ADeviceThatAnotherProcessTakesAfterTheListingDoesNotOpen) {
     EXPECT_EQ(0u, handle);
 }
 
-TEST_F(RoadClient, ADeviceWhoseHolderIsKilledWhileItStreamsIsFreeAgain) {
+TEST_F(RoadClient, ADeviceWhoseHolderIsKilledWithAStreamUnderWayIsFreeAgain) {
     {
         ChildProcess holder("camera-holder.exe", "stream");
         ASSERT_EQ("ok", holder.ReadLine());
         ASSERT_TRUE(WaitUntil([&] { return GetState().isStreaming != 0; }));
+        StallStream();
         holder.Kill();
     }
     EXPECT_TRUE(WaitUntil([&] { return IsAllGiven(); }));
 
-    const ZentaraHandle handle = OpenFirst();
-
-    ClientFrame frame(GetImageBytes(handle));
-    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+    EXPECT_NE(0u, OpenFirst());
 }
 
 TEST_F(RoadClient, TheLossOfTheCameraInAStreamFailsItsStopAndTheCloseSucceeds) {
@@ -257,6 +265,7 @@ TEST_F(RoadClient, TheDeathOfTheDriversHelperHangsNoCall) {
     const ZentaraHandle handle = OpenFirst();
     RunningStream stream(handle, GetImageBytes(handle));
     ASSERT_NE(nullptr, stream.Take());
+    StallStream();
 
     KillHost();
 

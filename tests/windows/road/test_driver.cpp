@@ -111,11 +111,16 @@ TestDriver::TestDriver()
 }
 
 TestDriver::~TestDriver() {
-    if (IsRunning()) CloseHandle(control);
+    if (control != INVALID_HANDLE_VALUE) CloseHandle(control);
     StopAndDelete(service);
     CloseServiceHandle(manager);
     ReleaseMutex(turn);
     CloseHandle(turn);
+}
+
+bool TestDriver::IsRunning() const {
+    RoadState state{};
+    return Control(ROAD_STATE, nullptr, 0, &state, sizeof state);
 }
 
 bool TestDriver::Control(DWORD code, const void* input, DWORD inputBytes, void* output,

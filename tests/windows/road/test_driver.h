@@ -18,7 +18,7 @@ class TestDriver {
     TestDriver(const TestDriver&) = delete;
     TestDriver& operator=(const TestDriver&) = delete;
 
-    bool IsRunning() const { return control != INVALID_HANDLE_VALUE; }
+    bool IsRunning() const;
 
     /// Puts camera `index` below the device path `path` ("\\\\?\\..."), and takes it away.
     bool Plug(std::uint32_t index, const std::string& path);
