@@ -38,6 +38,7 @@ std::vector<Histogram> MakeEmpty(const Image& image) {
     const std::vector<std::uint64_t> none(std::size_t{1} << bits, 0);
     if (!image.isBayer && image.GetChannels() == 1) return {{"grey", none}};
     std::vector<Histogram> histograms;
+    histograms.reserve(std::size(ColourNames));
     for (const char* name : ColourNames) histograms.push_back({name, none});
     return histograms;
 }

@@ -45,6 +45,7 @@ const PixelFormat* FindPixelFormat(std::string_view name) {
 
 std::string DescribeUnknownFormat(std::string_view name) {
     std::vector<std::string> names;
+    names.reserve(Formats.size());
     for (const PixelFormat& row : Formats) names.emplace_back(row.name);
     return DescribeUnknown("format", name, names);
 }

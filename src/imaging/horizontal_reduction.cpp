@@ -61,7 +61,7 @@ void HalveBlock(const std::uint8_t* row, std::uint8_t* reduced) {
     const __m128i differences =
         _mm_and_si128(_mm_srli_epi16(_mm_xor_si128(first, second), 1), _mm_set1_epi8(0x7F));
     _mm_storeu_si128(reinterpret_cast<__m128i*>(reduced),
-                     _mm_add_epi8(_mm_and_si128(first, second), differences));
+                     _mm_adds_epu8(_mm_and_si128(first, second), differences));
 }
 
 // This one and the next take what they can and leave the last groups of a row to ReduceGroups.

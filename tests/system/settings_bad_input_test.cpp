@@ -511,6 +511,16 @@ TEST_F(BlockOfATakenCamera, IsRefusedByHandleAndItsBlocksAreAnswered) {
     ExpectOfHandle(&Row::held, "held", handle);
 }
 
+// Neither asks who has the camera: what they measure with is missing, since the open has failed.
+TEST_F(BlockOfATakenCamera, MeasuresNothing) {
+    const Zentara_Settings before = block;
+
+    EXPECT_ZERR(zerrBadSettings, Zentara_WhiteBalance(&block, 0, 0, 64, 48));
+    EXPECT_ZERR(zerrBadSettings, Zentara_AutoExpose(&block, 0, 0, 64, 48));
+
+    EXPECT_EQ(0, std::memcmp(&before, &block, sizeof block));
+}
+
 // Kept: "another process" is no 1, so a block can be edited while someone else has the camera.
 TEST_F(BlockOfATakenCamera, ItsBlocksCanBeReadBoundedAndEdited) {
     std::uint32_t value = 0;
