@@ -476,6 +476,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     CameraResult StopUnderSwitchMutex();
     void ClearFrameInfoVector();
 
+    /// Null when the frame is refused.
+    tStFrameInfo* MakeHeldFrame();
     bool DropSurplusFrame();
     bool ProvideBuffer(tStFrameInfo& frame);
     bool DescribeFrame(tStFrameInfo& frame);
@@ -495,6 +497,7 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void RunShielded(void (MorvaneFWCamera::*step)());
 
     HALStatus ForgetOneImage();
+    void DropOneImage(ZExImage* next);
     ZExImage* ClaimOneImage();
     CameraResult AwaitOneImage();
     static void* TakeOneImage(ZImageReceivedCallbackStruct* record);
