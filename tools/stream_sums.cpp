@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <utility>
 
 namespace ZentaraProgram {
 namespace {
@@ -25,7 +26,7 @@ StreamSums::StreamSums(std::uint32_t frameNumbers) : numbersPerFrame(std::max(1U
 
 void StreamSums::Count(const Zentara_Frame& frame) {
     const auto step = static_cast<std::uint16_t>(frame.frameNumber - lastNumber);
-    if (frames == 0) {
+    if (!std::exchange(hasBegun, true)) {
         lastNumber = frame.frameNumber;
     } else {
         CountGap(step);
@@ -49,6 +50,12 @@ void StreamSums::CountGap(std::uint32_t step) {
     ++gaps;
     drops += lost;
     if (missing.size() < MissingMax) missing.push_back({former + 1, lastNumber - 1});
+}
+
+void StreamSums::ForgetCounts() {
+    frames = bytes = damaged = gaps = drops = files = repeats = 0;
+    missing.clear();
+    errors.clear();
 }
 
 double StreamSums::GetRate() const {

@@ -31,6 +31,9 @@ class StreamSums {
 
     void Count(const Zentara_Frame& frame);
 
+    /// Counts from 0 again; the numbers go on.
+    void ForgetCounts();
+
     [[nodiscard]] double GetRate() const;
     [[nodiscard]] double GetMegabytesPerSecond() const;
     /// Of the frame that came last; 0 before the first.
@@ -48,8 +51,9 @@ class StreamSums {
   private:
     void CountGap(std::uint32_t step);
 
-    const std::uint32_t numbersPerFrame;
+    std::uint32_t numbersPerFrame;
     std::uint64_t lastNumber = 0;
+    bool hasBegun = false;
     std::vector<MissingFrames> missing;
     std::map<std::uint32_t, std::uint64_t> errors;
 };

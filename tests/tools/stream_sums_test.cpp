@@ -52,6 +52,16 @@ TEST(StreamSumsTest, TheNumberGoesOnBeyondItsSixteenBits) {
     EXPECT_EQ("65534-65536, 65538-131070, 131072-131074", broken.DescribeMissing());
 }
 
+TEST(StreamSumsTest, AGapIsSeenAcrossTheForgettingOfTheCounts) {
+    StreamSums sums = CountNumbers({4, 6});
+
+    sums.ForgetCounts();
+    sums.Count(MakeFrame(8));
+
+    EXPECT_EQ(1U, sums.frames);
+    EXPECT_EQ("7", sums.DescribeMissing());
+}
+
 TEST(StreamSumsTest, AFrameThatComesTwiceIsNoGap) {
     const StreamSums sums = CountNumbers({4, 4, 5});
 
