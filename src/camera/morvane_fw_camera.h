@@ -351,6 +351,10 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void PrivateImageStreamingRunLoop();
     void PrivateRunExposeDoneCB();
 
+    /// False when one of the camera's locks or conditions could not be made: a call would not know
+    /// whether it holds it.
+    bool HasSynchronisation() const;
+
     /// True while one of the camera's two threads lives: a close does not wait for ever for an
     /// exposure callback that lasts.
     bool HasLivingThreads() const {
