@@ -18,7 +18,7 @@
 namespace ZV::Test {
 namespace {
 
-constexpr std::uint64_t DelayEvery = 16;
+constexpr std::uint64_t DelayEvery = 32;
 constexpr std::uint64_t SleepEvery = 4;  // of the delays; the others yield
 constexpr std::uint64_t SleepMaxUs = 250;
 

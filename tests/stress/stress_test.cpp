@@ -312,7 +312,7 @@ class Stress : public testing::TestWithParam<std::uint64_t> {
 
 TEST_P(Stress, FourClientsMayCallEverythingAtOnceOnTwoCameras) {
     const std::uint64_t seed = ReadNumber("ZENTARA_STRESS_SEED", GetParam());
-    const std::uint64_t steps = ReadNumber("ZENTARA_STRESS_STEPS", 60);
+    const std::uint64_t steps = ReadNumber("ZENTARA_STRESS_STEPS", 150);
     RecordProperty("seed", std::to_string(seed));
     SCOPED_TRACE("seed " + std::to_string(seed));
     SimulationWorld world(Scenario);
