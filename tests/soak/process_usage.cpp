@@ -12,18 +12,20 @@
 namespace ZV::Soak {
 namespace {
 
-/// Frames on their way, caches of the allocator: they come and go.
-constexpr std::uint64_t BytesSlack = std::uint64_t{8} << 20;
-/// A camera that is being opened again.
-constexpr std::uint64_t CountSlack = 0;
+/// A field may lie so much above the first minute.
+struct FieldRow {
+    std::uint64_t ProcessUsage::*field;
+    std::uint64_t slack;
+};
 
-constexpr std::uint64_t ProcessUsage::*Fields[] = {&ProcessUsage::residentBytes,
-                                                   &ProcessUsage::heapBytes, &ProcessUsage::threads,
-                                                   &ProcessUsage::handles};
-
-bool IsInBytes(std::uint64_t ProcessUsage::*field) {
-    return field == &ProcessUsage::residentBytes || field == &ProcessUsage::heapBytes;
-}
+constexpr std::uint64_t Megabyte = 1 << 20;
+constexpr FieldRow Fields[] = {
+    // What the allocator keeps of memory that was freed fills up slowly.
+    {&ProcessUsage::residentBytes, 24 * Megabyte},
+    {&ProcessUsage::heapBytes, 2 * Megabyte},  // frames on their way
+    {&ProcessUsage::threads, 0},
+    {&ProcessUsage::handles, 0},
+};
 
 std::uint64_t CountEntries(const char* folder) {
     std::error_code failure;
@@ -57,7 +59,7 @@ ProcessUsage MeasureUsage() {
 }
 
 void GrowthJudge::Add(const ProcessUsage& usage) {
-    for (const auto field : Fields) {
+    for (const auto& [field, slack] : Fields) {
         if (isFirst) most.*field = std::max(most.*field, usage.*field);
         least.*field = isNewMinute ? usage.*field : std::min(least.*field, usage.*field);
     }
@@ -73,9 +75,8 @@ void GrowthJudge::EndMinute() {
 
 bool GrowthJudge::IsSteady() const {
     if (!hasLast) return true;
-    return std::all_of(std::begin(Fields), std::end(Fields), [this](const auto field) {
-        const std::uint64_t slack = IsInBytes(field) ? BytesSlack : CountSlack;
-        return lastLeast.*field <= most.*field + slack;
+    return std::all_of(std::begin(Fields), std::end(Fields), [this](const FieldRow& row) {
+        return lastLeast.*row.field <= most.*row.field + row.slack;
     });
 }
 

@@ -15,9 +15,9 @@ using namespace std::chrono_literals;
 
 constexpr std::uint32_t ListLength = 64;
 constexpr std::uint64_t FramesPerChange = 40;
-constexpr std::uint64_t FramesPerRestart = 700;
-constexpr std::uint64_t FramesPerReopen = 6000;
-constexpr std::uint64_t FramesPerUnplug = 25000;
+constexpr std::uint64_t FramesPerRestart = 400;
+constexpr std::uint64_t FramesPerReopen = 1500;
+constexpr std::uint64_t FramesPerUnplug = 4000;
 constexpr auto FrameLimit = 30s;
 constexpr auto ListLimit = 10s;
 /// One frame of two that wait stays in the queue when the stream ends, for each stream.
