@@ -9,18 +9,36 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
+#include <filesystem>
 
 namespace ZV::Simulation {
 namespace {
 
 constexpr std::uint64_t PixelCountMax = std::uint64_t{1} << 25;
 constexpr std::size_t SignatureBytes = 6;
+/// Bytes that one compressed byte can stand for.
+constexpr std::uint64_t DeflateRatio = 1100;
 
-/// Takes over the size and makes room. False with `reason`.
+/// Pixels that a file can hold which has `pixelBits` bits for each, and of which one byte stands
+/// for `ratio` bytes of samples at most.
+std::uint64_t CountPixelsHeld(const std::string& path, std::uint64_t ratio,
+                              std::uint64_t pixelBits) {
+    constexpr std::uint64_t BitsPerByte = 8;
+    std::error_code failure;
+    const std::uint64_t bytes = std::filesystem::file_size(path, failure);
+    return failure || pixelBits == 0 ? 0 : bytes * ratio * BitsPerByte / pixelBits;
+}
+
+/// Takes over the size and makes room, which a file that holds fewer pixels gets none of. False
+/// with `reason`.
 bool Allocate(ImageFile* image, std::uint64_t width, std::uint64_t height, std::uint32_t channels,
-              std::string* reason) {
+              std::uint64_t pixelsHeld, std::string* reason) {
     if (width == 0 || height == 0 || width > PixelCountMax || height > PixelCountMax / width) {
         *reason = "its size is not supported";
+        return false;
+    }
+    if (width * height > pixelsHeld) {
+        *reason = "it is shorter than its header says";
         return false;
     }
     image->width = static_cast<std::uint32_t>(width);
@@ -34,7 +52,8 @@ bool ReadPng(const std::string& path, ImageFile* image, std::string* reason) {
     png_image png = {};
     png.version = PNG_IMAGE_VERSION;
     bool isRead = png_image_begin_read_from_file(&png, path.c_str()) != 0;
-    if (isRead && !Allocate(image, png.width, png.height, 3, reason)) {
+    const std::uint64_t held = CountPixelsHeld(path, DeflateRatio, /*pixelBits=*/1);
+    if (isRead && !Allocate(image, png.width, png.height, 3, held, reason)) {
         png_image_free(&png);
         return false;
     }
@@ -71,9 +90,31 @@ TIFF* OpenTiff(const std::string& path, std::string* reason) {
     return file;
 }
 
+/// Bytes that one byte of a strip can stand for.
+struct TiffRatio {
+    std::uint16_t compression;
+    std::uint64_t ratio;
+};
+constexpr TiffRatio TiffRatios[] = {
+    {COMPRESSION_NONE, 1},
+    {COMPRESSION_PACKBITS, 128},
+    {COMPRESSION_LZW, 4096},
+    {COMPRESSION_DEFLATE, DeflateRatio},
+    {COMPRESSION_ADOBE_DEFLATE, DeflateRatio},
+};
+constexpr std::uint64_t TiffRatioOfOthers = 65536;
+
+std::uint64_t GetTiffRatio(std::uint16_t compression) {
+    for (const TiffRatio& row : TiffRatios) {
+        if (row.compression == compression) return row.ratio;
+    }
+    return TiffRatioOfOthers;
+}
+
 struct TiffLayout {
     std::uint32_t width = 0, height = 0;
     std::uint16_t bits = 1, samples = 1, planar = 1, photometric = 0, sampleFormat = 1;
+    std::uint16_t compression = COMPRESSION_NONE;
 
     explicit TiffLayout(TIFF* file) {
         TIFFGetField(file, TIFFTAG_IMAGEWIDTH, &width);
@@ -82,7 +123,12 @@ struct TiffLayout {
         TIFFGetFieldDefaulted(file, TIFFTAG_SAMPLESPERPIXEL, &samples);
         TIFFGetFieldDefaulted(file, TIFFTAG_PLANARCONFIG, &planar);
         TIFFGetFieldDefaulted(file, TIFFTAG_SAMPLEFORMAT, &sampleFormat);
+        TIFFGetFieldDefaulted(file, TIFFTAG_COMPRESSION, &compression);
         TIFFGetField(file, TIFFTAG_PHOTOMETRIC, &photometric);
+    }
+
+    std::uint64_t CountPixelsIn(const std::string& path) const {
+        return CountPixelsHeld(path, GetTiffRatio(compression), std::uint64_t{bits} * samples);
     }
 
     std::uint32_t GetChannels() const { return photometric == PHOTOMETRIC_RGB ? 3 : 1; }
@@ -138,7 +184,8 @@ bool ReadTiff(const std::string& path, ImageFile* image, std::string* reason) {
     const TiffLayout layout(file);
     const bool isPlain = layout.IsPlainScanlines(file);
     const bool isRead =
-        Allocate(image, layout.width, layout.height, isPlain ? layout.GetChannels() : 3, reason) &&
+        Allocate(image, layout.width, layout.height, isPlain ? layout.GetChannels() : 3,
+                 layout.CountPixelsIn(path), reason) &&
         (isPlain ? ReadTiffScanlines(file, layout, image) : ReadTiffConverted(file, image));
     TIFFClose(file);
     return isRead;
@@ -160,7 +207,8 @@ void TakeFitsPlanes(const std::vector<float>& values, ImageFile* image) {
     }
 }
 
-bool ReadFitsImage(fitsfile* file, ImageFile* image, std::string* reason, int* status) {
+bool ReadFitsImage(fitsfile* file, std::uint64_t pixelsHeld, ImageFile* image, std::string* reason,
+                   int* status) {
     std::array<LONGLONG, 3> sizes = {0, 0, 0};
     int axes = 0;
     fits_get_img_dim(file, &axes, status);
@@ -177,7 +225,7 @@ bool ReadFitsImage(fitsfile* file, ImageFile* image, std::string* reason, int* s
         return false;
     }
     if (!Allocate(image, static_cast<std::uint64_t>(sizes[0]), static_cast<std::uint64_t>(sizes[1]),
-                  channels, reason)) {
+                  channels, pixelsHeld, reason)) {
         return false;
     }
     std::vector<float> values(image->levels.size());
@@ -193,7 +241,8 @@ bool ReadFits(const std::string& path, ImageFile* image, std::string* reason) {
     fitsfile* file = nullptr;
     int status = 0;
     fits_open_diskfile(&file, path.c_str(), READONLY, &status);
-    const bool isRead = status == 0 && ReadFitsImage(file, image, reason, &status);
+    const std::uint64_t held = CountPixelsHeld(path, DeflateRatio, /*pixelBits=*/8);
+    const bool isRead = status == 0 && ReadFitsImage(file, held, image, reason, &status);
     if (status != 0) {
         std::array<char, FLEN_STATUS> text{};
         fits_get_errstatus(status, text.data());

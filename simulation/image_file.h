@@ -19,7 +19,7 @@ struct ImageFile {
 /// image (the first one of the file, in the file's row order; its greatest value is 1, what is
 /// negative or undefined is 0; three planes are red, green and blue). The kind is told by the
 /// file's first bytes. False with `message`, which names the path; images above 2 to the power 25
-/// pixels are refused.
+/// pixels, or of more than the file can hold, are refused before there is room for them.
 bool ReadImageFile(const std::string& path, ImageFile* image, std::string* message);
 
 }  // namespace ZV::Simulation

@@ -39,6 +39,12 @@ std::string ReadImage(const std::string& path, Image* image) {
     return reader->read(path, image);
 }
 
+bool CanHold(const std::string& path, std::uint64_t sampleBytes, std::uint64_t ratio) {
+    std::error_code failure;
+    const std::uint64_t bytes = std::filesystem::file_size(path, failure);
+    return !failure && sampleBytes / ratio <= bytes;
+}
+
 bool PrepareImage(std::uint64_t width, std::uint64_t height, std::uint32_t channels,
                   std::uint32_t bytesPerSample, Image* image) {
     // Eight times the pixels of the largest camera.

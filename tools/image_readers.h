@@ -16,6 +16,13 @@ std::string ReadImage(const std::string& path, Image* image);
 std::string ReadPng(const std::string& path, Image* image);
 std::string ReadTiff(const std::string& path, Image* image);
 
+/// Whether a file is long enough for `sampleBytes` bytes of samples, when one byte of it stands for
+/// `ratio` of them at most. Asked before there is room for the image.
+bool CanHold(const std::string& path, std::uint64_t sampleBytes, std::uint64_t ratio);
+
+/// Bytes of samples that one byte of a deflated stream can stand for, with some to spare.
+inline constexpr std::uint64_t DeflateRatio = 1100;
+
 /// Gives an image this size and room for its pixels. False when no camera makes such an image; it
 /// is left alone then.
 bool PrepareImage(std::uint64_t width, std::uint64_t height, std::uint32_t channels,

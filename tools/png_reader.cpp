@@ -16,6 +16,11 @@ void FailQuietly(png_structp png, png_const_charp) {
 }
 void IgnoreWarning(png_structp, png_const_charp) {}
 
+struct PngFile {
+    const std::string& path;
+    std::FILE* stream;
+};
+
 /// What a PNG is read as: samples of whole bytes, grey or of three colours.
 void SetTransformations(png_structp png) {
     png_set_expand(png);
@@ -43,14 +48,17 @@ bool ReadRows(png_structp png, std::uint8_t* pixels, std::size_t rowBytes, std::
     return true;
 }
 
-std::string ReadOpened(png_structp png, png_infop info, std::FILE* file, Image* image) {
+std::string ReadOpened(png_structp png, png_infop info, const PngFile& file, Image* image) {
+    constexpr std::uint64_t PixelsPerByte = 8;  // at most, of a palette of two
     bool isInterlaced = false;
-    if (!ReadHeader(png, info, file, &isInterlaced)) return "it is no PNG file, or damaged";
+    if (!ReadHeader(png, info, file.stream, &isInterlaced)) return "it is no PNG file, or damaged";
     if (isInterlaced) return "it is interlaced";
     const std::uint32_t channels = png_get_channels(png, info);
     const std::uint32_t bytes = png_get_bit_depth(png, info) == 16 ? 2 : 1;
     const std::uint32_t width = png_get_image_width(png, info);
     const std::uint32_t height = png_get_image_height(png, info);
+    if (!CanHold(file.path, std::uint64_t{width} * height / PixelsPerByte, DeflateRatio))
+        return "the file is shorter than its header says";
     if (!PrepareImage(width, height, channels, bytes, image))
         return "it holds no image of a camera";
     const std::size_t rowBytes = png_get_rowbytes(png, info);
@@ -67,7 +75,7 @@ std::string ReadPng(const std::string& path, Image* image) {
         png_create_read_struct(PNG_LIBPNG_VER_STRING, nullptr, &FailQuietly, &IgnoreWarning);
     png_infop info = png == nullptr ? nullptr : png_create_info_struct(png);
     std::string problem =
-        info == nullptr ? "there is no memory for it" : ReadOpened(png, info, file, image);
+        info == nullptr ? "there is no memory for it" : ReadOpened(png, info, {path, file}, image);
     png_destroy_read_struct(&png, &info, nullptr);
     (void)std::fclose(file);  // It was only read.
     return problem;

@@ -18,6 +18,7 @@
 #include "output.h"
 #include "paths.h"
 #include "platform.h"
+#include "stream_sums.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -87,32 +88,6 @@ class FrameRing {
     std::deque<Slot*> done;
 };
 
-struct StreamSums {
-    std::uint32_t exposures = 1;  ///< Of one frame, which is counted by the camera.
-    std::uint64_t frames = 0, bytes = 0, damaged = 0, gaps = 0, drops = 0, files = 0;
-    std::uint32_t lastNumber = 0;
-    double seconds = 0;
-
-    void Count(const Zentara_Frame& frame) {
-        if (frames > 0) {
-            const auto between = static_cast<std::uint16_t>(frame.frameNumber - lastNumber - 1);
-            const std::uint32_t missing = between / exposures;
-            if (missing != 0) ++gaps;
-            drops += missing;
-        }
-        lastNumber = frame.frameNumber;
-        ++frames;
-        bytes += frame.size;
-        if (frame.errorCode != zerrNone) ++damaged;
-    }
-    [[nodiscard]] double GetRate() const {
-        return seconds > 0 ? static_cast<double>(frames) / seconds : 0;
-    }
-    [[nodiscard]] double GetMegabytesPerSecond() const {
-        return seconds > 0 ? static_cast<double>(bytes) / seconds / 1e6 : 0;
-    }
-};
-
 /// A line on standard error that is written over and over.
 class ProgressLine {
   public:
@@ -162,9 +137,8 @@ class Stream {
           facts(captureFacts),
           options(streamOptions),
           ring(std::max(1U, streamOptions.buffers), captureFacts.imageBytes),
-          progress(streamOptions) {
-        sums.exposures = facts.exposures;
-    }
+          progress(streamOptions),
+          sums(captureFacts.exposures) {}
 
     ~Stream() { Stop(); }
     Stream(const Stream&) = delete;
@@ -269,24 +243,44 @@ class Stream {
     bool isStopped = false;
 };
 
-void Report(const CommonOptions& common, const StreamSums& sums) {
-    if (common.asJson) {
-        const nlohmann::json report{{"frames", sums.frames},
-                                    {"seconds", sums.seconds},
-                                    {"framesPerSecond", sums.GetRate()},
-                                    {"megabytesPerSecond", sums.GetMegabytesPerSecond()},
-                                    {"gaps", sums.gaps},
-                                    {"drops", sums.drops},
-                                    {"damaged", sums.damaged},
-                                    {"files", sums.files}};
-        PrintJson(report);
-        return;
-    }
+void ReportAsJson(const StreamSums& sums) {
+    nlohmann::json errors = nlohmann::json::object();
+    for (const auto& [code, count] : sums.GetErrors()) errors[GetFrameErrorName(code)] = count;
+    nlohmann::json missing = nlohmann::json::array();
+    for (const MissingFrames& run : sums.GetMissing()) missing.push_back({run.first, run.last});
+    PrintJson(nlohmann::json{{"frames", sums.frames},
+                             {"seconds", sums.seconds},
+                             {"framesPerSecond", sums.GetRate()},
+                             {"megabytesPerSecond", sums.GetMegabytesPerSecond()},
+                             {"gaps", sums.gaps},
+                             {"drops", sums.drops},
+                             {"repeats", sums.repeats},
+                             {"damaged", sums.damaged},
+                             {"errors", errors},
+                             {"lastNumber", sums.GetLastNumber()},
+                             {"missing", missing},
+                             {"files", sums.files}});
+}
+
+void ReportAsText(const StreamSums& sums) {
     Print(fmt::format(
         "{} frames in {:.2f} s: {:.1f} frames/s, {:.1f} MB/s; {} gaps, {} drops, {} damaged\n",
         sums.frames, sums.seconds, sums.GetRate(), sums.GetMegabytesPerSecond(), sums.gaps,
         sums.drops, sums.damaged));
+    for (const auto& [code, count] : sums.GetErrors()) {
+        Print(fmt::format("{} frames with the error {}\n", count, GetFrameErrorName(code)));
+    }
+    if (sums.repeats > 0) Print(fmt::format("{} frames came twice\n", sums.repeats));
+    if (sums.gaps > 0) Print(fmt::format("missing frames: {}\n", sums.DescribeMissing()));
     if (sums.files > 0) Print(fmt::format("{} files written\n", sums.files));
+}
+
+void Report(const CommonOptions& common, const StreamSums& sums) {
+    if (common.asJson) {
+        ReportAsJson(sums);
+    } else {
+        ReportAsText(sums);
+    }
 }
 
 ExitCode CheckOptions(const StreamOptions& options) {

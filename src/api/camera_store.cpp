@@ -17,6 +17,12 @@ bool IsInUse(ZCamera* camera) {
     return camera->IsCameraOpen() && GetCameraContext(*camera) != nullptr;
 }
 
+// Its close failed, and its device is still open.
+bool IsLeftOpen(ZCamera* camera) {
+    return camera->IsCameraOpen() && camera->DoWeHaveExclusiveAccess() &&
+           GetCameraContext(*camera) == nullptr;
+}
+
 /// What the client gets back with its close nobody may write to afterwards.
 void AwaitServices(CameraContext& context) {
     AwaitImages(context);
@@ -50,6 +56,7 @@ CameraResult CameraStore::MakeList() {
     UnregisterClosedCameras();
     // Kept: only the listing's own result counts, and this stops at the first open camera.
     (void)ZCamera::EraseClosedCamerasFromList(cameraList);
+    FreeCamerasLeftOpen();
     RetireList();
     (void)ZCamera::EraseCameraList(cameraList);
     FreeContextsWithoutCamera();
@@ -99,6 +106,15 @@ void CameraStore::FreeUnusedRetiredCameras() {
     std::vector<ZCamera*> unused(firstUnused, retiredCameras.end());
     retiredCameras.erase(firstUnused, retiredCameras.end());
     FreeCameras(unused);
+}
+
+// The listing would pass their devices over as held.
+void CameraStore::FreeCamerasLeftOpen() {
+    const auto firstLeft = std::stable_partition(
+        cameraList.begin(), cameraList.end(), [](ZCamera* camera) { return !IsLeftOpen(camera); });
+    std::vector<ZCamera*> left(firstLeft, cameraList.end());
+    cameraList.erase(firstLeft, cameraList.end());
+    FreeCameras(left);
 }
 
 void CameraStore::RetireList() {

@@ -23,7 +23,7 @@ class CameraStore {
     /// Gives the former list up and makes a new one. Closed cameras and their handles end, save
     /// that an open camera keeps those behind it; open cameras and what is behind them are retired,
     /// which leaves their handles as they are, and retired cameras that have been closed since end
-    /// here.
+    /// here. So does a camera whose close failed, so that its device is found again.
     CameraResult MakeList();
 
     /// Makes the context of a camera that has just been opened and attaches it; the store owns it.
@@ -47,6 +47,7 @@ class CameraStore {
 
     void UnregisterClosedCameras();
     void FreeUnusedRetiredCameras();
+    void FreeCamerasLeftOpen();
     void RetireList();
     void TakeOutContextsOf(ZCamera& camera);
     void FreeContextsOf(const ZCamera& camera);

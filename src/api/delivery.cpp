@@ -214,23 +214,31 @@ void DeliverFrame(CameraContext& context, const QueueEntry& entry, ZExImage* ima
     CallFrameDone(context, entry);
 }
 
-void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
+void CountWithoutTaker(ZCamera& camera, ZExImage* image) {
+    if (image == nullptr) return;
+    camera.GetStreamCounters().withoutTaker.Add(image->GetErrorCode());
+}
+
+/// False when no frame waited for the image.
+bool ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
     const SemaphoreHold delivery(*context.deliveryLock);
     EventService service(context, EventService::Kind::Image);
     {
         const EntryHold head(context, HoldEntry(context, 0));
-        if (!head) return;
+        if (!head) return false;
         MakeUpForExposeDone(context, service, *head);
     }
     const EntryHold entry(context, TakeFirstEntry(context));
-    if (!entry) return;
+    if (!entry) return false;
     // Kept: a change that is the last entry stays. At the next image it is taken out as the entry
     // itself, dropped without being sent, and that image is dropped with it.
     const EntryHold change(context, service.TakeChange(/*index=*/0, /*countMin=*/2));
-    if (entry->kind == QueueKindFrame) DeliverFrame(context, *entry, image, status);
-    if (!change) return;
+    const bool isFrame = entry->kind == QueueKindFrame;
+    if (isFrame) DeliverFrame(context, *entry, image, status);
+    if (!change) return isFrame;
     const ZentaraResult result = MakeChange(service, *change);
     if (WantsCall(*change, zcbFrameDone)) CallClient(*change, result, change->flags);
+    return isFrame;
 }
 
 }  // namespace
@@ -252,14 +260,18 @@ void* ExposeDone(void* refCon) {
 
 void* ImageReceived(ZImageReceivedCallbackStruct* record) {
     ZLogEnter(ImageReceivedName);
-    CameraContext* const context = GetCameraContext(*static_cast<ZCamera*>(record->refCon));
+    ZCamera& camera = *static_cast<ZCamera*>(record->refCon);
+    CameraContext* const context = GetCameraContext(camera);
     if (context == nullptr) {
+        CountWithoutTaker(camera, record->image);
         ZCamera::FreeImage(record->image);
         ZLogLeave(ImageReceivedName, zerrBadParameter);
         return nullptr;
     }
     (void)Guarded([&] {
-        ServeImage(*context, record->image, record->status);
+        if (!ServeImage(*context, record->image, record->status)) {
+            CountWithoutTaker(camera, record->image);
+        }
         return ZentaraResult{zerrNone};
     });
     ZCamera::FreeImage(record->image);

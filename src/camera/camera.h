@@ -7,6 +7,7 @@
 
 #include "camera/camera_result.h"
 #include "camera/relaxed.h"
+#include "camera/stream_counters.h"
 #include "imaging/object.h"
 #include "zentara/zentara.h"
 
@@ -344,6 +345,9 @@ class ZENTARA_API ZCamera : public ZObject {
     void BeginSettingsChange();
     void EndSettingsChange();
 
+    /// What became of the frames of this object's streams. Thread-safe.
+    StreamCounters& GetStreamCounters() { return streamCounters; }
+
   private:
     virtual CameraResult SetupCamera() = 0;
     virtual bool IsInterlaced() = 0;
@@ -365,6 +369,7 @@ class ZENTARA_API ZCamera : public ZObject {
     ZFolaryRatioCorrection* ratioCorrection = nullptr;
     Relaxed<bool> isOpen{false};
     Relaxed<bool> exclusiveAccess{false};
+    StreamCounters streamCounters;
     /// A write of the image's geometry is told apart from a take-over: it stands before it or
     /// behind it. Held over their requests; nothing but the HAL's locks is taken under it.
     std::mutex geometryMutex;

@@ -26,6 +26,15 @@ void DeleteCamera(ZCamera* camera) {
     delete camera;
 }
 
+/// Null when there is no memory; the record then is still the caller's.
+MorvaneFWCamera* MakeWholeCamera(const HALCamera& record) {
+    MorvaneFWCamera* made = MakeCamera(record.cameraWord, record);
+    if (made == nullptr || made->HasSynchronisation()) return made;
+    made->SetShouldDeleteHALCamera(false);
+    DeleteCamera(made);
+    return nullptr;
+}
+
 /// The device records of a listing. Those that no camera has taken over are let go at the end.
 class DeviceRecords {
   public:
@@ -83,7 +92,7 @@ CameraResult ZCamera::ListCamera(HALCamera& record, ZCamera** listed) {
     for (bool isOtherModel = true; isOtherModel;) {
         if (record.kind > HALKindAdapter) return CameraBadBackEnd;
         record.cameraWord >>= MorvaneFWCamera::m_cameraModelShift;
-        MorvaneFWCamera* made = MakeCamera(record.cameraWord, record);
+        MorvaneFWCamera* made = MakeWholeCamera(record);
         *listed = made;
         if (made == nullptr) {
             (void)HAL_CameraRelease(&record);  // cannot fail

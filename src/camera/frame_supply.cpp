@@ -34,6 +34,12 @@ constexpr std::uint32_t CountSampleBytes(std::uint32_t bitDepth) {
 }  // namespace
 
 tStFrameInfo* MorvaneFWCamera::PrivatePeekNewFrame() {
+    tStFrameInfo* const frame = MakeHeldFrame();
+    (frame != nullptr ? streamCounters.begun : streamCounters.refused).Add();
+    return frame;
+}
+
+tStFrameInfo* MorvaneFWCamera::MakeHeldFrame() {
     if (!streaming.isStreaming || streaming.abortPending) {
         streaming.abortPending = false;  // an abort refuses exactly one frame
         return nullptr;
@@ -58,7 +64,10 @@ bool MorvaneFWCamera::DropSurplusFrame() {
     if (HAL_SemaphoreWait(streaming.frameLock) != HALOk) return false;
     if (streaming.frameQueue.GetCount() >= WaitingFramesMax) {
         tStFrameInfo* surplus = streaming.frameQueue.TakeNewest();
-        if (surplus != nullptr) FreeFrameWithBuffer(surplus);
+        if (surplus != nullptr) {
+            FreeFrameWithBuffer(surplus);
+            streamCounters.dropped.Add();
+        }
     }
     return HAL_SemaphoreSignal(streaming.frameLock) == HALOk;
 }

@@ -95,13 +95,18 @@ tStFrameInfo* MorvaneFWCamera::TakeOldestFrame() {
 void MorvaneFWCamera::ServeFrame(tStFrameInfo* frame) {
     if (!streaming.isStreaming || !IsFrameValid(frame)) {
         DiscardFrame(frame);
+        streamCounters.bad.Add();
         return;
     }
     const std::unique_ptr<tStFrameInfo, void (*)(tStFrameInfo*)> served(frame, FreeFrame);
     // Nothing has been written to a refused frame: it must not show what its buffer held.
     if (frame->frameStatus == FrameRefused) std::memset(frame->buffer, 0, frame->bufferSize);
     ZExImage* image = MakeImage(*frame);
-    if (image != nullptr) DeliverImage(image);
+    if (image == nullptr) {
+        streamCounters.bad.Add();
+        return;
+    }
+    DeliverImage(image);
 }
 
 bool MorvaneFWCamera::IsFrameValid(tStFrameInfo* frame) {
@@ -165,7 +170,15 @@ void MorvaneFWCamera::DeliverImage(ZExImage* image) {
     // Kept: the result is not looked at; what the pipeline could not do leaves the image as it was.
     if (imagePipeline != nullptr) (void)imagePipeline->ProcessImage(image, &isComplete);
     const StreamCallbacks callbacks = streaming.callbacks.Get();
-    if (!isComplete || callbacks.image == nullptr) return;
+    if (!isComplete) {
+        streamCounters.heldBack.Add();
+        return;
+    }
+    streamCounters.delivered.Add(image->GetErrorCode());
+    if (callbacks.image == nullptr) {
+        streamCounters.withoutTaker.Add(image->GetErrorCode());
+        return;
+    }
     ZImageReceivedCallbackStruct record{owned.release(), callbacks.refCon, image->GetErrorCode()};
     (void)callbacks.image(&record);  // its result has no reader
 }

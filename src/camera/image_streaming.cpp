@@ -85,7 +85,9 @@ void MorvaneFWCamera::ClearFrameInfoVector() {
     // client offers comes from the C allocator and is given up.
     for (std::size_t round = 0; round < streaming.frameQueue.GetCount(); ++round) {
         tStFrameInfo* frame = streaming.frameQueue.TakeNewest();
-        if (frame != nullptr) FreeFrameWithBuffer(frame);
+        if (frame == nullptr) continue;
+        FreeFrameWithBuffer(frame);
+        streamCounters.cleared.Add();
     }
 }
 

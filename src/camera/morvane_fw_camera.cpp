@@ -1,6 +1,8 @@
 #include "camera/morvane_fw_camera.h"
 
+#include <algorithm>
 #include <cstdio>
+#include <iterator>
 
 namespace ZV {
 
@@ -74,6 +76,17 @@ void MorvaneFWCamera::MakeSynchronisation() {
             std::fputs(row.createFailed, stdout);
         }
     }
+}
+
+bool MorvaneFWCamera::HasSynchronisation() const {
+    return std::all_of(std::begin(Semaphores), std::end(Semaphores),
+                       [this](const SemaphoreRow& row) {
+                           return IsHALSemaphoreMade(streaming.*row.semaphore);
+                       }) &&
+           std::all_of(std::begin(Conditions), std::end(Conditions),
+                       [this](const ConditionRow& row) {
+                           return IsHALConditionMade(streaming.*row.condition);
+                       });
 }
 
 void MorvaneFWCamera::DestroySynchronisation() {

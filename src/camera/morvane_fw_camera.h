@@ -351,6 +351,10 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void PrivateImageStreamingRunLoop();
     void PrivateRunExposeDoneCB();
 
+    /// False when one of the camera's locks or conditions could not be made: a call would not know
+    /// whether it holds it.
+    bool HasSynchronisation() const;
+
     /// True while one of the camera's two threads lives: a close does not wait for ever for an
     /// exposure callback that lasts.
     bool HasLivingThreads() const {
@@ -476,6 +480,8 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     CameraResult StopUnderSwitchMutex();
     void ClearFrameInfoVector();
 
+    /// Null when the frame is refused.
+    tStFrameInfo* MakeHeldFrame();
     bool DropSurplusFrame();
     bool ProvideBuffer(tStFrameInfo& frame);
     bool DescribeFrame(tStFrameInfo& frame);
@@ -495,6 +501,7 @@ class ZENTARA_API MorvaneFWCamera : public ZCamera {
     void RunShielded(void (MorvaneFWCamera::*step)());
 
     HALStatus ForgetOneImage();
+    void DropOneImage(ZExImage* next);
     ZExImage* ClaimOneImage();
     CameraResult AwaitOneImage();
     static void* TakeOneImage(ZImageReceivedCallbackStruct* record);

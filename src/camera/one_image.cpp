@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "camera/morvane_fw_camera.h"
+#include "imaging/ex_image.h"
 
 namespace ZV {
 
@@ -44,9 +45,16 @@ CameraResult MorvaneFWCamera::GetOneImage(ZExImage** image) {
 /// in the callback: a run loop late with the former call's image must not leave half of it.
 HALStatus MorvaneFWCamera::ForgetOneImage() {
     const std::lock_guard hold(streaming.oneImageMutex);
-    FreeImage(std::exchange(streaming.oneImage, nullptr));
+    DropOneImage(nullptr);
     streaming.oneImageReady = false;
     return HAL_ConditionReset(streaming.oneImageCondition);
+}
+
+/// Puts `next` in the place of an image that nobody came for. Under the mutex.
+void MorvaneFWCamera::DropOneImage(ZExImage* next) {
+    ZExImage* const late = std::exchange(streaming.oneImage, next);
+    if (late != nullptr) streamCounters.withoutTaker.Add(late->GetErrorCode());
+    FreeImage(late);
 }
 
 ZExImage* MorvaneFWCamera::ClaimOneImage() {
@@ -75,7 +83,7 @@ void* MorvaneFWCamera::TakeOneImage(ZImageReceivedCallbackStruct* record) {
     auto& camera = static_cast<MorvaneFWCamera&>(*static_cast<ZCamera*>(record->refCon));
     StreamingState& streaming = camera.streaming;
     const std::lock_guard hold(streaming.oneImageMutex);
-    FreeImage(std::exchange(streaming.oneImage, record->image));
+    camera.DropOneImage(record->image);
     streaming.oneImageReady = true;
     const HALStatus status = HAL_ConditionSignal(streaming.oneImageCondition);
     if (status != HALOk) {

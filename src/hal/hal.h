@@ -145,6 +145,10 @@ ZENTARA_API HALStatus FWCameraReallocateBandwidth(HALCamera* camera, std::uint16
 /// Ends a HAL thread's wait record check: true when HAL_ThreadCreate could start its thread. A
 /// thread that could not be made counts as ended.
 bool IsHALThreadStarted(const HALThread* thread);
+/// False for one that could not be made, which HAL_SemaphoreCreate and HAL_ConditionCreate do not
+/// tell.
+bool IsHALSemaphoreMade(const HALSemaphore* semaphore);
+bool IsHALConditionMade(const HALCondition* condition);
 
 /// What a waiter for frames has seen: it goes on at once when `count` no longer holds `seen`.
 struct FrameArrivals {

@@ -182,4 +182,12 @@ bool IsHALThreadStarted(const HALThread* thread) {
     return thread != nullptr && thread->handle != nullptr;
 }
 
+bool IsHALSemaphoreMade(const HALSemaphore* semaphore) {
+    return semaphore != nullptr && semaphore->handle != nullptr;
+}
+
+bool IsHALConditionMade(const HALCondition* condition) {
+    return condition != nullptr && condition->handle != nullptr;
+}
+
 }  // namespace ZV

@@ -142,5 +142,35 @@ TEST_F(FailingAllocation, OfLoadListAndReleaseGivesACodeAndTheNextRunIsClean) {
     EXPECT_FALSE(hasRefused);
 }
 
+TEST_F(FailingAllocation, OfAListingLeavesNoCameraWhoseCallsHang) {
+    bool hasRefused = true;
+    for (std::int64_t failing = 1; hasRefused && failing < AllocationsMax; ++failing) {
+        SCOPED_TRACE(failing);
+        ASSERT_ZERR(zerrNone, Zentara_LoadDriver());
+        std::uint32_t length = 4;
+
+        BeginAllocations(failing);
+        const ZentaraResult listed = Zentara_ListCameras(items, &length);
+        hasRefused = EndAllocations();
+
+        EXPECT_PRED1(IsKnown, listed);
+        ZentaraHandle handle = 0;
+        if (length != 0) {
+            EXPECT_PRED1(IsKnown, Zentara_OpenCamera(items[0].cameraId, &handle));
+        }
+        if (handle != 0) {
+            EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+            EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+            EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+            EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+            EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+        }
+        Zentara_ReleaseDriver();
+        ExpectNothingHeld();
+        if (HasFailure()) break;
+    }
+    EXPECT_FALSE(hasRefused);
+}
+
 }  // namespace
 }  // namespace ZV::Test

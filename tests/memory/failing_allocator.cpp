@@ -1,6 +1,11 @@
 #include "memory/failing_allocator.h"
 
+#include <pthread.h>
+#include <sys/mman.h>
+#include <sys/types.h>
+
 #include <atomic>
+#include <cerrno>
 #include <cstddef>
 #include <new>
 
@@ -13,8 +18,11 @@ namespace {
 std::atomic<bool> isCounting{false};
 std::atomic<std::int64_t> allocationsLeft{0};  // 0 from the refused one on
 
+thread_local int uncountedDepth = 0;
+
 bool MayAllocate() {
-    return !isCounting.load() || allocationsLeft.fetch_sub(1) != 1;
+    if (!isCounting.load() || uncountedDepth != 0) return true;
+    return allocationsLeft.fetch_sub(1) != 1;
 }
 
 }  // namespace
@@ -33,6 +41,18 @@ bool HasRefusedAllocation() {
     return allocationsLeft.load() <= 0;
 }
 
+std::int64_t CountAllocationsLeft() {
+    return allocationsLeft;
+}
+
+UncountedAllocations::UncountedAllocations() {
+    ++uncountedDepth;
+}
+
+UncountedAllocations::~UncountedAllocations() {
+    --uncountedDepth;
+}
+
 }  // namespace ZV::Test
 
 using ZV::Test::MayAllocate;
@@ -49,6 +69,12 @@ void* __real__Znwm(std::size_t bytes);
 void* __real__ZnwmRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept;
 void* __real__Znam(std::size_t bytes);
 void* __real__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept;
+
+int __real_pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
+                          void* (*entry)(void*), void* argument);
+int __real_shm_open(const char* name, int flags, mode_t mode);
+void* __real_mmap(void* address, std::size_t bytes, int protection, int flags, int file,
+                  off_t offset);
 
 void* __wrap_malloc(std::size_t bytes) {
     return MayAllocate() ? __real_malloc(bytes) : nullptr;
@@ -78,6 +104,25 @@ void* __wrap__Znam(std::size_t bytes) {
 
 void* __wrap__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept {
     return MayAllocate() ? __real__ZnamRKSt9nothrow_t(bytes, tag) : nullptr;
+}
+
+int __wrap_pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
+                          void* (*entry)(void*), void* argument) {
+    if (!MayAllocate()) return EAGAIN;
+    return __real_pthread_create(thread, attributes, entry, argument);
+}
+
+int __wrap_shm_open(const char* name, int flags, mode_t mode) {
+    if (MayAllocate()) return __real_shm_open(name, flags, mode);
+    errno = EMFILE;
+    return -1;
+}
+
+void* __wrap_mmap(void* address, std::size_t bytes, int protection, int flags, int file,
+                  off_t offset) {
+    if (MayAllocate()) return __real_mmap(address, bytes, protection, flags, file, offset);
+    errno = ENOMEM;
+    return MAP_FAILED;
 }
 
 }  // extern "C"

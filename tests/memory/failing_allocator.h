@@ -5,8 +5,8 @@
 namespace ZV::Test {
 
 /// From here on counts what the library and the test allocate, on all threads, and refuses number
-/// `failing`, counted from 1. Memory that the standard library's own code or the simulation takes
-/// is not counted.
+/// `failing`, counted from 1. Threads, shared memory and its mappings count as allocations. Memory
+/// that the standard library's own code or the simulation takes is not counted.
 void BeginAllocations(std::int64_t failing);
 
 /// Ends the counting. True when the allocation came that was to be refused.
@@ -14,5 +14,17 @@ bool EndAllocations();
 
 /// The same without ending the counting.
 bool HasRefusedAllocation();
+
+/// How many are left before the one that is to be refused, that one included.
+std::int64_t CountAllocationsLeft();
+
+/// While it lives, what its thread allocates is neither counted nor refused.
+class UncountedAllocations {
+  public:
+    UncountedAllocations();
+    ~UncountedAllocations();
+    UncountedAllocations(const UncountedAllocations&) = delete;
+    UncountedAllocations& operator=(const UncountedAllocations&) = delete;
+};
 
 }  // namespace ZV::Test

@@ -260,6 +260,16 @@ TEST_F(SceneImageTest, AFileOfAnotherKindIsRefused) {
     ExpectRefused("text.png", "it is neither a PNG nor a TIFF nor a FITS file");
 }
 
+TEST_F(SceneImageTest, AFileThatIsShorterThanItsHeaderSaysIsRefusedBeforeThereIsRoomForIt) {
+    // Small files with a row of a tebibyte, and with images of gibibytes.
+    for (const char* name : {"wide.tiff", "samples.tiff", "wide.png", "short.fits"}) {
+        std::filesystem::copy_file(
+            std::filesystem::path(ZENTARA_SOURCE_DIR) / "fuzz/corpus/image_file" / name,
+            folder.GetPath(name));
+        ExpectRefused(name, "it is shorter than its header says");
+    }
+}
+
 TEST_F(SceneImageTest, AnImageFileCutAtAnyLengthIsRefusedOrReadButNeverCrashes) {
     WriteTiff16("whole.tif", std::vector<std::uint16_t>(64, 4000), 8, 1);
     std::vector<char> bytes(std::filesystem::file_size(folder.GetPath("whole.tif")));

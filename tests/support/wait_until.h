@@ -17,4 +17,10 @@ template <typename Condition>
     return true;
 }
 
+/// Lets other threads and processes come to another point. No test may need it to pass: it spreads
+/// the moments at which something happens.
+inline void Disturb(std::chrono::microseconds length) {
+    std::this_thread::sleep_for(length);
+}
+
 }  // namespace ZV::Test

@@ -85,6 +85,30 @@ TEST_F(CameraThatCannotBeClosed, TakesASecondCloseWhichTriesAgain) {
     EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
 }
 
+TEST_F(CameraThatCannotBeClosed, IsGivenUpAtTheNextListingWhichFindsItAgain) {
+    ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_FREE_RESOURCES"})"));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    ASSERT_EQ(1u, world.GetState().openHandles);
+
+    ASSERT_EQ(1u, ListCameras().size());
+
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
+    ClientFrame frame(GetImageBytes());
+    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+}
+
+TEST_F(CameraThatCannotBeClosed, IsFoundByTheListingAfterItHasGoneAndComeBack) {
+    ASSERT_TRUE(world.Unplug());
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+    ASSERT_TRUE(world.Plug());
+
+    ASSERT_EQ(1u, ListCameras().size());
+
+    ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
+    ClientFrame frame(GetImageBytes());
+    EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+}
+
 TEST_F(CameraThatCannotBeClosed, ReturnsFromItsCloseWhenTheDeliveryInProgressHasEnded) {
     LastingDelivery delivery;
     ClientFrame frame(GetImageBytes());

@@ -122,6 +122,17 @@ TEST(TiffReader, OnlyLightOfOneOrThreeColoursIsRead) {
     }
 }
 
+TEST(ImageReadersDoor, AnImageThatTheFileCannotHoldIsRefusedBeforeThereIsRoomForIt) {
+    const std::string folder = ZENTARA_SOURCE_DIR "/fuzz/corpus/image_file/";
+    for (const char* name : {"huge.tiff", "wide.png", "huge.png"}) {
+        Image read;
+
+        EXPECT_EQ("the file is shorter than its header says", ReadImage(folder + name, &read))
+            << name;
+        EXPECT_TRUE(read.pixels.empty()) << name;
+    }
+}
+
 TEST(PrepareImage, OnlyImagesOfCamerasHaveRoom) {
     Image image;
 

@@ -478,6 +478,32 @@ TEST(Program, AStreamWithALostPacketCountsTheDamagedFrameAndEndsWithCode6) {
     EXPECT_EQ(1, json::parse(result.output)["damaged"]);
 }
 
+TEST(Program, AStreamNamesTheFramesThatAreMissingAndTheErrorsOfTheOthers) {
+    const TracedScenario scenario(
+        R"({"sensor": {"width": 64, "height": 48},
+            "faults": [{"kind": "losePacket", "frame": 3, "packet": 0},
+                       {"kind": "missingTail", "frame": 5, "packet": 1}]})");
+    const std::vector<std::string> arguments{"stream",           "0",       "--simulation",
+                                             scenario.GetName(), "--count", "12"};
+
+    const ProgramResult text = RunProgram(arguments);
+    std::vector<std::string> jsonArguments = arguments;
+    jsonArguments.push_back("--json");
+    const json report = json::parse(RunProgram(jsonArguments).output);
+
+    EXPECT_EQ(6, text.exitCode) << text.errors;
+    EXPECT_THAT(text.output, HasSubstr("missing frames: "));
+    std::uint64_t missing = 0;
+    bool isThirdMissing = false;
+    for (const json& run : report["missing"]) {
+        missing += run[1].get<std::uint64_t>() - run[0].get<std::uint64_t>() + 1;
+        isThirdMissing = isThirdMissing || (run[0] <= 3 && run[1] >= 3);
+    }
+    EXPECT_TRUE(isThirdMissing) << report.dump();
+    EXPECT_EQ(report["drops"], missing);
+    EXPECT_EQ(12, report["frames"]);
+}
+
 TEST(Program, TheTextsOfTheLibraryDoNotMixWithItsOwnOutput) {
     const ProgramResult result = RunProgram({"list", "--simulation", "model:Unknown", "--json"});
 

@@ -1,0 +1,249 @@
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <atomic>
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <thread>
+#include <vector>
+
+#include "soak/process_usage.h"
+#include "soak/soaked_camera.h"
+#include "support/wait_until.h"
+#include "zentara/zentara.h"
+
+// Streams from many simulated cameras for as long as one says; `scripts/soak` builds and runs it.
+namespace ZV::Soak {
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using namespace std::chrono_literals;
+
+constexpr auto MeasuringStep = 250ms;
+constexpr std::uint32_t CamerasMax = 64;
+
+std::atomic<bool> isInterrupted{false};
+/// The library's own words go to standard output; they are not looked at here.
+std::FILE* output = stdout;
+
+void PartOutputs() {
+    const int own = dup(STDOUT_FILENO);
+    if (own < 0) return;
+    output = fdopen(own, "w");
+    if (output == nullptr || std::freopen("/dev/null", "w", stdout) == nullptr) std::abort();
+}
+
+struct Options {
+    std::uint64_t seconds = 60, minuteSeconds = 60;
+    std::uint32_t cameras = 10;
+    double faults = 0.001;
+    std::string state;
+};
+
+struct OptionRow {
+    std::string_view name;
+    void (*read)(const char* text, Options* options);
+};
+
+constexpr OptionRow OptionRows[] = {
+    {"--seconds",
+     [](const char* text, Options* o) { o->seconds = std::strtoull(text, nullptr, 10); }},
+    {"--minute",
+     [](const char* text, Options* o) { o->minuteSeconds = std::strtoull(text, nullptr, 10); }},
+    {"--cameras",
+     [](const char* text, Options* o) {
+         o->cameras = static_cast<std::uint32_t>(std::strtoul(text, nullptr, 10));
+     }},
+    {"--faults", [](const char* text, Options* o) { o->faults = std::strtod(text, nullptr); }},
+    {"--state", [](const char* text, Options* o) { o->state = text; }},
+};
+
+bool ReadOptions(int count, char** arguments, Options* options) {
+    for (int i = 1; i < count; i += 2) {
+        const OptionRow* found = nullptr;
+        for (const OptionRow& row : OptionRows) {
+            if (row.name == arguments[i]) found = &row;
+        }
+        if (found == nullptr || i + 1 == count) return false;
+        found->read(arguments[i + 1], options);
+    }
+    return options->cameras >= 1 && options->cameras <= CamerasMax && options->minuteSeconds > 0;
+}
+
+/// Packets that go wrong at the rate; a frame has some tens of them.
+std::string MakeFaults(double rate) {
+    constexpr std::array Kinds{"losePacket",  "repeatPacket",     "truncatePacket", "corruptPacket",
+                               "missingTail", "overwriteRequest", "frameStart",     "wrongPsn"};
+    std::string faults;
+    for (const char* kind : Kinds) {
+        if (!faults.empty()) faults += ", ";
+        faults += std::string(R"({"kind": ")") + kind + R"(", "probability": )" +
+                  std::to_string(rate / Kinds.size()) + "}";
+    }
+    return faults;
+}
+
+/// Cameras of all versions of the stream, each on a bus of its own.
+std::string MakeScenario(const Options& options) {
+    constexpr std::array Models{"SolvaneA1", "PellanA1", "SolvaneG1", "SolvaneC2", "Folary"};
+    std::string buses, cameras;
+    for (std::uint32_t i = 0; i < options.cameras; ++i) {
+        const char* separator = i == 0 ? "" : ", ";
+        buses += std::string(separator) + "{}";
+        cameras += std::string(separator) + R"({"model": ")" + Models[i % Models.size()] +
+                   R"(", "bus": )" + std::to_string(i) + R"(, "streamingVersion": )" +
+                   std::to_string(i % 3) +
+                   R"(, "sensor": {"width": 320, "height": 240, "noise": false}, "faults": [)" +
+                   MakeFaults(options.faults) + "]}";
+    }
+    return R"({"timeScale": 0, "buses": [)" + buses + R"(], "cameras": [)" + cameras + "]}";
+}
+
+class ScenarioFile {
+  public:
+    explicit ScenarioFile(const std::string& text) {
+        std::string pattern = (std::filesystem::temp_directory_path() / "soak-XXXXXX").string();
+        if (mkdtemp(pattern.data()) == nullptr) return;
+        folder = pattern;
+        const std::string path = (folder / "scenario.json").string();
+        std::ofstream(path) << text;
+        (void)setenv("ZENTARA_SIMULATION", path.c_str(), 1);  // an unset one lists no camera
+    }
+    ~ScenarioFile() {
+        std::error_code ignored;
+        if (!folder.empty()) std::filesystem::remove_all(folder, ignored);
+    }
+    ScenarioFile(const ScenarioFile&) = delete;
+    ScenarioFile& operator=(const ScenarioFile&) = delete;
+
+  private:
+    std::filesystem::path folder;
+};
+
+class Soak {
+  public:
+    Soak(const Options& soakOptions, const SoakSums& formerSums)
+        : options(soakOptions), former(formerSums) {}
+
+    bool Begin() {
+        if (Zentara_LoadDriver() != zerrNone) return false;
+        std::array<Zentara_CamListItem, CamerasMax> items{};
+        std::uint32_t length = CamerasMax;
+        if (Zentara_ListCameras(items.data(), &length) != zerrNone) return false;
+        if (length != options.cameras) return false;
+        for (std::uint32_t i = 0; i < length; ++i) {
+            cameras.push_back(std::make_unique<SoakedCamera>(i, items[i].uniqueId, listMutex));
+        }
+        for (const auto& camera : cameras) {
+            threads.emplace_back([this, &camera] { camera->Run(isOver); });
+        }
+        return true;
+    }
+
+    void Watch() {
+        begin = Clock::now();
+        while (!isInterrupted && !DoAllStream()) Test::Disturb(MeasuringStep);
+        begin = Clock::now();
+        const auto end = begin + std::chrono::seconds(options.seconds);
+        auto minute = begin + std::chrono::seconds(options.minuteSeconds);
+        while (!isInterrupted && Clock::now() < end) {
+            Test::Disturb(MeasuringStep);
+            judge.Add(MeasureUsage());
+            if (Clock::now() < minute) continue;
+            judge.EndMinute();
+            Tell();
+            minute += std::chrono::seconds(options.minuteSeconds);
+        }
+    }
+
+    /// 0 if nothing grew, every frame is accounted for and no call failed without a reason.
+    int End() {
+        isOver = true;
+        for (std::thread& thread : threads) thread.join();
+        Zentara_ReleaseDriver();
+        Tell();
+        const SoakSums sums = AddUp();
+        if (!judge.IsSteady()) (void)std::fputs("memory, threads or handles have grown\n", output);
+        if (sums.unaccounted != 0) (void)std::fputs("frames are missing without a count\n", output);
+        if (sums.failures != 0) (void)std::fputs("calls have failed\n", output);
+        return judge.IsSteady() && sums.unaccounted == 0 && sums.failures == 0 ? 0 : 1;
+    }
+
+  private:
+    bool DoAllStream() const {
+        return std::all_of(cameras.begin(), cameras.end(),
+                           [](const auto& camera) { return camera->GetSums().frames > 0; });
+    }
+    SoakSums AddUp() const {
+        SoakSums sums = former;
+        for (const auto& camera : cameras) sums += camera->GetSums();
+        sums.seconds += static_cast<std::uint64_t>(
+            std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin).count());
+        return sums;
+    }
+    void Tell() const {
+        const SoakSums sums = AddUp();
+        const ProcessUsage usage = MeasureUsage();
+        std::fprintf(output, "%s; resident %.1f MB, heap %.1f MB, threads %llu, handles %llu\n",
+                     Describe(sums).c_str(), static_cast<double>(usage.residentBytes) / 1e6,
+                     static_cast<double>(usage.heapBytes) / 1e6,
+                     static_cast<unsigned long long>(usage.threads),
+                     static_cast<unsigned long long>(usage.handles));
+        (void)std::fflush(output);  // a picture of progress
+        if (options.state.empty() || WriteState(options.state, sums)) return;
+        std::fprintf(output, "%s cannot be written\n", options.state.c_str());
+    }
+
+    const Options& options;
+    const SoakSums former;
+    std::mutex listMutex;
+    std::atomic<bool> isOver{false};
+    std::vector<std::unique_ptr<SoakedCamera>> cameras;
+    std::vector<std::thread> threads;
+    Clock::time_point begin;
+    GrowthJudge judge;
+};
+
+int Run(int count, char** arguments) {
+    PartOutputs();
+    Options options;
+    if (!ReadOptions(count, arguments, &options)) {
+        std::fputs(
+            "zentara-soak [--seconds N] [--cameras N] [--faults RATE] [--state FILE] "
+            "[--minute SECONDS]\n",
+            stderr);
+        return 2;
+    }
+    SoakSums former;
+    if (!options.state.empty() && !ReadState(options.state, &former)) {
+        std::fprintf(output, "%s holds no sums of a soak\n", options.state.c_str());
+        return 2;
+    }
+    for (const int signal : {SIGINT, SIGTERM}) {
+        (void)std::signal(signal, [](int) { isInterrupted = true; });
+    }
+    const ScenarioFile scenario(MakeScenario(options));
+    Soak soak(options, former);
+    if (!soak.Begin()) {
+        (void)std::fputs("the cameras cannot be listed\n", output);
+        return 2;
+    }
+    soak.Watch();
+    return soak.End();
+}
+
+}  // namespace
+}  // namespace ZV::Soak
+
+int main(int count, char** arguments) {
+    return ZV::Soak::Run(count, arguments);
+}

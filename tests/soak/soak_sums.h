@@ -1,0 +1,29 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+namespace ZV::Soak {
+
+/// What a soak adds up, over all of its runs.
+struct SoakSums {
+    std::uint64_t seconds = 0;
+    std::uint64_t frames = 0, bytes = 0, gaps = 0, missing = 0, damaged = 0, repeats = 0;
+    /// Of the engine: what became of the frames that no client saw.
+    std::uint64_t begun = 0, dropped = 0, refused = 0, bad = 0, cleared = 0, withoutTaker = 0;
+    std::uint64_t unaccounted = 0;  ///< Begun and neither delivered nor counted: a fault.
+    std::uint64_t changes = 0, restarts = 0, reopens = 0, unplugs = 0;
+    std::uint64_t failures = 0;  ///< Calls that failed with no fault to explain it.
+
+    SoakSums& operator+=(const SoakSums& other);
+};
+
+/// One line, without an end.
+std::string Describe(const SoakSums& sums);
+
+/// Sums of the former runs; zeros for a file that is not there. False for a file that is none.
+bool ReadState(const std::string& path, SoakSums* sums);
+/// Takes the file's place in one step. False when it cannot be written.
+bool WriteState(const std::string& path, const SoakSums& sums);
+
+}  // namespace ZV::Soak

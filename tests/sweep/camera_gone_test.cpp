@@ -1,0 +1,282 @@
+// The camera goes away while it is used, comes back, and is listed, opened and used again; and its
+// bus is reset. That it goes at each request of an opening, a close and every other story, and
+// stays away until all is closed, is a part of the sweep (sweep_test.cpp).
+
+#include <gtest/gtest.h>
+
+#include <array>
+#include <memory>
+#include <string>
+#include <thread>
+
+#include "hal/platform/clock.h"
+#include "support/flat_camera.h"
+#include "support/settings_words.h"
+
+namespace ZV::Test {
+namespace {
+
+constexpr std::uint32_t BufferBytes = 64 * 48 * 2;
+constexpr std::uint32_t SpeedIndexSlowest = 3;  ///< Its packets are the smallest.
+constexpr std::uint32_t TriggerSoftware = 5;
+constexpr std::uint32_t PacketsMax = 200;
+
+struct Sender {
+    const char* name;
+    const char* base;
+    int streamingVersion;
+};
+constexpr Sender Senders[] = {
+    {"VersionZero", "old", 0},
+    {"VersionOne", "mono", 1},
+    {"VersionTwo", "rotated", 2},
+    {"TwoFields", "folary", 1},
+};
+
+std::string MakeScenario(const Sender& sender, double timeScale = 0) {
+    return R"({"base": ")" + std::string(sender.base) + R"(", "timeScale": )" +
+           std::to_string(timeScale) +
+           R"(, "cameras": [{"sensor": {"width": 64, "height": 48, "noise": false},
+               "streamingVersion": )" +
+           std::to_string(sender.streamingVersion) + "}]}";
+}
+
+/// A client whose camera may vanish, over a bus of its own.
+class Visitor {
+  public:
+    explicit Visitor(const std::string& scenario) : world(scenario) {
+        SetWaitClockDivisor(1000);
+        EXPECT_ZERR(zerrNone, Zentara_LoadDriver());
+        Open();
+    }
+    ~Visitor() {
+        Zentara_ReleaseDriver();
+        ClientMemory::LetGo();
+        SetWaitClockDivisor(1);
+    }
+    Visitor(const Visitor&) = delete;
+    Visitor& operator=(const Visitor&) = delete;
+
+    /// Lists, opens the camera and puts 16 bits in small packets in force.
+    void Open(std::uint32_t triggerMode = 0) {
+        Zentara_CamListItem items[2] = {};
+        std::uint32_t length = 2;
+        ASSERT_ZERR(zerrNone, Zentara_ListCameras(items, &length));
+        ASSERT_EQ(1U, length);
+        ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
+        Zentara_Settings settings{};
+        ASSERT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(handle, &settings));
+        SetWord(settings, zprmImageFormat, GetWord(settings, zprmImageFormat) | 1);
+        SetWord(settings, zprmReadoutSpeed, SpeedIndexSlowest);
+        SetWord(settings, zprmTriggerType, triggerMode);
+        SetWide(settings, zprm64Exposure, 2'000'000);
+        ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(handle, &settings));
+    }
+    void QueueFrames(std::size_t count) {
+        log = std::make_unique<CallbackLog>();
+        frames.clear();
+        for (std::size_t i = 0; i < count; ++i) {
+            frames.push_back(std::make_unique<ClientFrame>(BufferBytes));
+            ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, frames[i]->Get(), CallbackLog::Record,
+                                                     zcbFrameDone, log->GetPrivate(),
+                                                     static_cast<std::uint32_t>(i)));
+        }
+    }
+    void StartStream(std::size_t count) {
+        QueueFrames(count);
+        ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+    }
+    /// Streams anew; all frames come whole.
+    void ExpectStream() {
+        StartStream(4);
+        ASSERT_TRUE(log->WaitForCalls(4));
+        for (const auto& frame : frames) EXPECT_ZERR(zerrNone, (*frame)->errorCode);
+        EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+        EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+    }
+    /// All that a client does about a camera that has gone, and what it gets when it is back.
+    void ExpectReturn(ZentaraResult stopped = zerrDriverFault) {
+        EXPECT_ZERR(stopped, Zentara_SetStreaming(handle, 0));
+        EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+        ASSERT_TRUE(world.Plug());
+        ASSERT_NO_FATAL_FAILURE(Open());
+        ASSERT_NO_FATAL_FAILURE(ExpectStream());
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+        EXPECT_EQ(0U, world.GetState().openHandles);
+    }
+    bool HasGone() const {
+        for (const TraceRecord& record : world.ReadTrace()) {
+            if (record.type == "unplug") return true;
+        }
+        return false;
+    }
+
+    SimulationWorld world;
+    ZentaraHandle handle = 0;
+    std::unique_ptr<CallbackLog> log;
+    std::vector<std::unique_ptr<ClientFrame>> frames;
+};
+
+std::string MakePacketFault(const char* kind, std::uint32_t packet) {
+    return R"({"kind": ")" + std::string(kind) + R"(", "frame": 2, "packet": )" +
+           std::to_string(packet) + "}";
+}
+
+class VanishingCamera : public testing::TestWithParam<Sender> {};
+
+TEST_P(VanishingCamera, IsUsedAgainAfterItHasGoneAtAnyPacketOfAFrame) {
+    bool hasGone = true;
+    std::uint32_t packet = 0;
+    for (; hasGone && packet < PacketsMax && !HasFailure(); ++packet) {
+        SCOPED_TRACE(packet);
+        Visitor visitor(MakeScenario(GetParam()));
+        ASSERT_TRUE(visitor.world.AddFault(MakePacketFault("unplug", packet)));
+        ASSERT_NO_FATAL_FAILURE(visitor.StartStream(6));
+
+        hasGone = false;
+        ASSERT_TRUE(WaitUntil([&] {
+            hasGone = visitor.HasGone();
+            return hasGone || visitor.log->CountCalls() >= 6;
+        }));
+
+        if (hasGone) visitor.ExpectReturn();
+    }
+    EXPECT_FALSE(hasGone);
+    EXPECT_GT(packet, 2U) << "a frame is of several packets";
+}
+
+TEST_P(VanishingCamera, GoesOnAfterABusResetAtAnyPacketOfAFrame) {
+    bool wasReset = true;
+    std::uint32_t packet = 0;
+    for (; wasReset && packet < PacketsMax && !HasFailure(); ++packet) {
+        SCOPED_TRACE(packet);
+        Visitor visitor(MakeScenario(GetParam()));
+        ASSERT_TRUE(visitor.world.AddFault(MakePacketFault("busReset", packet)));
+
+        ASSERT_NO_FATAL_FAILURE(visitor.StartStream(8));
+        ASSERT_TRUE(visitor.log->WaitForCalls(8));
+
+        EXPECT_ZERR(zerrNone, (*visitor.frames.back())->errorCode);
+        EXPECT_ZERR(zerrNone, Zentara_SetStreaming(visitor.handle, 0));
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+        wasReset = false;
+        for (const TraceRecord& record : visitor.world.ReadTrace()) {
+            wasReset |= record.type == "busReset";
+        }
+    }
+    EXPECT_FALSE(wasReset);
+    EXPECT_GT(packet, 2U) << "a frame is of several packets";
+}
+
+TEST_P(VanishingCamera, IsUsedAgainAfterItHasGoneBetweenTwoFrames) {
+    // In real time most of a frame is its exposure.
+    Visitor visitor(MakeScenario(GetParam(), 10));
+    ASSERT_NO_FATAL_FAILURE(visitor.StartStream(6));
+    ASSERT_TRUE(visitor.log->WaitForCalls(2));
+
+    ASSERT_TRUE(visitor.world.Unplug());
+
+    visitor.ExpectReturn();
+}
+
+TEST_P(VanishingCamera, IsUsedAgainAfterItHasGoneWhileAStreamWaitedForATrigger) {
+    Visitor visitor(MakeScenario(GetParam()));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+    ASSERT_NO_FATAL_FAILURE(visitor.Open(TriggerSoftware));
+    ASSERT_NO_FATAL_FAILURE(visitor.StartStream(2));
+    ASSERT_ZERR(zerrNone, Zentara_Trigger(visitor.handle));
+    ASSERT_TRUE(visitor.log->WaitForCalls(1));
+
+    ASSERT_TRUE(visitor.world.Unplug());
+
+    EXPECT_ZERR(zerrDriverFault, Zentara_Trigger(visitor.handle));
+    visitor.ExpectReturn();
+}
+
+TEST_P(VanishingCamera, IsUsedAgainAfterItHasGoneWhileAGrabWaitedForATrigger) {
+    Visitor visitor(MakeScenario(GetParam()));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+    ASSERT_NO_FATAL_FAILURE(visitor.Open(TriggerSoftware));
+    ClientFrame frame(BufferBytes);
+    std::atomic<bool> hasEnded{false};
+    ZentaraResult grabbed = zerrNone;
+    std::thread grab([&] {
+        grabbed = Zentara_GrabFrame(visitor.handle, frame.Get());
+        hasEnded = true;
+    });
+    EXPECT_TRUE(WaitUntil([&] { return visitor.world.GetState().isStreaming != 0; }));
+
+    EXPECT_TRUE(visitor.world.Unplug());
+
+    // An abort before the grab waits does not count, so it is repeated.
+    EXPECT_TRUE(WaitUntil([&] {
+        (void)Zentara_Abort(visitor.handle);
+        return hasEnded.load();
+    }));
+    grab.join();
+    EXPECT_ZERR(zerrDriverFault, grabbed);
+    visitor.ExpectReturn(zerrNone);  // the grab has stopped its stream
+}
+
+INSTANTIATE_TEST_SUITE_P(Senders, VanishingCamera, testing::ValuesIn(Senders),
+                         [](const auto& test) { return std::string(test.param.name); });
+
+/// A camera that goes at one request and is back at one of the next.
+class BriefAbsence : public testing::Test {
+  protected:
+    static void Interrupt(Visitor& visitor, std::uint32_t request, std::uint32_t length) {
+        const auto fault = [&](const char* kind, std::uint32_t number) {
+            return R"({"kind": ")" + std::string(kind) + R"(", "request": )" +
+                   std::to_string(number) + "}";
+        };
+        ASSERT_TRUE(visitor.world.AddFault(fault("unplug", request)));
+        ASSERT_TRUE(visitor.world.AddFault(fault("plug", request + length)));
+    }
+    /// The camera is back at the latest now.
+    static void ExpectUse(Visitor& visitor) {
+        ASSERT_TRUE(visitor.world.Plug());
+        ASSERT_NO_FATAL_FAILURE(visitor.Open());
+        ASSERT_NO_FATAL_FAILURE(visitor.ExpectStream());
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+        EXPECT_EQ(0U, visitor.world.GetState().openHandles);
+    }
+
+    static constexpr Sender Plain = Senders[1];
+};
+
+TEST_F(BriefAbsence, OfAnyLengthDuringAnOpeningIsOverWithTheNextListing) {
+    for (std::uint32_t request = 1; request <= 4 && !HasFailure(); ++request) {
+        for (std::uint32_t length = 1; length <= 4 && !HasFailure(); ++length) {
+            SCOPED_TRACE(request * 10 + length);
+            Visitor visitor(MakeScenario(Plain));
+            ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+            ASSERT_NO_FATAL_FAILURE(Interrupt(visitor, request, length));
+
+            ZentaraHandle opened = 0;
+            EXPECT_NE(zerrNone, Zentara_OpenCamera(0, &opened));
+
+            ExpectUse(visitor);
+        }
+    }
+}
+
+TEST_F(BriefAbsence, OfAnyLengthDuringACloseIsOverWithTheNextListing) {
+    for (std::uint32_t request = 1; request <= 8 && !HasFailure(); ++request) {
+        for (std::uint32_t length = 1; length <= 3 && !HasFailure(); ++length) {
+            SCOPED_TRACE(request * 10 + length);
+            Visitor visitor(MakeScenario(Plain));
+            ASSERT_NO_FATAL_FAILURE(visitor.StartStream(2));
+            ASSERT_TRUE(visitor.log->WaitForCalls(2));
+            ASSERT_NO_FATAL_FAILURE(Interrupt(visitor, request, length));
+
+            EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+
+            if (!visitor.HasGone()) break;  // the close is of fewer requests
+            ExpectUse(visitor);
+        }
+    }
+}
+
+}  // namespace
+}  // namespace ZV::Test

@@ -1,0 +1,45 @@
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "simulation/zentara_simulation.h"
+
+/// A kernel driver between the library and the simulation: it counts the control requests and lets
+/// one of them fail. The suite's linker sends the library's load of the simulation's module here.
+namespace ZV::Test {
+
+enum class RequestFailure {
+    None,
+    Fails,             ///< The call ends with error 31, and nothing is done.
+    AnsweredAtOnce,    ///< Done and answered by the call itself, where it could be pended.
+    CompletesInError,  ///< Pended, and ended with error 31; nothing is done.
+    CompletesLate,     ///< Done, and ended after two seconds of the wait clock.
+    DeviceGone,        ///< The camera is unplugged before it, and stays so.
+};
+
+/// Requests are numbered in two series, since a stream's own thread sends some of them beside the
+/// callers: attached buffers and the stream's entering and leaving are those of the stream.
+enum class RequestSeries { Calls, Stream };
+inline constexpr RequestSeries AllSeries[] = {RequestSeries::Calls, RequestSeries::Stream};
+
+struct CountedRequest {
+    std::uint32_t code = 0;
+    bool mayPend = false;
+};
+
+/// From here on requests are counted; number `number` of `series`, from 1, meets `failure`.
+void BeginRequests(RequestFailure failure, RequestSeries series, std::uint64_t number);
+/// Ends the counting; nothing fails any more.
+void EndRequests();
+/// Whether the request that was to fail has come, and its code; 0 before.
+std::uint32_t GetFailedCode();
+/// What was counted since BeginRequests, in order.
+std::vector<CountedRequest> GetCounted(RequestSeries series);
+
+/// Handles that are open at the driver.
+std::uint32_t CountOpenDevices();
+/// What the driver held when the library ended its bus the last time, over all cameras.
+ZentaraSimulationState GetStateAtEnd();
+
+}  // namespace ZV::Test

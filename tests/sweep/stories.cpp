@@ -1,0 +1,277 @@
+#include "sweep/stories.h"
+
+#include <chrono>
+#include <condition_variable>
+#include <cstring>
+#include <mutex>
+#include <thread>
+
+#include "memory/failing_allocator.h"
+#include "support/rounds.h"
+#include "support/settings_words.h"
+#include "support/wait_until.h"
+#include "sweep/failing_driver.h"
+
+namespace ZV::Test {
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using std::chrono::milliseconds;
+
+/// How long a client waits for an image once something has failed, if it is not patient.
+constexpr milliseconds ShortPatience(IsSanitized ? 400 : 60);
+/// Far more than any story takes.
+constexpr milliseconds LongPatience(IsSanitized ? 60'000 : 20'000);
+constexpr std::uint64_t ShortExposureNs = 2'000'000;
+
+bool HasSomethingFailed() {
+    return GetFailedCode() != 0 || HasRefusedAllocation();
+}
+
+/// The second client that aborts. Its thread stays for the life of the process.
+class Aborter {
+  public:
+    static Aborter& Get() {
+        static Aborter* const aborter = new Aborter;
+        return *aborter;
+    }
+    void Arm(const Client& waiting) {
+        std::unique_lock lock(mutex);
+        client = &waiting;
+        isArmed = true;
+        armedAt = Clock::now();
+        changed.notify_all();
+    }
+    void Disarm() {
+        std::unique_lock lock(mutex);
+        isArmed = false;
+        changed.wait(lock, [this] { return !isAborting; });
+    }
+
+  private:
+    Aborter() : thread([this] { Run(); }) {}
+
+    bool HasWaitedEnough() const { return Clock::now() - armedAt > client->GetPatience(); }
+    void Run() {
+        const UncountedAllocations uncounted;
+        std::unique_lock lock(mutex);
+        while (true) {
+            changed.wait(lock, [this] { return isArmed; });
+            // An abort before the wait for the image does not count, so it is repeated.
+            (void)changed.wait_for(lock, milliseconds(5), [this] { return !isArmed; });
+            if (!isArmed || !HasWaitedEnough()) continue;
+            isAborting = true;
+            lock.unlock();
+            (void)Zentara_Abort(client->GetHandle());
+            lock.lock();
+            isAborting = false;
+            changed.notify_all();
+        }
+    }
+
+    std::mutex mutex;
+    std::condition_variable changed;
+    const Client* client = nullptr;
+    bool isArmed = false;
+    bool isAborting = false;
+    Clock::time_point armedAt;
+    std::thread thread;
+};
+
+}  // namespace
+
+Aborting::Aborting(Client& client) {
+    Aborter::Get().Arm(client);
+}
+
+Aborting::~Aborting() {
+    Aborter::Get().Disarm();
+}
+
+Client::Client() {
+    for (Frame& frame : frames) {
+        frame.pixels.resize(BufferBytes);
+        frame.record.pBuffer = frame.pixels.data();
+        frame.record.bufferSize = BufferBytes;
+    }
+}
+
+void Client::Reset() {
+    callCount = 0;
+    listedCount = 0;
+    handle = 0;
+    queued = 0;
+    served = 0;
+}
+
+milliseconds Client::GetPatience() const {
+    return !isPatient && HasSomethingFailed() ? ShortPatience : LongPatience;
+}
+
+ZentaraResult Client::Note(const char* name, ZentaraResult result) {
+    if (callCount < calls.size()) calls[callCount++] = {name, result};
+    return result;
+}
+
+void Client::Load() {
+    (void)Note("Zentara_LoadDriver", Zentara_LoadDriver());
+}
+
+void Client::List() {
+    listedCount = static_cast<std::uint32_t>(std::size(items));
+    (void)Note("Zentara_ListCameras", Zentara_ListCameras(items, &listedCount));
+}
+
+void Client::Open() {
+    if (!HasCamera()) return;
+    (void)Note("Zentara_OpenCamera", Zentara_OpenCamera(items[0].cameraId, &handle));
+}
+
+void Client::Close() {
+    if (!IsOpen()) return;
+    (void)Note("Zentara_CloseCamera", Zentara_CloseCamera(handle));
+}
+
+void Client::Release() {
+    Zentara_ReleaseDriver();
+}
+
+void Client::Begin(std::uint32_t imageFormat) {
+    if (!IsOpen()) return;
+    ReadSettings();
+    // Kept: the first setup takes a camera for free-running, also one that waits for a trigger
+    // since it was last used.
+    SetWord(settings, zprmTriggerType, 5);
+    Send();
+    SetWord(settings, zprmTriggerType, 0);
+    SetWord(settings, zprmImageFormat, imageFormat);
+    SetWide(settings, zprm64Exposure, ShortExposureNs);
+    SetWide(settings, zprm64ExposureRed, ShortExposureNs);
+    SetWide(settings, zprm64ExposureBlue, ShortExposureNs);
+    Send();
+}
+
+void Client::ReadSettings() {
+    (void)Note("Zentara_ReadSettingsFromCam", Zentara_ReadSettingsFromCam(handle, &settings));
+}
+
+void Client::Send() {
+    (void)Note("Zentara_SendSettingsToCam", Zentara_SendSettingsToCam(handle, &settings));
+}
+
+void Client::SendOthers() {
+    ReadSettings();
+    const std::uint32_t format = GetWord(settings, zprmImageFormat);
+    SetWord(settings, zprmImageFormat, format ^ 1);
+    SetWord(settings, zprmBinning, 2);
+    SetWord(settings, zprmHorizontalBinning, 2);
+    SetWord(settings, zprmVerticalBinning, 2);
+    SetWord(settings, zprmRoiX, 2);
+    SetWord(settings, zprmRoiWidth, Width / 4);
+    SetWord(settings, zprmRoiHeight, Height / 4);
+    SetWord(settings, zprmReadoutSpeed, 1);
+    SetWord(settings, zprmTriggerType, 5);
+    SetWord(settings, zprmCoolerActive, 1);
+    SetSigned(settings, zprmS32NormalizedGaindB, 3'000'000);
+    SetSigned(settings, zprmS32AbsoluteOffset, 100);
+    SetSigned(settings, zprmS32RegulatedCoolingTemp, -5);
+    SetWide(settings, zprm64Exposure, 7'000'000);
+    SetWide(settings, zprm64ExposureRed, 8'000'000);
+    SetWide(settings, zprm64ExposureBlue, 9'000'000);
+    Send();
+}
+
+void Client::Grab() {
+    const Aborting aborting(*this);
+    (void)Note("Zentara_GrabFrame", Zentara_GrabFrame(handle, &frames[0].record));
+}
+
+void Client::Serve(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t flags) {
+    auto* const client = reinterpret_cast<Client*>(static_cast<std::uintptr_t>(userPrivate));
+    if ((flags & zcbFrameDone) != 0) ++client->served;
+}
+
+void Client::QueueAll() {
+    const auto self = reinterpret_cast<std::uintptr_t>(this);
+    for (std::size_t i = 0; i < frames.size(); ++i) {
+        const ZentaraResult result =
+            Zentara_QueueFrame(handle, &frames[i].record, Serve, zcbFrameDone | zcbExposeDone, self,
+                               static_cast<std::uint32_t>(i));
+        if (Note("Zentara_QueueFrame", result) == zerrNone) ++queued;
+        if (i % 5 != 4) continue;
+        Zentara_Settings& change = changes[i / 5];
+        change = settings;
+        SetWide(change, zprm64Exposure, ShortExposureNs * (2 + i / 5));
+        (void)Note("Zentara_QueueSettings",
+                   Zentara_QueueSettings(handle, &change, nullptr, 0, 0, 0));
+    }
+}
+
+void Client::AwaitFrames() const {
+    std::uint32_t lastServed = served;
+    auto lastChange = Clock::now();
+    // What was asked for may be dropped for good once something has failed.
+    (void)WaitUntil(
+        [&] {
+            if (served >= queued) return true;
+            if (served != lastServed) lastChange = Clock::now();
+            lastServed = served;
+            return Clock::now() - lastChange > GetPatience();
+        },
+        2 * LongPatience);
+}
+
+void Client::StreamWithChanges() {
+    QueueAll();
+    (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 1));
+    SetWord(settings, zprmRoiHeight, GetWord(settings, zprmRoiHeight) - 8);
+    Send();
+    AwaitFrames();
+    (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 0));
+    (void)Note("Zentara_Abort", Zentara_Abort(handle));
+}
+
+void Client::StartStream() {
+    QueueAll();
+    (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 1));
+}
+
+void Client::Balance() {
+    SetWord(settings, zprmPostProcessImageFormat, zfmtRGB24);
+    SetWord(settings, zprmDoPostProcessing, 1);
+    const Aborting aborting(*this);
+    Send();
+    (void)Note("Zentara_WhiteBalance", Zentara_WhiteBalance(&settings, 0, 0, Width, Height));
+}
+
+void Client::Expose() {
+    const Aborting aborting(*this);
+    (void)Note("Zentara_AutoExpose", Zentara_AutoExpose(&settings, 0, 0, Width, Height));
+}
+
+void Client::TakeEveryLock() {
+    if (!IsOpen()) return;
+    (void)Note("Zentara_QueueSettings",
+               Zentara_QueueSettings(handle, nullptr, nullptr, 0, 0, 0));  // queueLock
+    (void)Note("Zentara_Abort", Zentara_Abort(handle));  // deliveryLock, queueLock, streamLock
+    (void)Note("Zentara_AutoExpose", Zentara_AutoExpose(&settings, 0, 0, 1, 1));
+    (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 0));  // switchMutex, frameLock
+}
+
+const Story Stories[8] = {
+    {"list", Stage::Loaded,
+     [](Client& client) {
+         client.List();
+         client.Open();
+     },
+     false},
+    {"send", Stage::Opened, [](Client& client) { client.SendOthers(); }, false},
+    {"grab", Stage::Opened, [](Client& client) { client.Grab(); }, false},
+    {"stream", Stage::Opened, [](Client& client) { client.StreamWithChanges(); }, false},
+    {"balance", Stage::Opened, [](Client& client) { client.Balance(); }, false},
+    {"expose", Stage::Opened, [](Client& client) { client.Expose(); }, false},
+    {"close", Stage::Streaming, [](Client& client) { client.Close(); }, false},
+    {"release", Stage::Streaming, [](Client& client) { client.Release(); }, true},
+};
+
+}  // namespace ZV::Test

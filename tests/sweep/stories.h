@@ -1,0 +1,122 @@
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <chrono>
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+#include <vector>
+
+#include "zentara/zentara.h"
+
+namespace ZV::Test {
+
+/// A client of the first camera of a world, with all that its calls need taken beforehand: while a
+/// story runs, only the library allocates.
+class Client {
+  public:
+    static constexpr std::uint32_t Width = 64;
+    static constexpr std::uint32_t Height = 48;
+    static constexpr std::size_t FrameCount = 20;
+
+    struct Call {
+        const char* name;
+        ZentaraResult result;
+    };
+
+    Client();
+    Client(const Client&) = delete;
+    Client& operator=(const Client&) = delete;
+
+    /// Forgets the last round. Nothing of the library may know of it any more.
+    void Reset();
+
+    /// Whether calls that wait for an image soon give up: something is to fail. Else they wait for
+    /// as long as any story takes.
+    void SetPatient(bool isPatientNow) { isPatient = isPatientNow; }
+    std::chrono::milliseconds GetPatience() const;
+
+    void Load();
+    /// The first camera of the list, or none.
+    void List();
+    void Open();
+    void Close();
+    void Release();
+
+    /// Puts an image format and a short exposure in force.
+    void Begin(std::uint32_t imageFormat);
+    void ReadSettings();
+    void Send();
+    /// A send of values that all differ from those of a camera after its first setup.
+    void SendOthers();
+    void Grab();
+    /// Queues all frames with settings changes among them, streams, changes what stops the stream,
+    /// and waits for the frames.
+    void StreamWithChanges();
+    void StartStream();
+    void Balance();
+    void Expose();
+
+    /// Calls that every lock is free for, in any state: they return.
+    void TakeEveryLock();
+
+    bool HasCamera() const { return listedCount != 0; }
+    bool IsOpen() const { return handle != 0; }
+    ZentaraHandle GetHandle() const { return handle; }
+    /// What the calls answered since Reset.
+    std::size_t CountCalls() const { return callCount; }
+    const Call& GetCall(std::size_t index) const { return calls[index]; }
+    const Zentara_Frame& GetGrabbed() const { return frames[0].record; }
+
+  private:
+    static constexpr std::size_t CallsMax = 128;
+    /// Room for four words of two bytes a pixel.
+    static constexpr std::uint32_t BufferBytes = Width * Height * 8;
+    struct Frame {
+        Zentara_Frame record{};
+        std::vector<std::uint8_t> pixels;
+    };
+
+    ZentaraResult Note(const char* name, ZentaraResult result);
+    static void Serve(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
+                      std::uint32_t flags);
+    void QueueAll();
+    void AwaitFrames() const;
+
+    std::array<Call, CallsMax> calls{};
+    std::size_t callCount = 0;
+    Zentara_CamListItem items[4] = {};
+    std::uint32_t listedCount = 0;
+    ZentaraHandle handle = 0;
+    Zentara_Settings settings{};
+    std::array<Zentara_Settings, 4> changes{};
+    std::array<Frame, FrameCount> frames;
+    std::uint32_t queued = 0;
+    bool isPatient = true;
+    std::atomic<std::uint32_t> served{0};
+};
+
+/// Where a story begins.
+enum class Stage { Loaded, Opened, Streaming };
+
+struct Story {
+    std::string_view name;
+    Stage begins;
+    void (*run)(Client& client);
+    bool endsRelease;  ///< The library is not loaded behind it.
+};
+
+extern const Story Stories[8];
+
+/// Ends calls that wait for an image that will not come: while it lives, a call that goes on for
+/// long after something has failed is aborted, as a client would.
+class Aborting {
+  public:
+    explicit Aborting(Client& client);
+    ~Aborting();
+    Aborting(const Aborting&) = delete;
+    Aborting& operator=(const Aborting&) = delete;
+};
+
+}  // namespace ZV::Test

@@ -1,0 +1,375 @@
+#include "sweep/sweep_round.h"
+
+#include <signal.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <iterator>
+
+#include "hal/control_records.h"
+#include "hal/platform/clock.h"
+#include "memory/failing_allocator.h"
+#include "support/rounds.h"
+#include "support/settings_words.h"
+#include "support/temporary_folder.h"
+#include "support/wait_until.h"
+
+namespace ZV::Test {
+
+const SweepCamera SweepCameras[10] = {
+    {"mono", "mono", "", zfmtMono8},
+    {"old", "old", "", zfmtMono8},
+    {"rotated", "rotated", R"(, "idlePackets": false)", zfmtMono16},
+    {"folary", "folary", "", zfmtBayer8},
+    {"metrona", "metrona", R"(, "idlePackets": false)", zfmtMono16},
+    {"intensified", "intensified", R"(, "writes": "atOnce")", zfmtMono8},
+    {"colour", "colour", "", zfmtBayer8},
+    {"wheel", "wheel", "", zfmtRGBPlane8},
+    {"s400", "s400", R"(, "streamingVersion": 0)", zfmtMono16},
+    {"tirel", "model:TirelM1", R"(, "streamingVersion": 2)", zfmtMono8},
+};
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using std::chrono::milliseconds;
+
+constexpr std::uint32_t WaitDivisor = 1000;
+constexpr unsigned RoundSecondsMax = IsSanitized ? 240 : 60;
+/// A call that ends is allowed so long, on a machine with other work.
+constexpr milliseconds CallLimit(IsSanitized ? 20'000 : 5'000);
+constexpr std::int64_t NoAllocation = std::int64_t{1} << 40;
+
+constexpr ZentaraResult KnownResults[] = {
+    zerrNone,           zerrNotSupported,  zerrBadParameter, zerrBadSettings,
+    zerrAlreadyLoaded,  zerrNotLoaded,     zerrBadHandle,    zerrBadCameraId,
+    zerrHardwareFault,  zerrFirewireFault, zerrCameraFault,  zerrDriverFault,
+    zerrBufferTooSmall, zerrBusy,          zerrQueueFull,    zerrFrameIncomplete,
+    zerrNotStreaming,   zerrOutOfSync,     zerrMissingData,  zerrHostOverrun,
+    zerrUnplugged,      zerrCameraBusy,    zerrRoiTooSmall,
+};
+
+bool IsKnownResult(ZentaraResult result) {
+    return std::find(std::begin(KnownResults), std::end(KnownResults), result) !=
+           std::end(KnownResults);
+}
+
+/// Never freed: a stream may hold on to it as long as the library does.
+Client& GetClient() {
+    static Client* const client = new Client;
+    return *client;
+}
+
+std::string MakeScenario(const SweepCamera& camera) {
+    return R"({"base": ")" + std::string(camera.base) +
+           R"(", "timeScale": 0, "cameras": [{"sensor": {"width": 64, "height": 48, "noise": false},)" +
+           R"( "scene": {"kind": "chart", "brightness": 400000})" + std::string(camera.extra) +
+           "}]}";
+}
+
+/// The scenario of a camera, in a file of its own; it stays for the next rounds.
+void SelectCamera(std::size_t camera) {
+    static TemporaryFolder* const folder = new TemporaryFolder;
+    static std::size_t selected = std::size(SweepCameras);
+    if (selected == camera) return;
+    const std::string path = folder->WriteFile(std::string(SweepCameras[camera].name) + ".json",
+                                               MakeScenario(SweepCameras[camera]));
+    setenv("ZENTARA_SIMULATION", path.c_str(), 1);
+    selected = camera;
+}
+
+std::size_t CountEntries(const char* folder) {
+    std::error_code ignored;
+    const std::filesystem::directory_iterator entries(folder, ignored);
+    return static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
+}
+
+/// Ends the process when a round does not end.
+class Watchdog {
+  public:
+    explicit Watchdog(const std::string& text) {
+        (void)std::snprintf(m_text, sizeof m_text, "\nThe round hangs: %s\n", text.c_str());
+        (void)signal(SIGALRM, [](int) {
+            (void)!write(STDERR_FILENO, m_text, std::strlen(m_text));
+            abort();
+        });
+        (void)alarm(RoundSecondsMax);
+    }
+    ~Watchdog() { (void)alarm(0); }
+    Watchdog(const Watchdog&) = delete;
+    Watchdog& operator=(const Watchdog&) = delete;
+
+  private:
+    static char m_text[256];
+};
+char Watchdog::m_text[256];
+
+/// One round, from load to release.
+class Runner {
+  public:
+    Runner(std::size_t cameraIndex, std::size_t storyIndex)
+        : camera(SweepCameras[cameraIndex]), story(Stories[storyIndex]), client(GetClient()) {
+        SetWaitClockDivisor(WaitDivisor);
+        SelectCamera(cameraIndex);
+    }
+    ~Runner() { SetWaitClockDivisor(1); }
+    Runner(const Runner&) = delete;
+    Runner& operator=(const Runner&) = delete;
+
+    /// False when the camera could not be brought there.
+    bool Prepare();
+    void Run(bool isPatient) {
+        client.SetPatient(isPatient);
+        story.run(client);
+        client.SetPatient(true);
+    }
+    void CheckResults(const CountedStory* expected);
+    void CheckWhatIsLeft(const Round* round);
+    std::vector<ZentaraResult> GetResults() const;
+
+    std::vector<std::string> problems;
+
+  private:
+    void Complain(const std::string& text) { problems.push_back(text); }
+    template <typename Work>
+    void RunBounded(const char* what, Work work);
+    bool HasGoodCalls(std::size_t from, const char* where);
+    void CloseForGood(const Round* round);
+    void UseAgain(const char* where);
+    void CheckRelease();
+
+    const SweepCamera& camera;
+    const Story& story;
+    Client& client;
+    std::size_t firstCall = 0;  ///< Of the story.
+};
+
+bool Runner::Prepare() {
+    client.Reset();
+    client.Load();
+    if (story.begins != Stage::Loaded) {
+        client.List();
+        client.Open();
+        client.Begin(camera.imageFormat);
+    }
+    if (story.begins == Stage::Streaming) client.StartStream();
+    firstCall = client.CountCalls();
+    return HasGoodCalls(0, "before the story");
+}
+
+bool Runner::HasGoodCalls(std::size_t from, const char* where) {
+    bool areGood = true;
+    for (std::size_t i = from; i < client.CountCalls(); ++i) {
+        const Client::Call& call = client.GetCall(i);
+        if (call.result == zerrNone) continue;
+        areGood = false;
+        Complain(std::string(where) + ": " + call.name + " gives " + std::to_string(call.result));
+    }
+    return areGood;
+}
+
+std::vector<ZentaraResult> Runner::GetResults() const {
+    std::vector<ZentaraResult> results;
+    for (std::size_t i = firstCall; i < client.CountCalls(); ++i) {
+        results.push_back(client.GetCall(i).result);
+    }
+    return results;
+}
+
+void Runner::CheckResults(const CountedStory* expected) {
+    for (std::size_t i = firstCall; i < client.CountCalls(); ++i) {
+        const Client::Call& call = client.GetCall(i);
+        if (IsKnownResult(call.result)) continue;
+        Complain(std::string(call.name) + " gives " + std::to_string(call.result) +
+                 ", which no table has");
+    }
+    if (expected == nullptr || GetResults() == expected->results) return;
+    std::string text = "the calls do not answer as without the failure:";
+    for (const ZentaraResult result : GetResults()) text += " " + std::to_string(result);
+    Complain(text);
+}
+
+template <typename Work>
+void Runner::RunBounded(const char* what, Work work) {
+    const auto start = Clock::now();
+    work();
+    const auto taken = std::chrono::duration_cast<milliseconds>(Clock::now() - start);
+    if (taken <= CallLimit) return;
+    Complain(std::string(what) + " took " + std::to_string(taken.count()) + " ms");
+}
+
+/// A close that failed leaves the camera open; the next one ends it.
+void Runner::CloseForGood(const Round* round) {
+    for (int attempt = 0; attempt < 2 && CountOpenDevices() != 0 && client.IsOpen(); ++attempt) {
+        RunBounded("the close", [&] { client.Close(); });
+    }
+    if (CountOpenDevices() == 0 || !client.IsOpen()) return;
+    // Kept: a device that has gone answers the freeing of its resources with an error, which ends
+    // the close. The next listing or the release gives it up.
+    if (round == nullptr || round->failure != Failure::DeviceGone) {
+        Complain("the camera cannot be closed");
+    }
+}
+
+void Runner::UseAgain(const char* where) {
+    const std::size_t from = client.CountCalls();
+    client.List();
+    if (!client.HasCamera()) return Complain(std::string(where) + ": no camera is listed");
+    client.Open();
+    client.Begin(camera.imageFormat);
+    client.Grab();
+    client.Close();
+    if (!HasGoodCalls(from, where)) return;
+    if (client.GetGrabbed().errorCode != zerrNone || client.GetGrabbed().width == 0) {
+        Complain(std::string(where) + ": the frame is bad");
+    }
+    if (CountOpenDevices() != 0) Complain(std::string(where) + ": a device is left open");
+}
+
+void Runner::CheckRelease() {
+    RunBounded("the release", [&] { client.Release(); });
+    if (CountOpenDevices() != 0) Complain("the release leaves a device open");
+    const ZentaraSimulationState held = GetStateAtEnd();
+    const std::uint32_t all = held.openHandles + held.reservedBandwidths + held.reservedChannels +
+                              held.reservedResources + held.pendedRequests + held.attachedBuffers;
+    if (all != 0) {
+        Complain("at the release the driver still holds " + std::to_string(held.openHandles) +
+                 " handles, " + std::to_string(held.reservedChannels) + " channels, " +
+                 std::to_string(held.pendedRequests) + " requests");
+    }
+}
+
+void Runner::CheckWhatIsLeft(const Round* round) {
+    if (!story.endsRelease) {
+        RunBounded("taking every lock", [&] { client.TakeEveryLock(); });
+        CloseForGood(round);
+        (void)ZentaraSimulation_Plug(0);  // unless it has gone it does not change
+        client.Reset();
+        UseAgain("used again on the same bus");
+    }
+    CheckRelease();
+    client.Reset();
+    client.Load();
+    UseAgain("used again after a release");
+    CheckRelease();
+}
+
+struct Belongings {
+    std::size_t threads = CountEntries("/proc/self/task");
+    std::size_t files = CountEntries("/proc/self/fd");
+};
+
+/// What the process has when no library is loaded, once all helpers have begun.
+const Belongings& GetOwnBelongings() {
+    static const Belongings own;
+    return own;
+}
+
+void CheckBelongings(std::vector<std::string>* problems) {
+    const Belongings& own = GetOwnBelongings();
+    Belongings now;
+    const bool isBack = WaitUntil([&] {
+        now = Belongings{};
+        return now.threads <= own.threads && now.files <= own.files;
+    });
+    if (isBack) return;
+    problems->push_back("left behind: " + std::to_string(now.threads - own.threads) +
+                        " threads and " + std::to_string(now.files - own.files) + " files");
+}
+
+void StartHelpers() {
+    static const bool isDone = [] {
+        Runner runner(0, 2);
+        (void)runner.Prepare();
+        // A late request starts the driver's own thread.
+        BeginRequests(RequestFailure::CompletesLate, RequestSeries::Calls, 1);
+        runner.Run(true);
+        EndRequests();
+        runner.CheckWhatIsLeft(nullptr);
+        (void)GetOwnBelongings();
+        return true;
+    }();
+    (void)isDone;
+}
+
+/// The story must go on as if nothing had happened: the failure is one of time alone.
+bool IsHarmless(const Round& round) {
+    if (round.failure == Failure::CompletesLate) return true;
+    return round.failure == Failure::AnsweredAtOnce && round.series == RequestSeries::Calls &&
+           round.code != FW_IOCTL_ASYNC_READ;
+}
+
+constexpr RequestFailure ConvertFailure(Failure failure) {
+    constexpr RequestFailure Table[] = {RequestFailure::Fails,
+                                        RequestFailure::AnsweredAtOnce,
+                                        RequestFailure::CompletesInError,
+                                        RequestFailure::CompletesLate,
+                                        RequestFailure::DeviceGone,
+                                        RequestFailure::None};
+    return Table[static_cast<std::size_t>(failure)];
+}
+
+}  // namespace
+
+std::string Round::GetText() const {
+    char text[200];
+    const bool isRequest = failure != Failure::NoMemory;
+    (void)std::snprintf(text, sizeof text, "%s:%s:%s:%s%llu (code 0x%X)",
+                        SweepCameras[camera].name.data(), Stories[story].name.data(),
+                        FailureNames[static_cast<std::size_t>(failure)].data(),
+                        isRequest && series == RequestSeries::Stream ? "s" : "",
+                        static_cast<unsigned long long>(number), code);
+    return text;
+}
+
+CountedStory CountStory(std::size_t camera, std::size_t story) {
+    StartHelpers();
+    const Watchdog watchdog("counting " + Round{camera, story}.GetText());
+    Runner runner(camera, story);
+    CountedStory counted;
+    if (runner.Prepare()) {
+        BeginRequests(RequestFailure::None, RequestSeries::Calls, 0);
+        BeginAllocations(NoAllocation);
+        runner.Run(true);
+        counted.allocations = NoAllocation - CountAllocationsLeft();
+        (void)EndAllocations();
+        EndRequests();
+        for (const RequestSeries series : AllSeries) {
+            counted.requests[static_cast<std::size_t>(series)] = GetCounted(series);
+        }
+        counted.results = runner.GetResults();
+    }
+    runner.CheckResults(nullptr);
+    runner.CheckWhatIsLeft(nullptr);
+    counted.problems = runner.problems;
+    CheckBelongings(&counted.problems);
+    return counted;
+}
+
+RoundOutcome RunRound(const Round& round, const CountedStory& counted) {
+    StartHelpers();
+    const Watchdog watchdog(round.GetText());
+    Runner runner(round.camera, round.story);
+    RoundOutcome outcome;
+    if (runner.Prepare()) {
+        const bool isRequest = round.failure != Failure::NoMemory;
+        BeginRequests(ConvertFailure(round.failure), round.series, isRequest ? round.number : 0);
+        BeginAllocations(isRequest ? NoAllocation : static_cast<std::int64_t>(round.number));
+        runner.Run(IsHarmless(round));
+        outcome.hasFailed = EndAllocations() || GetFailedCode() != 0;
+        EndRequests();
+        outcome.code = GetFailedCode();
+        runner.CheckResults(IsHarmless(round) ? &counted : nullptr);
+    }
+    runner.CheckWhatIsLeft(&round);
+    outcome.problems = runner.problems;
+    CheckBelongings(&outcome.problems);
+    return outcome;
+}
+
+}  // namespace ZV::Test
