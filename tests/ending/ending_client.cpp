@@ -102,7 +102,8 @@ void StreamOnce(ZentaraHandle handle, Frames& frames) {
 }
 
 void UseLibrary() {
-    static Frames frames;  // outlives whoever fills it
+    // Never freed: the library fills it for as long as the process lives.
+    static Frames& frames = *new Frames;
     (void)Zentara_LoadDriver();
     for (;;) {
         Zentara_CamListItem item{};
