@@ -14,6 +14,7 @@
 #include "support/wait_until.h"
 #include "tools/fits_file.h"
 #include "tools/fits_verdict.h"
+#include "tools/text_pattern.h"
 #include "tools/traced_scenario.h"
 
 namespace ZentaraTest {
@@ -141,7 +142,7 @@ TEST(Program, InfoHasNoSensorKindForASensorThatIsNeitherMonoNorBayer) {
 
     EXPECT_EQ(0, asJson.exitCode) << asJson.errors;
     EXPECT_TRUE(json::parse(asJson.output)["ccdType"].is_null());
-    EXPECT_THAT(asText.output, testing::ContainsRegex("ccd-type +-  "));
+    EXPECT_THAT(asText.output, HasPattern("ccd-type +-  "));
 }
 
 TEST(Program, InfoTellsTheSensorKindsThatAre0And1) {
@@ -196,9 +197,8 @@ TEST(Program, GrabWritesAFitsFileThatAstronomersProgramsRead) {
     ASSERT_EQ(0, result.exitCode) << result.errors;
     const FitsFile file(path);
     ASSERT_NE(nullptr, file.Get());
-    EXPECT_THAT(
-        ReadFitsText(file.Get(), "DATE-OBS"),
-        testing::MatchesRegex("[0-9]{4}-[0-9]{2}-[0-9]{2}T[0-9]{2}:[0-9]{2}:[0-9]{2}[.][0-9]{3}"));
+    EXPECT_THAT(ReadFitsText(file.Get(), "DATE-OBS"),
+                MatchesPattern("[0-9]{4}-[0-9]{2}-[0-9]{2}T[0-9]{2}:[0-9]{2}:[0-9]{2}[.][0-9]{3}"));
     EXPECT_DOUBLE_EQ(0.016384, ReadFitsNumber(file.Get(), "EXPTIME"));
     EXPECT_DOUBLE_EQ(0.016384, ReadFitsNumber(file.Get(), "EXPOSURE"));
     EXPECT_EQ(1, ReadFitsNumber(file.Get(), "XBINNING"));
@@ -234,7 +234,7 @@ TEST(Program, AColourCameraSaysItsMosaicInTheFitsHeader) {
     const FitsFile file(path);
 
     ASSERT_NE(nullptr, file.Get());
-    EXPECT_THAT(ReadFitsText(file.Get(), "BAYERPAT"), testing::MatchesRegex("RGGB|GRBG|GBRG|BGGR"));
+    EXPECT_THAT(ReadFitsText(file.Get(), "BAYERPAT"), MatchesPattern("RGGB|GRBG|GBRG|BGGR"));
 }
 
 TEST(Program, AllKindsOfFileHoldTheSamePixels) {
@@ -341,7 +341,7 @@ TEST(Program, AnInterruptEndsAStreamCleanlyWithCode130) {
 
     EXPECT_EQ(130, result.exitCode);
     EXPECT_THAT(result.output, HasSubstr("files written"));
-    EXPECT_THAT(folder.ListFiles(), testing::Each(testing::MatchesRegex("night-[0-9]{6}[.]raw")));
+    EXPECT_THAT(folder.ListFiles(), testing::Each(MatchesPattern("night-[0-9]{6}[.]raw")));
 }
 
 /// FNV-1a of 64 bits as 16 hexadecimal digits, as a trace holds it.
