@@ -13,9 +13,19 @@ endif()
 if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
   target_compile_options(zentara_flags INTERFACE -Wthread-safety)
 endif()
+if(ZENTARA_JOINED)
+  # What is private to one source may meet the like of another there.
+  target_compile_options(zentara_flags INTERFACE -Wno-shadow $<$<COMPILE_LANGUAGE:CXX>:-Wno-subobject-linkage>)
+endif()
 if(ZENTARA_SANITIZE)
+  # A target that only tests others (ZENTARA_IS_SUITE) is watched for its memory and threads, not for its arithmetic,
+  # whose checks double the time that its sources take to compile.
+  string(REGEX REPLACE ",?undefined" "" suiteSanitizers "${ZENTARA_SANITIZE}")
+  set(isSuite $<BOOL:$<TARGET_PROPERTY:ZENTARA_IS_SUITE>>)
   target_compile_options(zentara_flags INTERFACE
-    -fsanitize=${ZENTARA_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    $<$<NOT:${isSuite}>:-fsanitize=${ZENTARA_SANITIZE}>
+    $<${isSuite}:-fsanitize=${suiteSanitizers}>
+    -fno-sanitize-recover=all -fno-omit-frame-pointer)
   if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     # Instrumented, the compiler's own <regex> is taken for uninitialised.
     target_compile_options(zentara_flags INTERFACE -Wno-maybe-uninitialized)
@@ -32,10 +42,7 @@ function(zentara_sources result folder)
   set(${result} ${found} PARENT_SCOPE)
 endfunction()
 
-# For a build that answers quickly; every other build shows what a source forgets to include.
-function(zentara_precompile target)
-  if(ZENTARA_PRECOMPILE)
-    target_precompile_headers(${target} PRIVATE
-      <algorithm> <array> <atomic> <memory> <mutex> <string> <thread> <vector> ${ARGN})
-  endif()
+# Sources that are compiled by themselves in a joined build too, since another has the same private names.
+function(zentara_compile_alone)
+  set_source_files_properties(${ARGN} PROPERTIES SKIP_UNITY_BUILD_INCLUSION ON)
 endfunction()
