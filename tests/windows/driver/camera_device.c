@@ -47,10 +47,18 @@ static UINT32 Pend(Message* message, const DeviceExtension* camera) {
     return 0;
 }
 
-static NTSTATUS PendCameraRequest(const DeviceExtension* camera, Message* message) {
+/* Who leaves a stream ends its thread next, which cancels the requests of that thread. Wine does
+ * not bear that a request is completed while its cancellation is on the way. */
+static void NoteStream(DeviceExtension* camera, UINT32 code) {
+    if (code == STREAM_ENTER) camera->isLeft = FALSE;
+    if (code == STREAM_LEAVE) camera->isLeft = TRUE;
+}
+
+static NTSTATUS PendCameraRequest(DeviceExtension* camera, Message* message) {
     KIRQL irql;
     UINT32 error;
     KeAcquireSpinLock(&driverState.lock, &irql);
+    NoteStream(camera, message->record.code);
     error = Pend(message, camera);
     KeReleaseSpinLock(&driverState.lock, irql);
     if (error != 0) {
@@ -62,7 +70,7 @@ static NTSTATUS PendCameraRequest(const DeviceExtension* camera, Message* messag
 }
 
 static NTSTATUS SendToHelper(DEVICE_OBJECT* device, IRP* irp, UINT32 kind) {
-    const DeviceExtension* camera = GetExtension(device);
+    DeviceExtension* camera = GetExtension(device);
     const IO_STACK_LOCATION* stack = IoGetCurrentIrpStackLocation(irp);
     Message* message = MakeMessage(kind, camera->index);
     if (message == NULL) {

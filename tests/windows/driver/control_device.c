@@ -134,11 +134,18 @@ static NTSTATUS GetState(void* buffer, IRP* irp, ULONG* bytes) {
     return STATUS_SUCCESS;
 }
 
+/* A buffer of a stream that is being left ends by its cancellation or with its file. */
+static BOOLEAN IsBufferLeft(const Message* message) {
+    return message->record.code == ATTACH_BUFFER &&
+           GetExtension(driverState.cameras[message->record.device])->isLeft;
+}
+
 static Message* TakeAnswered(UINT64 id) {
     LIST_ENTRY* entry;
     for (entry = driverState.pended.Flink; entry != &driverState.pended; entry = entry->Flink) {
         Message* message = CONTAINING_RECORD(entry, Message, pendedEntry);
         if (message->irp == NULL || message->record.id != id || message->isQueued) continue;
+        if (IsBufferLeft(message)) return NULL;
         return TakeForEnd(message) ? message : NULL;
     }
     return NULL;

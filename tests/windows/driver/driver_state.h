@@ -11,12 +11,18 @@
 
 #define ROAD_TAG 0x5A524F44
 
+/* Codes of which the driver takes note itself. */
+#define STREAM_ENTER 0x22A084
+#define STREAM_LEAVE 0x22A090
+#define ATTACH_BUFFER 0x22A0BA
+
 #define ERROR_OPERATION_ABORTED 995
 #define ERROR_DEVICE_NOT_CONNECTED 1167
 
 typedef struct DeviceExtension {
     BOOLEAN isControl;
     BOOLEAN isPlugged;
+    BOOLEAN isLeft; /* no buffer is completed between STREAM_LEAVE and the next STREAM_ENTER */
     UINT32 index;
     RoadPrepared prepared;
     BOOLEAN isPrepared;

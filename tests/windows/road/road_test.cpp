@@ -5,7 +5,8 @@
 // open which the driver itself refuses reads there as one that succeeded. What is refused here is
 // the device's name. Its cancellation of a request may also meet one that the driver has just
 // completed, and ends the driver's process then: where a process is killed here, its stream stands
-// still. A running one is cut off over the simulated driver.
+// still, and the driver completes no buffer of a stream that is being left, whose thread takes its
+// requests along. A running one is cut off over the simulated driver.
 
 #include "windows/road/road.h"
 
