@@ -69,6 +69,10 @@ HANDLE GetHandle(ChildProcess process) {
     return reinterpret_cast<HANDLE>(process);
 }
 
+BOOL WINAPI TakeInterrupt(DWORD) {
+    return TRUE;
+}
+
 }  // namespace
 
 // Each process has a console of its own without a window, so that an interrupt reaches it alone.
@@ -91,10 +95,11 @@ ChildProcess StartProcess(const ProcessStart& start) {
     return reinterpret_cast<ChildProcess>(made.hProcess);
 }
 
+// The interrupt comes to all of the console. To have it ignored would pass on to what starts next.
 void InterruptProcess(ChildProcess process) {
+    [[maybe_unused]] static const BOOL isTaken = SetConsoleCtrlHandler(TakeInterrupt, TRUE);
     FreeConsole();
     if (!AttachConsole(GetProcessId(GetHandle(process)))) return;
-    SetConsoleCtrlHandler(nullptr, TRUE);  // The interrupt comes to all of the console.
     GenerateConsoleCtrlEvent(CTRL_C_EVENT, 0);
     FreeConsole();
 }
