@@ -378,8 +378,7 @@ bool ReadFile(const std::string& path, std::string* text, std::string* message) 
 }
 
 /// What ends a folder's name, or a drive's where there are drives.
-constexpr const char* FolderEnds =
-    std::filesystem::path::preferred_separator == '/' ? "/" : "/\\:";
+constexpr const char* FolderEnds = std::filesystem::path::preferred_separator == '/' ? "/" : "/\\:";
 
 // Files that a scenario names lie beside it. Texts are joined, whatever code page their letters are
 // of.

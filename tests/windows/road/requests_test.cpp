@@ -241,7 +241,9 @@ class RoadStream : public RoadRequests {
     }
 
     static tStFrameInfo* TakeNone(void*) { return nullptr; }
-    HALStatus Start() { return HAL_CameraStartStreaming(&list[0], StreamSwitchAddress, 1, nullptr); }
+    HALStatus Start() {
+        return HAL_CameraStartStreaming(&list[0], StreamSwitchAddress, 1, nullptr);
+    }
     HALStatus Stop() { return HAL_CameraStopStreaming(&list[0], StreamSwitchAddress); }
     bool IsNothingPended() {
         return GetState().pendedRequests == 0 && GetDriver().GetState().pended == 0;
@@ -249,8 +251,7 @@ class RoadStream : public RoadRequests {
 };
 
 TEST_F(RoadStream, AListenThatFailsAfterItWasPendedFailsTheStartAndTheStopSucceeds) {
-    ASSERT_TRUE(
-        AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_LISTEN", "pended": true})"));
+    ASSERT_TRUE(AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_LISTEN", "pended": true})"));
 
     EXPECT_EQ(HALReadFailed, Start());
 
