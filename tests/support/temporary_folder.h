@@ -6,10 +6,11 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include "support/text_file.h"
 
 namespace ZV::Test {
 
@@ -36,10 +37,7 @@ class TemporaryFolder {
         return GetPath(name);
     }
 
-    std::string ReadFile(std::string_view name) const {
-        std::ifstream file(path / name, std::ios::binary);
-        return {std::istreambuf_iterator<char>(file), {}};
-    }
+    std::string ReadFile(std::string_view name) const { return ReadTextFile(path / name); }
 
     /// Names of the files in it, sorted.
     std::vector<std::string> ListFiles() const {
