@@ -377,14 +377,16 @@ bool ReadFile(const std::string& path, std::string* text, std::string* message) 
     return true;
 }
 
+/// What ends a folder's name, or a drive's where there are drives.
+constexpr const char* FolderEnds =
+    std::filesystem::path::preferred_separator == '/' ? "/" : "/\\:";
+
 // Files that a scenario names lie beside it. Texts are joined, whatever code page their letters are
 // of.
 void ResolvePaths(const std::string& scenarioPath, Scenario* scenario) {
-    const char separators[] = {'/', static_cast<char>(std::filesystem::path::preferred_separator),
-                               '\0'};
-    const std::size_t folderLength = scenarioPath.find_last_of(separators) + 1;
+    const std::size_t folderLength = scenarioPath.find_last_of(FolderEnds) + 1;
     const auto resolve = [&](std::string* path) {
-        if (path->empty() || std::filesystem::path(*path).is_absolute()) return;
+        if (path->empty() || std::filesystem::path(*path).has_root_path()) return;
         path->insert(0, scenarioPath, 0, folderLength);
     };
     resolve(&scenario->trace);

@@ -315,6 +315,20 @@ TEST(FWCameraStream, ARequestThatNeverCompletesIsTakenBackAtTheStop) {
     EXPECT_EQ(nullptr, mono.Context().retiredRings);
 }
 
+TEST(FWCameraStream, ALoopThatTheDriverKeepsInItsLeaveFailsTheStopAndEndsWithTheDevice) {
+    const FastWaits fast(/*divisor=*/5);
+    StreamedCamera mono("mono");
+    mono.AddFault(R"({"kind":"neverComplete","code":"FW_IOCTL_STREAM_LEAVE"})");
+    ASSERT_EQ(HALOk, mono.Start());
+
+    EXPECT_EQ(HALStopFailed, mono.Stop());
+    EXPECT_NE(nullptr, mono.Context().ring);
+
+    ASSERT_TRUE(mono.hal.world.Unplug());
+    EXPECT_EQ(HALOk, HAL_CameraRelease(mono.camera));
+    EXPECT_EQ(0u, mono.hal.world.GetState().openHandles);
+}
+
 struct FailedStop {
     const char* code;
     HALStatus status;

@@ -5,6 +5,7 @@
 #include <nlohmann/json.hpp>
 
 #include "tools/program.h"
+#include "tools/text_pattern.h"
 #include "tools/traced_scenario.h"
 
 namespace ZentaraTest {
@@ -12,7 +13,6 @@ namespace {
 
 using nlohmann::json;
 using testing::AllOf;
-using testing::ContainsRegex;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
@@ -22,11 +22,11 @@ TEST(GetCommand, ShowsAllSettingsThatTheCameraHasWithUnitsAndMeanings) {
     const ProgramResult result = RunProgram({"get", "--simulation", "mono"});
 
     ASSERT_EQ(0, result.exitCode) << result.errors;
-    EXPECT_THAT(result.output, ContainsRegex("\nexposure +16.384 ms +Exposure\n"));
-    EXPECT_THAT(result.output, ContainsRegex("\nroi-width +1392 px +Width"));
-    EXPECT_THAT(result.output, ContainsRegex("\nimage-format +Mono 8-Bit +Format"));
-    EXPECT_THAT(result.output, ContainsRegex("\ngain-db +0 dB +"));
-    EXPECT_THAT(result.output, ContainsRegex("\nfan +Full +"));
+    EXPECT_THAT(result.output, HasPattern("\nexposure +16.384 ms +Exposure\n"));
+    EXPECT_THAT(result.output, HasPattern("\nroi-width +1392 px +Width"));
+    EXPECT_THAT(result.output, HasPattern("\nimage-format +Mono 8-Bit +Format"));
+    EXPECT_THAT(result.output, HasPattern("\ngain-db +0 dB +"));
+    EXPECT_THAT(result.output, HasPattern("\nfan +Full +"));
     EXPECT_THAT(result.output, Not(HasSubstr("em-gain")));
     EXPECT_THAT(result.output, Not(HasSubstr("shutter-state")));
 }
@@ -37,7 +37,7 @@ TEST(GetCommand, TellsOnlyWhatItIsAskedForAndInThatOrder) {
 
     EXPECT_EQ(0, result.exitCode);
     EXPECT_THAT(result.output,
-                testing::MatchesRegex("roi-height +1040 px +[^\n]*\nexposure +16.384 ms [^\n]*\n"));
+                MatchesPattern("roi-height +1040 px +[^\n]*\nexposure +16.384 ms [^\n]*\n"));
 }
 
 TEST(GetCommand, TellsValueUnitAndTextInJson) {
@@ -110,11 +110,11 @@ TEST(LimitsCommand, ShowsListsByNameAndRangesWithUnits) {
     const ProgramResult result = RunProgram({"limits", "--simulation", "mono"});
 
     ASSERT_EQ(0, result.exitCode) << result.errors;
-    EXPECT_THAT(result.output, ContainsRegex("\nexposure +10 us to 3600 s\n"));
-    EXPECT_THAT(result.output, ContainsRegex("\nreadout-speed +20 MHz, 10 MHz, 5 MHz, 2.5 MHz\n"));
-    EXPECT_THAT(result.output, ContainsRegex("\nroi-width +1 px to 1392 px\n"));
-    EXPECT_THAT(result.output, ContainsRegex("\ncooler-active +off, on\n"));
-    EXPECT_THAT(result.output, ContainsRegex("\nbinning +1, 2, 4, 8\n"));
+    EXPECT_THAT(result.output, HasPattern("\nexposure +10 us to 3600 s\n"));
+    EXPECT_THAT(result.output, HasPattern("\nreadout-speed +20 MHz, 10 MHz, 5 MHz, 2.5 MHz\n"));
+    EXPECT_THAT(result.output, HasPattern("\nroi-width +1 px to 1392 px\n"));
+    EXPECT_THAT(result.output, HasPattern("\ncooler-active +off, on\n"));
+    EXPECT_THAT(result.output, HasPattern("\nbinning +1, 2, 4, 8\n"));
 }
 
 TEST(LimitsCommand, TellsListsAndRangesInJsonAsAFileHoldsThem) {
@@ -133,9 +133,9 @@ TEST(InfoCommand, TellsOnlyWhatItIsAskedFor) {
         RunProgram({"info", "ccd-width", "serial-number", "cooled", "--simulation", "mono"});
 
     EXPECT_EQ(0, result.exitCode);
-    EXPECT_THAT(result.output, testing::MatchesRegex("ccd-width +1392 px +[^\n]*\n"
-                                                     "serial-number +S0005-10001 +[^\n]*\n"
-                                                     "cooled +yes +[^\n]*\n"));
+    EXPECT_THAT(result.output, MatchesPattern("ccd-width +1392 px +[^\n]*\n"
+                                              "serial-number +S0005-10001 +[^\n]*\n"
+                                              "cooled +yes +[^\n]*\n"));
 }
 
 TEST(InfoCommand, AKeyIsNamedAsInTheHeaderOrInJsonToo) {
@@ -163,7 +163,7 @@ TEST(SetCommand, ShowsWhatTheSettingsChanged) {
     EXPECT_THAT(result.output, HasSubstr("image-format   Mono 8-Bit -> Mono 16-Bit\n"));
     EXPECT_THAT(result.output, HasSubstr("gain-db        0 dB -> 3.5 dB\n"));
     EXPECT_THAT(result.output, HasSubstr("trigger-type   Free Run -> Software\n"));
-    EXPECT_THAT(result.output, ContainsRegex("cooling +-?[0-9]+ C -> -10 C\n"));
+    EXPECT_THAT(result.output, HasPattern("cooling +-?[0-9]+ C -> -10 C\n"));
 }
 
 TEST(SetCommand, ShowsWhatFollowsFromASetting) {

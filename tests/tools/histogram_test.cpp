@@ -199,19 +199,6 @@ TEST(HistogramCommand, ADamagedFrameIsShownAndToldWithCode6) {
     }
 }
 
-TEST(HistogramCommand, AFileOfATildeIsShown) {
-    const TemporaryFolder folder;
-    ASSERT_EQ(0, RunProgram({"grab", "0", "--simulation", "mono", "-o", folder.GetPath("~a.fits")})
-                     .exitCode);
-    const std::string program = ZENTARA_BINARY_DIR "/bin/zentara";
-
-    const ProgramResult result = RunTool(
-        {"sh", "-c", "cd '" + folder.GetPath("") + "' && '" + program + "' histogram '~a.fits'"});
-
-    EXPECT_EQ(0, result.exitCode) << result.errors;
-    EXPECT_THAT(result.output, HasSubstr("grey: "));
-}
-
 TEST(HistogramCommand, WrongUseAndBadFilesAreTold) {
     const TemporaryFolder folder;
     const std::string path = folder.GetPath("a.fits");

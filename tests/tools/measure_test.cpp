@@ -1,6 +1,5 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <signal.h>
 
 #include <nlohmann/json.hpp>
 
@@ -201,7 +200,7 @@ TEST_P(Measurements, AnInterruptEndsThemWithCode130) {
         [&] { return ReadFile(still.GetTrace()).find("\"type\":\"frame\"") != std::string::npos; },
         std::chrono::seconds(60)));
 
-    program.Send(SIGINT);
+    program.Interrupt();
 
     const ProgramResult ended = program.Wait();
     EXPECT_EQ(130, ended.exitCode) << ended.errors;
@@ -224,7 +223,7 @@ TEST(GrabCommand, AnInterruptInTheWhiteBalanceLeavesNoFile) {
         [&] { return ReadFile(still.GetTrace()).find("\"type\":\"frame\"") != std::string::npos; },
         std::chrono::seconds(60)));
 
-    program.Send(SIGINT);
+    program.Interrupt();
 
     const ProgramResult ended = program.Wait();
     EXPECT_EQ(130, ended.exitCode) << ended.errors;

@@ -1,11 +1,5 @@
 #include "tools/program.h"
 
-#include <fcntl.h>
-#include <signal.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cstdlib>
 #include <fstream>
 #include <sstream>
 
@@ -14,43 +8,25 @@
 namespace ZentaraTest {
 namespace {
 
-void Redirect(const std::string& path, int descriptor) {
-    const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    if (file < 0 || dup2(file, descriptor) < 0) _exit(126);
+ChildProcess Start(const std::vector<std::string>& commandLine,
+                   const std::vector<std::string>& variables, const TemporaryFolder& folder) {
+    return StartProcess(
+        {commandLine, variables, folder.GetPath("output"), folder.GetPath("errors")});
 }
 
-int Start(const std::vector<std::string>& commandLine, const std::vector<std::string>& variables,
-          const TemporaryFolder& folder) {
-    const std::string output = folder.GetPath("output"), errors = folder.GetPath("errors");
-    std::vector<char*> values;
-    for (const std::string& value : commandLine) values.push_back(const_cast<char*>(value.c_str()));
-    values.push_back(nullptr);
-    const int process = fork();
-    if (process != 0) return process;
-    Redirect(output, STDOUT_FILENO);
-    Redirect(errors, STDERR_FILENO);
-    for (const std::string& variable : variables) putenv(const_cast<char*>(variable.c_str()));
-    execvp(values[0], values.data());
-    _exit(127);
-}
-
-ProgramResult Collect(int process, const TemporaryFolder& folder, std::chrono::seconds limit) {
-    int status = 0;
-    const bool isEnded =
-        ZV::Test::WaitUntil([&] { return waitpid(process, &status, WNOHANG) == process; }, limit);
-    if (!isEnded) {
-        kill(process, SIGKILL);
-        waitpid(process, &status, 0);
-    }
+ProgramResult Collect(ChildProcess process, const TemporaryFolder& folder,
+                      std::chrono::seconds limit) {
     ProgramResult result;
-    result.exitCode = isEnded && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    const bool isEnded =
+        ZV::Test::WaitUntil([&] { return IsProcessEnded(process, &result.exitCode); }, limit);
+    if (!isEnded) KillProcess(process);
     result.output = ReadFile(folder.GetPath("output"));
     result.errors = ReadFile(folder.GetPath("errors"));
     return result;
 }
 
 std::vector<std::string> MakeCommandLine(const std::vector<std::string>& arguments) {
-    std::vector<std::string> commandLine{ZENTARA_BINARY_DIR "/bin/zentara"};
+    std::vector<std::string> commandLine{GetBuiltProgram("zentara")};
     commandLine.insert(commandLine.end(), arguments.begin(), arguments.end());
     return commandLine;
 }
@@ -62,16 +38,21 @@ RunningProgram::RunningProgram(const std::vector<std::string>& arguments,
     : process(Start(MakeCommandLine(arguments), variables, folder)) {}
 
 RunningProgram::~RunningProgram() {
-    if (process > 0) (void)Wait(std::chrono::seconds(0));
+    if (process != NoProcess) (void)Wait(std::chrono::seconds(0));
 }
 
-void RunningProgram::Send(int signal) const {
-    kill(process, signal);
+void RunningProgram::Interrupt() const {
+    InterruptProcess(process);
+}
+
+void RunningProgram::Kill() {
+    KillProcess(process);
+    process = NoProcess;
 }
 
 ProgramResult RunningProgram::Wait(std::chrono::seconds limit) {
     ProgramResult result = Collect(process, folder, limit);
-    process = -1;
+    process = NoProcess;
     return result;
 }
 

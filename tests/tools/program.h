@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "support/temporary_folder.h"
+#include "tools/child_process.h"
 
 /// The zentara program as a child process.
 namespace ZentaraTest {
@@ -26,14 +27,17 @@ class RunningProgram {
     RunningProgram(const RunningProgram&) = delete;
     RunningProgram& operator=(const RunningProgram&) = delete;
 
-    void Send(int signal) const;
+    /// Ctrl-C.
+    void Interrupt() const;
+    /// An end by force; Wait gives the exit code -1 then.
+    void Kill();
     /// Waits for the end, at most `limit`; a run that takes longer is killed and has the exit code
     /// -1.
     ProgramResult Wait(std::chrono::seconds limit = std::chrono::seconds(60));
 
   private:
     TemporaryFolder folder;
-    int process = -1;
+    ChildProcess process = NoProcess;
 };
 
 ProgramResult RunProgram(const std::vector<std::string>& arguments,

@@ -1,6 +1,5 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <signal.h>
 
 #include <chrono>
 #include <random>
@@ -10,6 +9,7 @@
 #include "support/wait_until.h"
 #include "tools/image_readers.h"
 #include "tools/program.h"
+#include "tools/text_pattern.h"
 #include "tools/traced_scenario.h"
 
 // A stream that is killed leaves whole images alone under the names of images.
@@ -44,13 +44,13 @@ TEST_P(KilledStream, LeavesNoHalfImageUnderItsName) {
                                         std::chrono::seconds(60)));
         // Somewhere in the writing of the next files: a spread of moments, whichever they are.
         ZV::Test::Disturb(std::chrono::microseconds(random() % 3000));
-        program.Send(SIGKILL);
+        program.Kill();
         EXPECT_EQ(-1, program.Wait().exitCode);
 
         std::set<std::uintmax_t> sizes;
         for (const std::string& name : ListImages(folder)) {
             sizes.insert(std::filesystem::file_size(folder.GetFolder() / name));
-            EXPECT_THAT(name, testing::MatchesRegex("night-[0-9]{6}[.][a-z]+"));
+            EXPECT_THAT(name, MatchesPattern("night-[0-9]{6}[.][a-z]+"));
             if (GetParam() == std::string(".raw")) continue;
             ZentaraProgram::Image image;
             EXPECT_EQ("", ZentaraProgram::ReadImage(folder.GetPath(name), &image)) << name;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <nlohmann/json.hpp>
 #include <string>
 
 #include "tools/program.h"
@@ -9,8 +10,9 @@ namespace ZentaraTest {
 /// A scenario of one quick camera without noise, with a trace beside it.
 struct TracedScenario {
     explicit TracedScenario(const std::string& camera) {
-        const std::string text = R"({"base": "mono", "timeScale": 0, "trace": ")" + GetTrace() +
-                                 R"(", "cameras": [)" + camera + "]}";
+        const std::string trace = nlohmann::json(GetTrace()).dump();
+        const std::string text = R"({"base": "mono", "timeScale": 0, "trace": )" + trace +
+                                 R"(, "cameras": [)" + camera + "]}";
         WriteFile(GetName(), text);
     }
     [[nodiscard]] std::string GetName() const { return folder.GetPath("scenario.json"); }

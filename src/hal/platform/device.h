@@ -46,7 +46,8 @@ void CloseDevice(PlatformDevice* device);
 bool IsRealDevice(const PlatformDevice* device);
 
 /// Sends a request and blocks until the driver has answered. True on success; the number of bytes
-/// answered goes to `bytes` if that is not null.
+/// answered goes to `bytes` if that is not null. A thread that is to end takes back a request that
+/// a real driver keeps; it fails with 995 then.
 bool ControlDevice(PlatformDevice* device, const ControlRequest& request, std::uint32_t* bytes);
 
 /// Sends a request without waiting for its end. `overlapped` must not have a request under way; its

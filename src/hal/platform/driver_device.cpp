@@ -88,6 +88,7 @@ void CloseDriverDevice(const DriverDevice& device) {
 
 bool ControlDriverDevice(const DriverDevice& device, const ControlRequest& request,
                          std::uint32_t* bytes) {
+    const ThreadHold hold;
     DriverRequest record;
     (void)BeginRequest(request, false, &record);  // a new record has nothing under way
     (void)SendRequest(device, &record);           // the record tells

@@ -24,9 +24,9 @@ WaitOutcome WaitForThread(PlatformThread* thread, std::uint64_t timeoutMs);
 /// Ends `thread` by asking: raises its end flag and wakes its wait for an overlapped request, which
 /// then returns `CompletionOutcome::Ended` (device.h), and waits until the thread has returned from
 /// its entry. One that has not after a second of real time, since it sits in a client's callback,
-/// is killed on Windows and lives on elsewhere. Returns false when it could not be ended; the
-/// thread is then still the caller's, has its end flag raised for good and may be waited for or
-/// ended again.
+/// is killed on Windows and lives on elsewhere; in a simulated driver it lives on everywhere.
+/// Returns false when it could not be ended; the thread is then still the caller's, has its end
+/// flag raised for good and may be waited for or ended again.
 bool EndThread(PlatformThread* thread);
 
 /// Gives up the thread's handle. A thread that still runs goes on by itself and frees what it

@@ -23,4 +23,28 @@ void ThreadEnd::EndWait() {
     condition = nullptr;
 }
 
+void ThreadEnd::Hold() {
+    const std::lock_guard guard(mutex);
+    ++holdCount;
+}
+
+void ThreadEnd::LetGo() {
+    const std::lock_guard guard(mutex);
+    --holdCount;
+}
+
+std::unique_lock<std::mutex> ThreadEnd::LockUnlessHeld() {
+    std::unique_lock lock(mutex);
+    if (holdCount != 0) lock.unlock();
+    return lock;
+}
+
+ThreadHold::ThreadHold() : end(GetOwnThreadEnd()) {
+    if (end != nullptr) end->Hold();
+}
+
+ThreadHold::~ThreadHold() {
+    if (end != nullptr) end->LetGo();
+}
+
 }  // namespace ZV

@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <condition_variable>
+#include <cstdint>
 #include <mutex>
 
 namespace ZV {
@@ -23,8 +24,15 @@ class ThreadEnd {
     void BeginWait(std::mutex* waitMutex, std::condition_variable* condition);
     void EndWait();
 
+    /// While it is held, the thread must not be killed.
+    void Hold();
+    void LetGo();
+    /// Keeps the thread from being held until the lock goes. Owns nothing when it is held already.
+    std::unique_lock<std::mutex> LockUnlessHeld();
+
   private:
     std::mutex mutex;
+    std::uint32_t holdCount = 0;  // guarded by mutex
     std::atomic<bool> isRequested{false};
     std::mutex* waitMutex = nullptr;               // guarded by mutex
     std::condition_variable* condition = nullptr;  // guarded by mutex
@@ -32,5 +40,17 @@ class ThreadEnd {
 
 /// The record of the calling thread, or null for a thread that StartThread did not start.
 ThreadEnd* GetOwnThreadEnd();
+
+/// Holds the calling thread for its life: others reach what is on its stack.
+class ThreadHold {
+  public:
+    ThreadHold();
+    ~ThreadHold();
+    ThreadHold(const ThreadHold&) = delete;
+    ThreadHold& operator=(const ThreadHold&) = delete;
+
+  private:
+    ThreadEnd* end;  // borrowed from the thread's record, for its life
+};
 
 }  // namespace ZV

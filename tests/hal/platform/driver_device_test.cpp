@@ -204,6 +204,18 @@ TEST_F(FakeDevice, BlocksTheCallerOfAPlainRequestThatTheDriverPends) {
     EXPECT_TRUE(WaitUntil([&] { return isDone.load(); }));
 }
 
+TEST_F(FakeDevice, KeepsAThreadThatIsToEndInAPlainRequestUntilTheDriverEndsIt) {
+    TestThread caller(
+        [&] { EXPECT_TRUE(ControlDriverDevice(device, MakeRequest(CodePend), nullptr)); });
+    ASSERT_TRUE(WaitUntil([this] { return driver.CountPended() == 1; }));
+
+    EXPECT_FALSE(EndThread(caller.Get()));
+    EXPECT_EQ(GetLastPlatformError(), PlatformErrorBusy);
+
+    driver.EndFirst(PlatformErrorNone, 0);
+    EXPECT_TRUE(EndThread(caller.Get()));
+}
+
 TEST_F(FakeDevice, LeavesARequestThatIsDoneAtOnceAsEnded) {
     DriverRequest record;
 

@@ -9,10 +9,12 @@ static Message* FindOfIrp(const IRP* irp) {
     return NULL;
 }
 
+/* Looks at the message alone: the device may go while this runs. */
 static void NTAPI CancelCameraRequest(DEVICE_OBJECT* device, IRP* irp) {
     KIRQL irql;
     Message* message;
     BOOLEAN wasTaken = FALSE;
+    (void)device;
     IoReleaseCancelSpinLock(irp->CancelIrql);
     KeAcquireSpinLock(&driverState.lock, &irql);
     message = FindOfIrp(irp);
@@ -23,10 +25,13 @@ static void NTAPI CancelCameraRequest(DEVICE_OBJECT* device, IRP* irp) {
     }
     KeReleaseSpinLock(&driverState.lock, irql);
     if (message != NULL && wasTaken) {
-        Tell(RoadCancel, GetExtension(device)->index, message->record.id, message->record.file);
+        Tell(RoadCancel, message->record.device, message->record.id, message->record.file);
     }
-    if (message != NULL) ExFreePoolWithTag(message, ROAD_TAG);
-    Complete(irp, STATUS_CANCELLED, 0);
+    if (message != NULL) {
+        EndTaken(message, ERROR_OPERATION_ABORTED);
+    } else {
+        Complete(irp, STATUS_CANCELLED, 0);
+    }
 }
 
 /* Lists the request of `message` with a routine for its cancellation, unless nobody would answer.
@@ -43,15 +48,14 @@ static UINT32 Pend(Message* message, const DeviceExtension* camera) {
 }
 
 static NTSTATUS PendCameraRequest(const DeviceExtension* camera, Message* message) {
-    IRP* irp = message->irp;
     KIRQL irql;
     UINT32 error;
     KeAcquireSpinLock(&driverState.lock, &irql);
     error = Pend(message, camera);
     KeReleaseSpinLock(&driverState.lock, irql);
     if (error != 0) {
-        ExFreePoolWithTag(message, ROAD_TAG);
-        return Complete(irp, GetStatusOfError(error), 0);
+        EndTaken(message, error);
+        return GetStatusOfError(error);
     }
     ServeHelper();
     return STATUS_PENDING;
@@ -61,7 +65,10 @@ static NTSTATUS SendToHelper(DEVICE_OBJECT* device, IRP* irp, UINT32 kind) {
     const DeviceExtension* camera = GetExtension(device);
     const IO_STACK_LOCATION* stack = IoGetCurrentIrpStackLocation(irp);
     Message* message = MakeMessage(kind, camera->index);
-    if (message == NULL) return Complete(irp, STATUS_INSUFFICIENT_RESOURCES, 0);
+    if (message == NULL) {
+        if (kind == RoadOpen) CountFile(stack->FileObject, FALSE);
+        return Complete(irp, STATUS_INSUFFICIENT_RESOURCES, 0);
+    }
     message->irp = irp;
     message->record.file = (UINT64)(ULONG_PTR)stack->FileObject;
     if (kind == RoadControl) {
@@ -99,16 +106,16 @@ static BOOLEAN AnswerPrepared(DEVICE_OBJECT* device, IRP* irp, NTSTATUS* status)
     return TRUE;
 }
 
-static void CountFiles(INT32 step) {
-    KIRQL irql;
-    KeAcquireSpinLock(&driverState.lock, &irql);
-    driverState.openFileCount += step;
-    KeReleaseSpinLock(&driverState.lock, irql);
+/* The last handle has gone. Requests that are pended hold their file, so that its close would come
+ * only after their end. */
+static NTSTATUS CleanUpCamera(IRP* irp) {
+    EndAll(IsOfFile, IoGetCurrentIrpStackLocation(irp)->FileObject, ERROR_OPERATION_ABORTED);
+    return Complete(irp, STATUS_SUCCESS, 0);
 }
 
 static NTSTATUS CloseCamera(DEVICE_OBJECT* device, IRP* irp) {
     FILE_OBJECT* file = IoGetCurrentIrpStackLocation(irp)->FileObject;
-    CountFiles(-1);
+    CountFile(file, FALSE);
     EndAll(IsOfFile, file, ERROR_OPERATION_ABORTED);
     Tell(RoadClose, GetExtension(device)->index, 0, (UINT64)(ULONG_PTR)file);
     return Complete(irp, STATUS_SUCCESS, 0);
@@ -123,8 +130,10 @@ NTSTATUS DispatchCamera(DEVICE_OBJECT* device, IRP* irp) {
     NTSTATUS status;
     switch (IoGetCurrentIrpStackLocation(irp)->MajorFunction) {
         case IRP_MJ_CREATE:
-            CountFiles(1);
+            CountFile(IoGetCurrentIrpStackLocation(irp)->FileObject, TRUE);
             return SendToHelper(device, irp, RoadOpen);
+        case IRP_MJ_CLEANUP:
+            return CleanUpCamera(irp);
         case IRP_MJ_CLOSE:
             return CloseCamera(device, irp);
         case IRP_MJ_DEVICE_CONTROL:

@@ -169,24 +169,24 @@ static NTSTATUS EndAnswered(void* buffer, IRP* irp, ULONG* bytes) {
     return STATUS_SUCCESS;
 }
 
-static BOOLEAN WaitForMessage(IRP* irp) {
-    if (driverState.waitingNext != NULL) return FALSE;
+static NTSTATUS WaitForMessage(IRP* irp) {
+    if (driverState.waitingNext != NULL) return STATUS_DEVICE_BUSY;
     IoSetCancelRoutine(irp, CancelNext);
-    if (irp->Cancel && IoSetCancelRoutine(irp, NULL) != NULL) return FALSE;
+    if (irp->Cancel && IoSetCancelRoutine(irp, NULL) != NULL) return STATUS_CANCELLED;
     IoMarkIrpPending(irp);
     driverState.waitingNext = irp;
-    return TRUE;
+    return STATUS_PENDING;
 }
 
 static NTSTATUS PendNext(IRP* irp) {
     FILE_OBJECT* file = IoGetCurrentIrpStackLocation(irp)->FileObject;
-    BOOLEAN isPended = FALSE;
+    NTSTATUS status = STATUS_DEVICE_BUSY;
     KIRQL irql;
     KeAcquireSpinLock(&driverState.lock, &irql);
     if (driverState.helper == NULL) driverState.helper = file;
-    if (driverState.helper == file) isPended = WaitForMessage(irp);
+    if (driverState.helper == file) status = WaitForMessage(irp);
     KeReleaseSpinLock(&driverState.lock, irql);
-    if (!isPended) return Complete(irp, STATUS_DEVICE_BUSY, 0);
+    if (status != STATUS_PENDING) return Complete(irp, status, 0);
     ServeHelper();
     return STATUS_PENDING;
 }
@@ -222,27 +222,35 @@ static NTSTATUS RunControl(IRP* irp) {
     return Complete(irp, STATUS_INVALID_DEVICE_REQUEST, 0);
 }
 
+void DismissHelper(void) {
+    IRP* next;
+    KIRQL irql;
+    KeAcquireSpinLock(&driverState.lock, &irql);
+    driverState.helper = NULL;
+    next = driverState.waitingNext;
+    if (next != NULL && IoSetCancelRoutine(next, NULL) == NULL) next = NULL;
+    if (next != NULL) driverState.waitingNext = NULL;
+    KeReleaseSpinLock(&driverState.lock, irql);
+    if (next != NULL) Complete(next, STATUS_CANCELLED, 0);
+}
+
 /* A helper that has gone answers nothing more. */
 static void ForgetHelper(const FILE_OBJECT* file) {
-    IRP* next = NULL;
     BOOLEAN isHelper;
     KIRQL irql;
     KeAcquireSpinLock(&driverState.lock, &irql);
     isHelper = driverState.helper == file;
-    if (isHelper) {
-        driverState.helper = NULL;
-        next = driverState.waitingNext;
-        if (next != NULL && IoSetCancelRoutine(next, NULL) == NULL) next = NULL;
-        if (next != NULL) driverState.waitingNext = NULL;
-    }
     KeReleaseSpinLock(&driverState.lock, irql);
-    if (next != NULL) Complete(next, STATUS_CANCELLED, 0);
-    if (isHelper) EndAll(IsAny, NULL, ERROR_DEVICE_NOT_CONNECTED);
+    if (!isHelper) return;
+    DismissHelper();
+    EndAll(IsAny, NULL, ERROR_DEVICE_NOT_CONNECTED);
 }
 
 NTSTATUS DispatchControl(IRP* irp) {
     const IO_STACK_LOCATION* stack = IoGetCurrentIrpStackLocation(irp);
-    if (stack->MajorFunction == IRP_MJ_CLOSE) ForgetHelper(stack->FileObject);
+    if (stack->MajorFunction == IRP_MJ_CLEANUP || stack->MajorFunction == IRP_MJ_CLOSE) {
+        ForgetHelper(stack->FileObject);
+    }
     if (stack->MajorFunction != IRP_MJ_DEVICE_CONTROL) return Complete(irp, STATUS_SUCCESS, 0);
     if (stack->Parameters.DeviceIoControl.IoControlCode == ROAD_NEXT) return PendNext(irp);
     return RunControl(irp);

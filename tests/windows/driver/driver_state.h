@@ -59,6 +59,8 @@ DeviceExtension* GetExtension(DEVICE_OBJECT* device);
 ULONG CopyOutput(IRP* irp, const RoadRequest* record, const void* data, ULONG bytes);
 /* Takes `message` off the lists. The caller holds the lock. */
 void Unlink(Message* message);
+/* Counts the files of the cameras that are open, each once, however often it is told. */
+void CountFile(FILE_OBJECT* file, BOOLEAN isOpen);
 /* Takes the request of `message` for the caller to complete. False when a cancellation has it
  * already. The caller holds the lock. */
 BOOLEAN TakeForEnd(Message* message);
@@ -85,6 +87,8 @@ void ServeHelper(void);
 
 NTSTATUS DispatchCamera(DEVICE_OBJECT* device, IRP* irp);
 NTSTATUS DispatchControl(IRP* irp);
+/* Ends the helper's request; nobody serves from then on. What is pended stays. */
+void DismissHelper(void);
 /* Takes the camera's link away, ends what is pended and fails what comes. */
 void Unplug(UINT32 index);
 

@@ -47,7 +47,21 @@ BOOLEAN TakeForEnd(Message* message) {
     return TRUE;
 }
 
+void CountFile(FILE_OBJECT* file, BOOLEAN isOpen) {
+    KIRQL irql;
+    KeAcquireSpinLock(&driverState.lock, &irql);
+    if ((file->FsContext != NULL) != isOpen) {
+        file->FsContext = isOpen ? &driverState : NULL;
+        driverState.openFileCount += isOpen ? 1 : -1;
+    }
+    KeReleaseSpinLock(&driverState.lock, irql);
+}
+
 void EndTaken(Message* message, UINT32 error) {
+    /* A file that could not be opened is not closed. */
+    if (message->irp != NULL && message->record.kind == RoadOpen) {
+        CountFile((FILE_OBJECT*)(ULONG_PTR)message->record.file, FALSE);
+    }
     if (message->irp != NULL) Complete(message->irp, GetStatusOfError(error), 0);
     ExFreePoolWithTag(message, ROAD_TAG);
 }

@@ -32,11 +32,12 @@ static void NTAPI Unload(DRIVER_OBJECT* object) {
     UNICODE_STRING link;
     UINT32 index;
     (void)object;
+    DismissHelper();
+    for (index = 0; index < ROAD_DEVICES_MAX; ++index) Unplug(index);
+    EndAll(IsAny, NULL, ERROR_DEVICE_NOT_CONNECTED);
     for (index = 0; index < ROAD_DEVICES_MAX; ++index) {
-        Unplug(index);
         if (driverState.cameras[index] != NULL) IoDeleteDevice(driverState.cameras[index]);
     }
-    EndAll(IsAny, NULL, ERROR_DEVICE_NOT_CONNECTED);
     RtlInitUnicodeString(&link, L"\\??\\ZentaraTestControl");
     IoDeleteSymbolicLink(&link);
     IoDeleteDevice(driverState.controlDevice);

@@ -21,6 +21,8 @@ namespace {
 
 constexpr std::uint32_t IdentityAddress = 0xE0010038;
 constexpr std::uint32_t ControlAddress = 0xD0002000;
+constexpr std::uint32_t StreamSwitchAddress = 0xD0005004;
+constexpr std::uint16_t StreamPayloadBytes = 500;
 constexpr DWORD WaitLimitMs = 20000;
 
 /// A camera's record, listed and connected by the bus layer.
@@ -104,6 +106,14 @@ TEST_F(RoadRequests, AReadOfSeveralQuadletsArrivesWhole) {
     EXPECT_EQ(0xA5A5A5A5u, values[Quadlets]);
 }
 
+TEST_F(RoadRequests, AReadOfNoQuadletsIsAnsweredAndWritesNothing) {
+    std::uint32_t value = 0xA5A5A5A5;
+
+    EXPECT_EQ(0u, HAL_CameraReadData(&list[0], IdentityAddress, &value, 0));
+
+    EXPECT_EQ(0xA5A5A5A5u, value);
+}
+
 TEST_F(RoadRequests, AReadThatTheDriverFailsIsAFailedRead) {
     std::uint32_t value = 0;
     for (const bool isPended : {false, true}) {
@@ -130,6 +140,51 @@ TEST_F(RoadRequests, AWriteThatFailsAfterItWasPendedGivesTheSystemsErrorNumber) 
         "pended": true})"));
 
     EXPECT_EQ(121u, Write());
+}
+
+struct RefusedRequest {
+    std::uint32_t code;
+    HALStatus status;
+};
+
+TEST_F(RoadRequests, AConnectOfWhichTheDriverFailsARequestTellsWhichOne) {
+    constexpr RefusedRequest Refused[] = {{FW_IOCTL_QUERY_BUSY, HALChannelNotFreed},
+                                          {FW_IOCTL_ALLOC_BANDWIDTH, HALBandwidthNotAllocated},
+                                          {FW_IOCTL_ALLOC_CHANNEL, HALChannelNotAllocated}};
+    for (const RefusedRequest& refused : Refused) {
+        ASSERT_EQ(0u, HAL_CameraDisconnect(&list[0])) << refused.code;
+        Prepare(refused.code, ERROR_GEN_FAILURE);
+
+        EXPECT_EQ(refused.status, Connect(&list[0]));
+    }
+    EXPECT_EQ(0u, HAL_CameraDisconnect(&list[0]));
+    EXPECT_EQ(0u, Connect(&list[0]));
+}
+
+TEST_F(RoadRequests, ResourcesThatTheDriverRefusesOnceAreGrantedAtTheLowerSpeedAndTwiceAre28) {
+    ASSERT_EQ(0u, HAL_CameraDisconnect(&list[0]));
+    Prepare(FW_IOCTL_ALLOC_RESOURCES, ERROR_GEN_FAILURE);
+    EXPECT_EQ(0u, Connect(&list[0]));
+
+    ASSERT_EQ(0u, HAL_CameraDisconnect(&list[0]));
+    ASSERT_TRUE(AddFault(
+        R"({"kind": "failRequest", "code": "FW_IOCTL_ALLOC_RESOURCES", "error": 31, "count": 2})"));
+    EXPECT_EQ(HALResourcesNotAllocated, Connect(&list[0]));
+}
+
+TEST_F(RoadRequests, ADisconnectOfWhichTheDriverFailsARequestTellsWhichOneAndLeavesTheDeviceOpen) {
+    constexpr RefusedRequest Refused[] = {{FW_IOCTL_FREE_RESOURCES, HALResourcesNotFreed},
+                                          {FW_IOCTL_FREE_CHANNEL, HALChannelNotFreed},
+                                          {FW_IOCTL_FREE_BANDWIDTH, HALBandwidthNotFreed}};
+    for (const RefusedRequest& refused : Refused) {
+        Prepare(refused.code, ERROR_GEN_FAILURE);
+
+        EXPECT_EQ(refused.status, HAL_CameraDisconnect(&list[0]));
+
+        EXPECT_EQ(1, list[0].connected);
+    }
+    EXPECT_EQ(0u, HAL_CameraDisconnect(&list[0]));
+    EXPECT_EQ(0, list[0].connected);
 }
 
 TEST_F(RoadRequests, ASecondOpenIsToldThatTheDeviceIsHeldAndThenThatItIsGone) {
@@ -172,6 +227,59 @@ TEST_F(RoadRequests, TheTimeOfARegisterReadIsMeasured) {
     for (int i = 0; i < Reads; ++i) ASSERT_EQ(0u, Read(&value));
     const std::chrono::duration<double, std::micro> past = std::chrono::steady_clock::now() - start;
     std::cout << "register read: " << past.count() / Reads << " microseconds\n";
+}
+
+/// A camera that streams, of whose frames none is taken.
+class RoadStream : public RoadRequests {
+  protected:
+    void SetUp() override {
+        RoadRequests::SetUp();
+        if (HasFatalFailure()) return;
+        ASSERT_EQ(0u, HAL_CameraDisconnect(&list[0]));
+        ASSERT_EQ(0u, HAL_CameraConnect(&list[0], StreamPayloadBytes, TakeNone, TakeNone, nullptr,
+                                        nullptr, nullptr, nullptr));
+    }
+
+    static tStFrameInfo* TakeNone(void*) { return nullptr; }
+    HALStatus Start() { return HAL_CameraStartStreaming(&list[0], StreamSwitchAddress, 1, nullptr); }
+    HALStatus Stop() { return HAL_CameraStopStreaming(&list[0], StreamSwitchAddress); }
+    bool IsNothingPended() {
+        return GetState().pendedRequests == 0 && GetDriver().GetState().pended == 0;
+    }
+};
+
+TEST_F(RoadStream, AListenThatFailsAfterItWasPendedFailsTheStartAndTheStopSucceeds) {
+    ASSERT_TRUE(
+        AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_LISTEN", "pended": true})"));
+
+    EXPECT_EQ(HALReadFailed, Start());
+
+    EXPECT_EQ(0u, GetState().isStreaming);
+    EXPECT_EQ(0u, Stop());
+    EXPECT_TRUE(WaitUntil([&] { return IsNothingPended(); }));
+}
+
+TEST_F(RoadStream, ALoopThatMayNotSubmitABufferAgainLeavesAndTheStreamGoesOnUntilItsStop) {
+    ASSERT_EQ(0u, Start());
+    Prepare(FW_IOCTL_ATTACH_BUFFER, ERROR_GEN_FAILURE);
+
+    EXPECT_TRUE(WaitUntil([&] { return GetState().attachedBuffers == 0; }));
+
+    EXPECT_EQ(1u, GetState().isStreaming);
+    EXPECT_EQ(0u, Stop());
+    EXPECT_EQ(0u, GetState().isStreaming);
+    EXPECT_TRUE(WaitUntil([&] { return IsNothingPended(); }));
+}
+
+TEST_F(RoadStream, AStopTakesTheLeaveBackThatTheDriverKeeps) {
+    ASSERT_TRUE(AddFault(R"({"kind": "neverComplete", "code": "FW_IOCTL_STREAM_LEAVE"})"));
+    ASSERT_EQ(0u, Start());
+
+    EXPECT_EQ(0u, Stop());
+
+    EXPECT_TRUE(WaitUntil([&] { return IsNothingPended(); }));
+    EXPECT_EQ(0u, HAL_CameraDisconnect(&list[0]));
+    EXPECT_TRUE(WaitUntil([&] { return GetState().openHandles == 0; }));
 }
 
 /// A device that is opened by its path, with one request that the camera never answers.
@@ -243,6 +351,13 @@ TEST_F(NeverAnswered, TheDeathOfTheHelperEndsIt) {
     KillHost();
 
     EXPECT_EQ(static_cast<DWORD>(ERROR_DEVICE_NOT_CONNECTED), GetOutcome());
+}
+
+TEST_F(NeverAnswered, TheUnloadOfTheDriverEndsIt) {
+    GetDriver().Stop();
+
+    EXPECT_EQ(static_cast<DWORD>(ERROR_DEVICE_NOT_CONNECTED), GetOutcome());
+    EXPECT_FALSE(GetDriver().IsRunning());
 }
 
 }  // namespace

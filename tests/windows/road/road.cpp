@@ -1,6 +1,7 @@
 #include "windows/road/road.h"
 
 #include <algorithm>
+#include <chrono>
 #include <nlohmann/json.hpp>
 #include <sstream>
 
@@ -11,11 +12,15 @@ namespace {
 
 constexpr char ScenarioFile[] = "scenario.json";
 constexpr char TraceFile[] = "trace.jsonl";
+constexpr auto ServiceLimit = std::chrono::seconds(60);
 
 /// The driver serves all tests; it starts with the first and stops after the last.
 class DriverEnvironment : public testing::Environment {
   public:
-    void SetUp() override { driver = std::make_unique<TestDriver>(); }
+    void SetUp() override {
+        driver = std::make_unique<TestDriver>();
+        if (driver->IsRunning()) RemoveLeftDevices();
+    }
     void TearDown() override { driver.reset(); }
 
     /// One test's loss of the driver is not the next one's.
@@ -67,7 +72,7 @@ void Road::SetUp() {
     host =
         std::make_unique<ChildProcess>("camera-host.exe", '"' + folder.GetPath(ScenarioFile) + '"');
     ASSERT_EQ("ok", host->ReadLine());
-    ASSERT_TRUE(WaitUntil([&] { return GetDriver().GetState().isServed != 0; }));
+    ASSERT_TRUE(WaitUntil([&] { return GetDriver().GetState().isServed != 0; }, ServiceLimit));
 }
 
 void Road::WriteScenario(const std::vector<std::string_view>& cameras) {

@@ -24,6 +24,8 @@ namespace {
 constexpr std::size_t RingFrames = 8;
 /// Requests that a stream keeps with the driver.
 constexpr std::uint32_t RingRequests = 60;
+/// The one by which it tells the driver of itself is pended for as long.
+constexpr std::uint32_t EnterRequests = 1;
 
 class RoadClient : public Road {
   protected:
@@ -61,7 +63,12 @@ class RoadClient : public Road {
     void StallStream() {
         ASSERT_TRUE(
             AddFault(R"({"kind": "neverComplete", "code": "FW_IOCTL_ATTACH_BUFFER", "count": 0})"));
-        ASSERT_TRUE(WaitUntil([&] { return GetDriver().GetState().pended >= RingRequests; }));
+        // None of them is being answered any longer.
+        ASSERT_TRUE(WaitUntil([&] {
+            const HostState state = GetState();
+            return state.attachedBuffers == 0 &&
+                   state.pendedRequests == RingRequests + EnterRequests;
+        }));
     }
     /// True when nothing of a camera is open, pended or reserved any longer.
     bool IsAllGiven() {

@@ -6,6 +6,7 @@
 
 #include <cstdio>
 #include <cstring>
+#include <utility>
 
 #include "support/wait_until.h"
 
@@ -20,7 +21,10 @@ constexpr char InterfaceKey[] =
 constexpr GUID SystemClass{
     0x4D36E97D, 0xE325, 0x11CE, {0xBF, 0xC1, 0x08, 0x00, 0x2B, 0xE1, 0x03, 0x18}};
 constexpr char TurnName[] = "ZentaraTestDriverTurn";
-constexpr DWORD TurnLimitMs = 400000;
+constexpr DWORD TurnLimitMs = 1000000;  // longer than a suite may take
+constexpr auto StopLimit = std::chrono::seconds(60);
+constexpr auto StartLimit = std::chrono::seconds(90);
+constexpr char InstancePrefix[] = "ROOT\\ZENTARATEST\\";
 constexpr std::size_t PathPrefixLength = 4;  // of "\\?\"
 
 bool IsStopped(SC_HANDLE service) {
@@ -28,11 +32,16 @@ bool IsStopped(SC_HANDLE service) {
     return !QueryServiceStatus(service, &status) || status.dwCurrentState == SERVICE_STOPPED;
 }
 
-void StopAndDelete(SC_HANDLE service) {
-    if (service == nullptr) return;
+void StopService(SC_HANDLE service) {
     SERVICE_STATUS status{};
     ControlService(service, SERVICE_CONTROL_STOP, &status);
-    EXPECT_TRUE(WaitUntil([&] { return IsStopped(service); })) << "the driver does not stop";
+    EXPECT_TRUE(WaitUntil([&] { return IsStopped(service); }, StopLimit))
+        << "the driver does not stop";
+}
+
+void StopAndDelete(SC_HANDLE service) {
+    if (service == nullptr) return;
+    StopService(service);
     DeleteService(service);
     CloseServiceHandle(service);
 }
@@ -56,7 +65,20 @@ bool Start(SC_HANDLE service) {
             return StartServiceA(service, 0, nullptr) ||
                    GetLastError() == ERROR_SERVICE_ALREADY_RUNNING;
         },
-        std::chrono::seconds(90));
+        StartLimit);
+}
+
+/// A driver whose start was given up makes its control device a while later.
+HANDLE WaitForControl() {
+    HANDLE control = INVALID_HANDLE_VALUE;
+    const bool isThere = WaitUntil(
+        [&] {
+            control = OpenControl();
+            return control != INVALID_HANDLE_VALUE;
+        },
+        StartLimit);
+    EXPECT_TRUE(isThere) << "the driver has no control device: " << GetLastError();
+    return control;
 }
 
 /// The device's interface, with its path.
@@ -87,7 +109,24 @@ std::string RegisterDevice(HDEVINFO set, std::uint32_t index) {
     return CreateInterface(set, &device);
 }
 
+bool IsOfTests(HDEVINFO set, SP_DEVINFO_DATA* device) {
+    char instance[MAX_PATH] = "";
+    return SetupDiGetDeviceInstanceIdA(set, device, instance, sizeof instance, nullptr) &&
+           _strnicmp(instance, InstancePrefix, sizeof InstancePrefix - 1) == 0;
+}
+
 }  // namespace
+
+void RemoveLeftDevices() {
+    // With their interfaces, which go with them.
+    HDEVINFO set = SetupDiGetClassDevsA(&InterfaceClass, nullptr, nullptr, DIGCF_DEVICEINTERFACE);
+    SP_DEVINFO_DATA device{};
+    device.cbSize = sizeof device;
+    for (DWORD i = 0; SetupDiEnumDeviceInfo(set, i, &device); ++i) {
+        if (IsOfTests(set, &device)) SetupDiRemoveDevice(set, &device);
+    }
+    SetupDiDestroyDeviceInfoList(set);
+}
 
 std::string GetProgramFolder() {
     char path[MAX_PATH] = "";
@@ -100,22 +139,31 @@ TestDriver::TestDriver()
     : turn(CreateMutexA(nullptr, FALSE, TurnName)),
       manager(OpenSCManagerA(nullptr, nullptr, SC_MANAGER_ALL_ACCESS)) {
     const DWORD outcome = WaitForSingleObject(turn, TurnLimitMs);
-    EXPECT_TRUE(outcome == WAIT_OBJECT_0 || outcome == WAIT_ABANDONED) << outcome;
+    hasTurn = outcome == WAIT_OBJECT_0 || outcome == WAIT_ABANDONED;
+    if (!hasTurn) {
+        ADD_FAILURE() << "another suite keeps the driver: " << outcome;
+        return;
+    }
     StopAndDelete(OpenServiceA(manager, ROAD_SERVICE_NAME, SERVICE_ALL_ACCESS));
     service = InstallService(manager);
     if (service == nullptr || !Start(service)) {
         ADD_FAILURE() << "the driver does not start: " << GetLastError();
         return;
     }
-    control = OpenControl();
+    control = WaitForControl();
 }
 
 TestDriver::~TestDriver() {
     if (control != INVALID_HANDLE_VALUE) CloseHandle(control);
     StopAndDelete(service);
     CloseServiceHandle(manager);
-    ReleaseMutex(turn);
+    if (hasTurn) ReleaseMutex(turn);
     CloseHandle(turn);
+}
+
+void TestDriver::Stop() {
+    if (control != INVALID_HANDLE_VALUE) CloseHandle(std::exchange(control, INVALID_HANDLE_VALUE));
+    StopService(service);
 }
 
 bool TestDriver::IsRunning() const {

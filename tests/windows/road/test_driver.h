@@ -19,6 +19,8 @@ class TestDriver {
     TestDriver& operator=(const TestDriver&) = delete;
 
     bool IsRunning() const;
+    /// Unloads the driver for good.
+    void Stop();
 
     /// Puts camera `index` below the device path `path` ("\\\\?\\..."), and takes it away.
     bool Plug(std::uint32_t index, const std::string& path);
@@ -32,6 +34,7 @@ class TestDriver {
                  DWORD outputBytes) const;
 
     HANDLE turn = nullptr;
+    bool hasTurn = false;
     SC_HANDLE manager = nullptr;
     SC_HANDLE service = nullptr;
     HANDLE control = INVALID_HANDLE_VALUE;
@@ -56,6 +59,10 @@ class DeviceInterface {
     void* set;
     std::string path;
 };
+
+/// Removes the devices that a run which was killed has left. Requires: the driver's turn, and no
+/// DeviceInterface.
+void RemoveLeftDevices();
 
 /// Folder of the running program, without a separator at its end.
 std::string GetProgramFolder();

@@ -10,6 +10,10 @@
 #include "hal/platform/simulation_module.h"
 #include "hal/platform/win32/handle_wait.h"
 
+// The system ends a request by writing its record and then setting its event, perhaps a while later
+// and from another thread. A record is therefore free for the next request only when the event has
+// been seen: an event that came late would end the wait for that one.
+
 namespace ZV {
 
 struct PlatformDevice {
@@ -21,12 +25,12 @@ struct PlatformDevice {
 struct PlatformOverlapped {
     /// A request to a simulated device.
     DriverRequest simulated;
-    /// A request to a real one: under way from a pended request to the wait that saw its end.
+    /// A request to a real one: under way from a pended request to the wait that saw its event.
     OVERLAPPED system{};
     HANDLE event = nullptr;
     std::atomic<bool> isUnderWay{false};
     DWORD error = ERROR_SUCCESS;
-    bool isLastReal = false;
+    std::atomic<bool> isLastReal{false};
 };
 
 namespace {
@@ -45,6 +49,16 @@ bool SendRequest(HANDLE device, const ControlRequest& request, OVERLAPPED* overl
                            overlapped) != FALSE;
 }
 
+/// Waits for the end of a request. A thread that is to end takes it back first: the record and the
+/// buffers are its own, and a driver may keep the request for ever.
+bool FinishRealRequest(HANDLE device, OVERLAPPED* overlapped, DWORD* answered) {
+    const HANDLE handles[] = {overlapped->hEvent, GetOwnEndEvent()};
+    const DWORD count = handles[1] != nullptr ? 2 : 1;
+    const DWORD result = WaitForMultipleObjects(count, handles, FALSE, INFINITE);
+    if (result == WAIT_OBJECT_0 + 1) CancelIoEx(device, overlapped);
+    return GetOverlappedResult(device, overlapped, answered, TRUE) != FALSE;
+}
+
 /// The handle was opened for overlapped requests, so that this one needs a record and an event as
 /// well.
 bool ControlRealDevice(HANDLE device, const ControlRequest& request, std::uint32_t* bytes) {
@@ -54,7 +68,7 @@ bool ControlRealDevice(HANDLE device, const ControlRequest& request, std::uint32
     DWORD answered = 0;
     const bool isSent =
         SendRequest(device, request, &overlapped) || GetLastError() == ERROR_IO_PENDING;
-    const bool isDone = isSent && GetOverlappedResult(device, &overlapped, &answered, TRUE);
+    const bool isDone = isSent && FinishRealRequest(device, &overlapped, &answered);
     const DWORD error = GetLastError();
     CloseHandle(overlapped.hEvent);
     if (bytes != nullptr) *bytes = answered;
@@ -64,14 +78,14 @@ bool ControlRealDevice(HANDLE device, const ControlRequest& request, std::uint32
 
 ControlOutcome ControlRealDeviceOverlapped(HANDLE device, const ControlRequest& request,
                                            PlatformOverlapped* overlapped) {
-    if (IsOverlappedPending(overlapped)) {
+    if (overlapped->isUnderWay.load()) {
         SetLastError(ERROR_BUSY);
         return ControlOutcome::Failed;
     }
     ResetEvent(overlapped->event);
     overlapped->system = OVERLAPPED{};
     overlapped->system.hEvent = overlapped->event;
-    overlapped->isLastReal = true;
+    overlapped->isLastReal.store(true);
     const bool isDone = SendRequest(device, request, &overlapped->system);
     overlapped->error = isDone ? ERROR_SUCCESS : GetLastError();
     const bool isPended = overlapped->error == ERROR_IO_PENDING;
@@ -81,7 +95,7 @@ ControlOutcome ControlRealDeviceOverlapped(HANDLE device, const ControlRequest& 
 }
 
 /// The end of the thread stands first, so that it wins over a request that is done.
-CompletionOutcome WaitForRealRequest(PlatformOverlapped* overlapped, std::uint64_t timeoutMs) {
+CompletionOutcome WaitForRealEvent(PlatformOverlapped* overlapped, std::uint64_t timeoutMs) {
     HANDLE handles[2];
     DWORD count = 0;
     if (HANDLE endEvent = GetOwnEndEvent(); endEvent != nullptr) handles[count++] = endEvent;
@@ -90,6 +104,18 @@ CompletionOutcome WaitForRealRequest(PlatformOverlapped* overlapped, std::uint64
     if (result == WAIT_TIMEOUT) return CompletionOutcome::TimedOut;
     if (result == WAIT_OBJECT_0 + count - 1) return CompletionOutcome::Completed;
     return result == WAIT_OBJECT_0 ? CompletionOutcome::Ended : CompletionOutcome::Failed;
+}
+
+/// An event that came before its record was written is not this request's.
+CompletionOutcome WaitForRealRequest(PlatformOverlapped* overlapped, std::uint64_t timeoutMs) {
+    for (;;) {
+        const CompletionOutcome outcome = WaitForRealEvent(overlapped, timeoutMs);
+        if (outcome != CompletionOutcome::Completed) return outcome;
+        if (HasOverlappedIoCompleted(&overlapped->system)) return outcome;
+        ResetEvent(overlapped->event);
+        // The request's own event may have come in between; its record was written before.
+        if (HasOverlappedIoCompleted(&overlapped->system)) return outcome;
+    }
 }
 
 bool IsOwnEndRequested() {
@@ -150,15 +176,17 @@ bool ControlDevice(PlatformDevice* device, const ControlRequest& request, std::u
 ControlOutcome ControlDeviceOverlapped(PlatformDevice* device, const ControlRequest& request,
                                        PlatformOverlapped* overlapped) {
     if (device->isReal) return ControlRealDeviceOverlapped(device->handle, request, overlapped);
-    overlapped->isLastReal = false;
+    overlapped->isLastReal.store(false);
     return ControlDriverDeviceOverlapped(device->simulated, request, &overlapped->simulated);
 }
 
 CompletionOutcome WaitForCompletion(PlatformDevice* device, PlatformOverlapped* overlapped,
                                     std::uint64_t timeoutMs) {
-    if (!overlapped->isLastReal) return WaitForDriverRequest(&overlapped->simulated, timeoutMs);
+    if (!overlapped->isLastReal.load()) {
+        return WaitForDriverRequest(&overlapped->simulated, timeoutMs);
+    }
     if (IsOwnEndRequested()) return CompletionOutcome::Ended;
-    if (IsOverlappedPending(overlapped)) {
+    if (overlapped->isUnderWay.load()) {
         const CompletionOutcome outcome = WaitForRealRequest(overlapped, timeoutMs);
         if (outcome != CompletionOutcome::Completed) return outcome;
     }
@@ -166,7 +194,8 @@ CompletionOutcome WaitForCompletion(PlatformDevice* device, PlatformOverlapped* 
 }
 
 void ClearOverlapped(PlatformOverlapped* overlapped) {
-    ResetEvent(overlapped->event);
+    // The event of a request under way is still to be seen.
+    if (!overlapped->isUnderWay.load()) ResetEvent(overlapped->event);
 }
 
 void CancelOverlapped(PlatformDevice* device, PlatformOverlapped* overlapped) {
@@ -178,7 +207,7 @@ void CancelOverlapped(PlatformDevice* device, PlatformOverlapped* overlapped) {
 }
 
 bool IsOverlappedPending(const PlatformOverlapped* overlapped) {
-    if (!overlapped->isLastReal) return IsDriverRequestPending(overlapped->simulated);
+    if (!overlapped->isLastReal.load()) return IsDriverRequestPending(overlapped->simulated);
     return overlapped->isUnderWay.load() && !HasOverlappedIoCompleted(&overlapped->system);
 }
 

@@ -6,18 +6,13 @@
 #include "hal/platform/wait_outcome.h"
 
 namespace ZV {
-namespace {
 
-/// The next value up would be a wait without limit.
-constexpr std::uint64_t SliceMsMax = INFINITE - 1;
-
-}  // namespace
-
-DWORD WaitForHandles(DWORD count, const HANDLE* handles, std::uint64_t timeoutMs) {
+DWORD WaitForHandles(DWORD count, const HANDLE* handles, std::uint64_t timeoutMs,
+                     std::uint64_t sliceMsMax) {
     if (timeoutMs == WaitForEver) return WaitForMultipleObjects(count, handles, FALSE, INFINITE);
     std::uint64_t remainingMs = GetRealWaitMs(timeoutMs);
     for (;;) {
-        const std::uint64_t sliceMs = std::min(remainingMs, SliceMsMax);
+        const std::uint64_t sliceMs = std::min(remainingMs, sliceMsMax);
         const DWORD result =
             WaitForMultipleObjects(count, handles, FALSE, static_cast<DWORD>(sliceMs));
         remainingMs -= sliceMs;

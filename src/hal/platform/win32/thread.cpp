@@ -65,7 +65,13 @@ HANDLE StartSuspended(PlatformThread* thread) {
 }
 
 bool KillThread(PlatformThread* thread) {
-    if (!TerminateThread(thread->handle, 0)) return false;
+    const auto lock = thread->end.LockUnlessHeld();
+    if (!lock) {
+        SetLastError(ERROR_BUSY);
+        return false;
+    }
+    // Refused where the thread has just returned by itself.
+    (void)TerminateThread(thread->handle, 0);
     if (WaitForSingleObject(thread->handle, GraceMs) != WAIT_OBJECT_0) return false;
     ReleaseThreadsShare(thread);
     return true;

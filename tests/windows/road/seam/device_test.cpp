@@ -2,15 +2,19 @@
 
 #include "hal/platform/device.h"
 
+#include <windows.h>
+
 #include <cstdint>
 #include <cstring>
-#include <thread>
 #include <vector>
 
 #include "hal/control_records.h"
 #include "hal/platform/device_discovery.h"
 #include "hal/platform/last_error.h"
-#include "hal/platform/limited_wait.h"
+#include "hal/platform/thread.h"
+#include "hal/platform/wait_outcome.h"
+#include "hal/platform/win32/handle_wait.h"
+#include "support/test_thread.h"
 #include "support/wait_until.h"
 #include "windows/road/road.h"
 
@@ -18,6 +22,7 @@ namespace ZV::Test {
 namespace {
 
 constexpr std::uint32_t IdentityAddress = 0xE0010038;
+constexpr std::uint32_t DirectoryAddress = 0xD0000000;
 constexpr std::uint64_t ShortMs = 20;
 constexpr std::uint64_t LongMs = 60000;
 
@@ -68,6 +73,97 @@ TEST_F(SeamDevice, APendedRequestIsWaitedFor) {
     EXPECT_FALSE(IsOverlappedPending(overlapped));
     EXPECT_EQ(CompletionOutcome::Completed, WaitForCompletion(device, overlapped, LongMs))
         << "a wait without a new request";
+}
+
+TEST_F(SeamDevice, ManyRequestsOfOneRecordEachEndWithTheirOwnAnswer) {
+    constexpr int Rounds = 500;
+    const std::uint32_t addresses[] = {IdentityAddress, DirectoryAddress};
+    const std::uint32_t values[] = {Peek(IdentityAddress), Peek(DirectoryAddress)};
+    ASSERT_NE(values[0], values[1]);
+
+    for (int i = 0; i < Rounds; ++i) {
+        record.offsetLow = addresses[i % 2];
+        data = 0xA5A5A5A5;
+        ASSERT_EQ(ControlOutcome::Pending, SendRead()) << i;
+        ASSERT_EQ(CompletionOutcome::Completed, WaitForCompletion(device, overlapped, LongMs)) << i;
+        ASSERT_EQ(values[i % 2], __builtin_bswap32(data)) << i;
+    }
+}
+
+TEST_F(SeamDevice, ARecordIsInUseUntilTheEndOfItsRequestHasBeenWaitedFor) {
+    ASSERT_EQ(ControlOutcome::Pending, SendRead());
+    ASSERT_TRUE(WaitUntil([&] { return !IsOverlappedPending(overlapped); }));
+
+    EXPECT_EQ(ControlOutcome::Failed, SendRead());
+    EXPECT_EQ(PlatformErrorBusy, GetLastPlatformError());
+    ClearOverlapped(overlapped);
+
+    EXPECT_EQ(CompletionOutcome::Completed, WaitForCompletion(device, overlapped, LongMs));
+    EXPECT_EQ(ControlOutcome::Pending, SendRead());
+    EXPECT_EQ(CompletionOutcome::Completed, WaitForCompletion(device, overlapped, LongMs));
+}
+
+TEST_F(SeamDevice, AThreadThatIsToEndGetsItsWaitBackAndTheRequestStaysUnderWay) {
+    MakeReadsHang();
+    ASSERT_EQ(ControlOutcome::Pending, SendRead());
+    CompletionOutcome outcome = CompletionOutcome::Failed;
+    const TestThread waiter([&] { outcome = WaitForCompletion(device, overlapped, WaitForEver); });
+
+    EXPECT_TRUE(EndThread(waiter.Get()));
+
+    EXPECT_EQ(CompletionOutcome::Ended, outcome);
+    EXPECT_TRUE(IsOverlappedPending(overlapped));
+    CancelOverlapped(device, overlapped);
+    EXPECT_EQ(CompletionOutcome::Failed, WaitForCompletion(device, overlapped, LongMs));
+}
+
+TEST_F(SeamDevice, TheEndOfAThreadWinsOverARequestThatIsDone) {
+    ASSERT_EQ(ControlOutcome::Pending, SendRead());
+    ASSERT_TRUE(WaitUntil([&] { return !IsOverlappedPending(overlapped); }));
+    CompletionOutcome outcome = CompletionOutcome::Failed;
+    const TestThread waiter([&] {
+        WaitForSingleObject(GetOwnEndEvent(), INFINITE);
+        outcome = WaitForCompletion(device, overlapped, WaitForEver);
+    });
+
+    EXPECT_TRUE(EndThread(waiter.Get()));
+
+    EXPECT_EQ(CompletionOutcome::Ended, outcome);
+    EXPECT_EQ(CompletionOutcome::Completed, WaitForCompletion(device, overlapped, LongMs))
+        << "by another thread";
+}
+
+TEST_F(SeamDevice, ASynchronousRequestThatTheDriverKeepsIsTakenBackFromIt) {
+    ASSERT_TRUE(AddFault(R"({"kind": "neverComplete", "code": "FW_IOCTL_STREAM_LEAVE"})"));
+    std::uint32_t word = 0;
+    std::uint32_t error = 0;
+    bool hasReturned = false;
+    const TestThread caller([&] {
+        const ControlRequest request{FW_IOCTL_STREAM_LEAVE, &word, sizeof word, &word, sizeof word};
+        EXPECT_FALSE(ControlDevice(device, request, nullptr));
+        error = GetLastPlatformError();
+        hasReturned = true;
+    });
+    EXPECT_TRUE(WaitUntil([&] { return GetDriver().GetState().pended == 1; }));
+
+    EXPECT_TRUE(EndThread(caller.Get()));
+
+    EXPECT_TRUE(hasReturned);
+    EXPECT_EQ(PlatformErrorOperationAborted, error);
+    EXPECT_TRUE(WaitUntil([&] { return GetState().pendedRequests == 0; }));
+}
+
+TEST_F(SeamDevice, ASynchronousRequestThatFailsCarriesTheDriversNumber) {
+    RoadPrepared prepared{0, FW_IOCTL_QUERY_BUSY, PlatformErrorBusy, 0, {}};
+    ASSERT_TRUE(GetDriver().PrepareAnswer(prepared));
+    std::uint32_t answer = 0;
+    const ControlRequest request{FW_IOCTL_QUERY_BUSY, &answer, sizeof answer, &answer,
+                                 sizeof answer};
+
+    EXPECT_FALSE(ControlDevice(device, request, nullptr));
+    EXPECT_EQ(PlatformErrorBusy, GetLastPlatformError());
+
+    EXPECT_TRUE(ControlDevice(device, request, nullptr));
 }
 
 TEST_F(SeamDevice, ARequestThatIsAnsweredAtOnceIsDone) {
