@@ -79,8 +79,8 @@ ZENTARA_API HALStatus HAL_CameraGetList(HALCamera** list, std::uint32_t primaryI
                                         std::uint32_t* count);
 ZENTARA_API HALStatus HAL_MemoryFree(void* memory);
 ZENTARA_API HALStatus HAL_AdapterOpen(std::uint32_t, void*);
-/// Text of the calling thread's last platform error; `status` plays no part. The text stays good
-/// until the thread's next call.
+/// Text of the calling thread's last platform error, empty if the system has none; `status` plays
+/// no part. It stays good until the thread's next call, and is cut at 2047 bytes.
 ZENTARA_API const char* HAL_ErrorMessage(HALStatus status);
 
 // Connection.

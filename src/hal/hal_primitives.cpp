@@ -26,7 +26,7 @@ struct HALCondition {
 
 namespace {
 
-constexpr std::size_t ErrorTextBytes = 512;
+constexpr std::size_t ErrorTextBytes = 2048;
 constexpr std::uint64_t MicrosecondsPerMillisecond = 1000;
 
 struct StartBlock {
@@ -84,9 +84,11 @@ HALStatus HAL_AdapterOpen(std::uint32_t, void*) {
 
 const char* HAL_ErrorMessage(HALStatus) {
     // Kept: the text is that of the thread's last platform error, whatever status a caller hands
-    // in.
+    // in. The error is read before anything else, since a thread's first touch of the text may
+    // allocate.
+    const std::uint32_t error = GetLastPlatformError();
     static thread_local char text[ErrorTextBytes];
-    return GetPlatformErrorText(GetLastPlatformError(), text, sizeof text) ? text : "";
+    return GetPlatformErrorText(error, text, sizeof text) ? text : "";
 }
 
 HALStatus HAL_ThreadCreate(HALThreadEntry entry, void* argument, HALThread** thread) {

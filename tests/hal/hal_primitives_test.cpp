@@ -47,6 +47,22 @@ TEST(HALErrorMessage, IsEmptyWithoutATextForTheLastError) {
     SetLastPlatformError(0xFFFFFFFE);
 
     EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "");
+    EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "") << "the question has an error of its own";
+}
+
+TEST(HALErrorMessage, IsTheTextOfTheLastErrorAlsoWhereAThreadAsksForTheFirstTime) {
+    SetLastPlatformError(PlatformErrorAccessDenied);
+    const std::string expected = HAL_ErrorMessage(HALOk);
+    std::string text;
+
+    {
+        const TestThread other([&] {
+            SetLastPlatformError(PlatformErrorAccessDenied);
+            text = HAL_ErrorMessage(HALOk);
+        });
+    }
+
+    EXPECT_EQ(text, expected);
 }
 
 TEST(HALErrorMessage, StaysGoodWhileOtherThreadsAsk) {
