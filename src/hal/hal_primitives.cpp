@@ -48,7 +48,9 @@ void RunStartBlock(void* argument) {
     delete start;
 }
 
+/// Null when the thread cannot be made, and for an entry that is none.
 PlatformThread* StartEntry(HALThreadEntry entry, void* argument) {
+    if (entry == nullptr) return nullptr;
     auto* start = new (std::nothrow) StartBlock{entry, argument};
     if (start == nullptr) return nullptr;
     PlatformThread* handle = StartThread(RunStartBlock, start);
@@ -92,6 +94,7 @@ const char* HAL_ErrorMessage(HALStatus) {
 }
 
 HALStatus HAL_ThreadCreate(HALThreadEntry entry, void* argument, HALThread** thread) {
+    if (thread == nullptr) return HALOk;
     // Kept: a thread that could not be made is reported as made; its record holds no handle.
     *thread = new (std::nothrow) HALThread{0, nullptr};
     if (*thread == nullptr) return HALOk;
@@ -121,6 +124,7 @@ HALStatus HAL_ThreadTerminate(HALThread* thread) {
 }
 
 HALStatus HAL_SemaphoreCreate(HALSemaphore** semaphore) {
+    if (semaphore == nullptr) return HALOk;
     *semaphore = new (std::nothrow) HALSemaphore{MakeSemaphore()};
     return HALOk;
 }
@@ -138,6 +142,7 @@ HALStatus HAL_SemaphoreSignal(HALSemaphore* semaphore) {
 }
 
 HALStatus HAL_SemaphoreDestroy(HALSemaphore** semaphore) {
+    if (semaphore == nullptr) return HALOk;
     if (*semaphore != nullptr) DestroySemaphore((*semaphore)->handle);
     delete *semaphore;
     *semaphore = nullptr;
@@ -145,6 +150,7 @@ HALStatus HAL_SemaphoreDestroy(HALSemaphore** semaphore) {
 }
 
 HALStatus HAL_ConditionCreate(HALCondition** condition) {
+    if (condition == nullptr) return HALOk;
     *condition = new (std::nothrow) HALCondition{MakeEvent(EventReset::Automatic)};
     return HALOk;
 }
@@ -172,6 +178,7 @@ HALStatus HAL_ConditionSignal(HALCondition* condition) {
 }
 
 HALStatus HAL_ConditionDestroy(HALCondition** condition) {
+    if (condition == nullptr) return HALOk;
     if (*condition != nullptr && !DestroyEvent((*condition)->handle)) return HALConditionFailed;
     delete *condition;
     *condition = nullptr;

@@ -157,6 +157,23 @@ TEST_F(HALThreadTest, EndsQuietlyWhenTheStandardLibraryThrows) {
     EXPECT_EQ(HAL_ThreadCleanup(thread, 5000), HALOk);
 }
 
+TEST_F(HALThreadTest, CannotBeMadeWithoutAnEntryAndIsReportedAsMade) {
+    EXPECT_EQ(HAL_ThreadCreate(nullptr, this, &thread), HALOk);
+
+    ASSERT_NE(thread, nullptr);
+    EXPECT_FALSE(IsHALThreadStarted(thread));
+    EXPECT_EQ(HAL_ThreadCleanup(thread, 5000), HALOk);
+}
+
+TEST_F(HALThreadTest, IsNotStartedWithoutAPlaceForItsRecord) {
+    (void)HAL_ConditionSignal(gate);
+
+    EXPECT_EQ(HAL_ThreadCreate(Run, this, nullptr), HALOk);
+
+    EXPECT_EQ(HAL_ConditionTimedWait(gate, 0), HALOk) << "nobody has taken the signal";
+    EXPECT_FALSE(hasReturned.load());
+}
+
 TEST(HALThreadRecord, CountsAsEndedWithoutAThread) {
     EXPECT_FALSE(IsHALThreadStarted(nullptr));
     EXPECT_EQ(HAL_ThreadCleanup(nullptr, 5000), HALOk);
@@ -211,6 +228,11 @@ TEST(HALSemaphoreRecord, IsNulledByItsEndAndThenFailsToBeWaitedFor) {
     EXPECT_EQ(HAL_SemaphoreWait(semaphore), HALSemaphoreFailed);
     EXPECT_EQ(HAL_SemaphoreSignal(semaphore), HALOk);
     EXPECT_EQ(HAL_SemaphoreDestroy(&semaphore), HALOk);
+}
+
+TEST(HALSemaphoreRecord, IsNeitherMadeNorEndedWithoutAPlaceForIt) {
+    EXPECT_EQ(HAL_SemaphoreCreate(nullptr), HALOk);
+    EXPECT_EQ(HAL_SemaphoreDestroy(nullptr), HALOk);
 }
 
 class HALConditionTest : public testing::Test {
@@ -306,6 +328,11 @@ TEST(HALConditionRecord, IsNulledByItsEndAndThenFails) {
     EXPECT_EQ(HAL_ConditionSignal(condition), HALConditionFailed);
     EXPECT_EQ(HAL_ConditionReset(condition), HALOk);
     EXPECT_EQ(HAL_ConditionDestroy(&condition), HALOk);
+}
+
+TEST(HALConditionRecord, IsNeitherMadeNorEndedWithoutAPlaceForIt) {
+    EXPECT_EQ(HAL_ConditionCreate(nullptr), HALOk);
+    EXPECT_EQ(HAL_ConditionDestroy(nullptr), HALOk);
 }
 
 }  // namespace
