@@ -80,6 +80,9 @@ TEST(HALErrorMessage, StaysGoodWhileOtherThreadsAsk) {
     EXPECT_EQ(text, before);
 }
 
+/// A limit that would be 0 in 32 bits.
+constexpr std::uint64_t JustBeyond32BitsMs = 0x1'0000'0000;
+
 /// A HAL thread that runs until its gate opens.
 class HALThreadTest : public testing::Test {
   protected:
@@ -120,6 +123,21 @@ TEST_F(HALThreadTest, IsLetGoAfterTheLimitAlthoughItStillRuns) {
     EXPECT_FALSE(hasReturned.load());
     (void)HAL_ConditionSignal(gate);
     EXPECT_TRUE(WaitUntil([this] { return hasReturned.load(); }));
+}
+
+TEST_F(HALThreadTest, IsWaitedForWithALimitBeyond32BitsOfMilliseconds) {
+    (void)HAL_ThreadCreate(Run, this, &thread);
+    std::atomic<bool> hadReturned{false};
+    TestThread waiter([&] {
+        waiter.AnnounceWait();
+        (void)HAL_ThreadCleanup(thread, JustBeyond32BitsMs);
+        hadReturned.store(hasReturned.load());
+    });
+
+    ASSERT_TRUE(waiter.WaitUntilAsleep());
+    (void)HAL_ConditionSignal(gate);
+
+    EXPECT_TRUE(WaitUntil([&] { return hadReturned.load(); }));
 }
 
 TEST_F(HALThreadTest, IsTerminatedWhenItHasEnded) {
@@ -274,7 +292,7 @@ TEST_F(HALConditionTest, WaitsForALimitBeyond32BitsOfMilliseconds) {
     std::atomic<bool> isReleased{false};
     TestThread waiter([&] {
         waiter.AnnounceWait();
-        isReleased.store(HAL_ConditionTimedWait(condition, 5'000'000'000'000) == HALOk);
+        isReleased.store(HAL_ConditionTimedWait(condition, JustBeyond32BitsMs * 1000) == HALOk);
     });
 
     ASSERT_TRUE(waiter.WaitUntilAsleep());
