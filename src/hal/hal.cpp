@@ -5,7 +5,8 @@
 #include "hal/io_trace.h"
 
 // Bus operations dispatch on the record's kind. Only connect, disconnect and reallocate get the
-// caller's own record; all others get a copy, so that they cannot change it.
+// caller's own record; all others get a copy, so that they cannot change it. A release takes from
+// the caller's record, after that, the context that its back end has freed.
 
 namespace ZV {
 namespace {

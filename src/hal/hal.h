@@ -79,8 +79,8 @@ ZENTARA_API HALStatus HAL_CameraGetList(HALCamera** list, std::uint32_t primaryI
                                         std::uint32_t* count);
 ZENTARA_API HALStatus HAL_MemoryFree(void* memory);
 ZENTARA_API HALStatus HAL_AdapterOpen(std::uint32_t, void*);
-/// Text of the calling thread's last platform error; `status` plays no part. The text stays good
-/// until the thread's next call.
+/// Text of the calling thread's last platform error, empty if the system has none; `status` plays
+/// no part. It stays good until the thread's next call, and is cut at 2047 bytes.
 ZENTARA_API const char* HAL_ErrorMessage(HALStatus status);
 
 // Connection.
@@ -115,7 +115,10 @@ ZENTARA_API HALStatus HAL_CameraStopStreaming(HALCamera* camera, std::uint32_t s
 ZENTARA_API HALStatus HAL_CameraWaitingForFrame(HALCamera* camera);
 ZENTARA_API HALStatus HAL_CameraStopWaitingForFrame(HALCamera* camera);
 
-// Threads.
+// Primitives. Each takes null for a record. A create or destroy function with null for the place of
+// one does nothing and answers 0.
+
+// Threads. One with a null entry counts as one that could not be made.
 ZENTARA_API HALStatus HAL_ThreadCreate(HALThreadEntry entry, void* argument, HALThread** thread);
 ZENTARA_API HALStatus HAL_ThreadCleanup(HALThread* thread, std::uint64_t timeoutMs);
 ZENTARA_API HALStatus HAL_ThreadTerminate(HALThread* thread);
@@ -142,11 +145,10 @@ ZENTARA_API HALStatus FWCameraReallocateBandwidth(HALCamera* camera, std::uint16
 
 }  // extern "C"
 
-/// Ends a HAL thread's wait record check: true when HAL_ThreadCreate could start its thread. A
-/// thread that could not be made counts as ended.
+/// True when HAL_ThreadCreate could start the thread, which it does not tell. One that could not be
+/// made counts as ended.
 bool IsHALThreadStarted(const HALThread* thread);
-/// False for one that could not be made, which HAL_SemaphoreCreate and HAL_ConditionCreate do not
-/// tell.
+/// False for one that could not be made, which its create function does not tell either.
 bool IsHALSemaphoreMade(const HALSemaphore* semaphore);
 bool IsHALConditionMade(const HALCondition* condition);
 

@@ -26,7 +26,7 @@ struct HALCondition {
 
 namespace {
 
-constexpr std::size_t ErrorTextBytes = 512;
+constexpr std::size_t ErrorTextBytes = 2048;
 constexpr std::uint64_t MicrosecondsPerMillisecond = 1000;
 
 struct StartBlock {
@@ -48,7 +48,9 @@ void RunStartBlock(void* argument) {
     delete start;
 }
 
+/// Null when the thread cannot be made, and for an entry that is none.
 PlatformThread* StartEntry(HALThreadEntry entry, void* argument) {
+    if (entry == nullptr) return nullptr;
     auto* start = new (std::nothrow) StartBlock{entry, argument};
     if (start == nullptr) return nullptr;
     PlatformThread* handle = StartThread(RunStartBlock, start);
@@ -84,12 +86,15 @@ HALStatus HAL_AdapterOpen(std::uint32_t, void*) {
 
 const char* HAL_ErrorMessage(HALStatus) {
     // Kept: the text is that of the thread's last platform error, whatever status a caller hands
-    // in.
+    // in. The error is read before anything else, since a thread's first touch of the text may
+    // allocate.
+    const std::uint32_t error = GetLastPlatformError();
     static thread_local char text[ErrorTextBytes];
-    return GetPlatformErrorText(GetLastPlatformError(), text, sizeof text) ? text : "";
+    return GetPlatformErrorText(error, text, sizeof text) ? text : "";
 }
 
 HALStatus HAL_ThreadCreate(HALThreadEntry entry, void* argument, HALThread** thread) {
+    if (thread == nullptr) return HALOk;
     // Kept: a thread that could not be made is reported as made; its record holds no handle.
     *thread = new (std::nothrow) HALThread{0, nullptr};
     if (*thread == nullptr) return HALOk;
@@ -119,6 +124,7 @@ HALStatus HAL_ThreadTerminate(HALThread* thread) {
 }
 
 HALStatus HAL_SemaphoreCreate(HALSemaphore** semaphore) {
+    if (semaphore == nullptr) return HALOk;
     *semaphore = new (std::nothrow) HALSemaphore{MakeSemaphore()};
     return HALOk;
 }
@@ -136,6 +142,7 @@ HALStatus HAL_SemaphoreSignal(HALSemaphore* semaphore) {
 }
 
 HALStatus HAL_SemaphoreDestroy(HALSemaphore** semaphore) {
+    if (semaphore == nullptr) return HALOk;
     if (*semaphore != nullptr) DestroySemaphore((*semaphore)->handle);
     delete *semaphore;
     *semaphore = nullptr;
@@ -143,6 +150,7 @@ HALStatus HAL_SemaphoreDestroy(HALSemaphore** semaphore) {
 }
 
 HALStatus HAL_ConditionCreate(HALCondition** condition) {
+    if (condition == nullptr) return HALOk;
     *condition = new (std::nothrow) HALCondition{MakeEvent(EventReset::Automatic)};
     return HALOk;
 }
@@ -170,6 +178,7 @@ HALStatus HAL_ConditionSignal(HALCondition* condition) {
 }
 
 HALStatus HAL_ConditionDestroy(HALCondition** condition) {
+    if (condition == nullptr) return HALOk;
     if (*condition != nullptr && !DestroyEvent((*condition)->handle)) return HALConditionFailed;
     delete *condition;
     *condition = nullptr;

@@ -6,10 +6,11 @@
 #include "hal/platform/shared_memory.h"
 
 /// The system-wide table of the cameras open at the moment: a named shared memory block of 63
-/// entries. All processes of the machine read and write it without a lock; an entry changes as a
+/// entries. All processes that see the name read and write it without a lock; an entry changes as a
 /// whole.
 namespace ZV {
 
+// Kept: the name has no prefix that makes it global, so that on Windows each session has a table.
 inline constexpr char OpenCameraTableName[] = "404B602C-4181-4d11-A184-AB30190B8DCD";
 inline constexpr std::size_t OpenCameraTableEntries = 63;
 inline constexpr std::size_t OpenCameraTableBytes = 504;

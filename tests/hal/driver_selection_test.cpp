@@ -81,28 +81,6 @@ TEST(SystemVersions, OnlySixPointZeroOfTheNTFamilyIsVistaExactly) {
     EXPECT_FALSE(IsVistaExactly(SystemVersion{1, 6, 0}));
 }
 
-#if !defined(_WIN32)
-
-TEST(DriverMaintenance, ThereIsNoDriverAndNoElevationOnThisSystem) {
-    bool isElevated = true;
-    std::uint32_t count = 3;
-    char* ids[4] = {};
-    const std::uint8_t classId[16] = {};
-
-    EXPECT_FALSE(IsVistaExactly());
-    EXPECT_FALSE(IsNotElevated(&isElevated));
-    EXPECT_TRUE(isElevated);
-    EXPECT_FALSE(IsNotElevated(nullptr));
-    EXPECT_EQ(HALListingFailed, ListAdapterIds(&count, ids));
-    EXPECT_EQ(HALListingFailed, ListClassDeviceIds(classId, &count, ids));
-    EXPECT_EQ(3u, count);
-    EXPECT_EQ(0u, InstallDriverOnDevice("id", "path"));
-    EXPECT_EQ(0u, InstallDriverOnDeviceForOS("id", "path"));
-    EXPECT_EQ(IsProcessAdministrator(), IsAdministrator());
-}
-
-#endif
-
 TEST(DriverMaintenance, NullArgumentsAreRefused) {
     std::uint32_t count = 0;
     char* ids[1] = {};

@@ -47,6 +47,22 @@ TEST(HALErrorMessage, IsEmptyWithoutATextForTheLastError) {
     SetLastPlatformError(0xFFFFFFFE);
 
     EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "");
+    EXPECT_STREQ(HAL_ErrorMessage(HALReadFailed), "") << "the question has an error of its own";
+}
+
+TEST(HALErrorMessage, IsTheTextOfTheLastErrorAlsoWhereAThreadAsksForTheFirstTime) {
+    SetLastPlatformError(PlatformErrorAccessDenied);
+    const std::string expected = HAL_ErrorMessage(HALOk);
+    std::string text;
+
+    {
+        const TestThread other([&] {
+            SetLastPlatformError(PlatformErrorAccessDenied);
+            text = HAL_ErrorMessage(HALOk);
+        });
+    }
+
+    EXPECT_EQ(text, expected);
 }
 
 TEST(HALErrorMessage, StaysGoodWhileOtherThreadsAsk) {
@@ -63,6 +79,9 @@ TEST(HALErrorMessage, StaysGoodWhileOtherThreadsAsk) {
 
     EXPECT_EQ(text, before);
 }
+
+/// A limit that would be 0 in 32 bits.
+constexpr std::uint64_t JustBeyond32BitsMs = 0x1'0000'0000;
 
 /// A HAL thread that runs until its gate opens.
 class HALThreadTest : public testing::Test {
@@ -106,6 +125,21 @@ TEST_F(HALThreadTest, IsLetGoAfterTheLimitAlthoughItStillRuns) {
     EXPECT_TRUE(WaitUntil([this] { return hasReturned.load(); }));
 }
 
+TEST_F(HALThreadTest, IsWaitedForWithALimitBeyond32BitsOfMilliseconds) {
+    (void)HAL_ThreadCreate(Run, this, &thread);
+    std::atomic<bool> hadReturned{false};
+    TestThread waiter([&] {
+        waiter.AnnounceWait();
+        (void)HAL_ThreadCleanup(thread, JustBeyond32BitsMs);
+        hadReturned.store(hasReturned.load());
+    });
+
+    ASSERT_TRUE(waiter.WaitUntilAsleep());
+    (void)HAL_ConditionSignal(gate);
+
+    EXPECT_TRUE(WaitUntil([&] { return hadReturned.load(); }));
+}
+
 TEST_F(HALThreadTest, IsTerminatedWhenItHasEnded) {
     (void)HAL_ThreadCreate(Run, this, &thread);
     (void)HAL_ConditionSignal(gate);
@@ -139,6 +173,23 @@ TEST_F(HALThreadTest, EndsQuietlyWhenTheStandardLibraryThrows) {
     (void)HAL_ThreadCreate(entry, nullptr, &thread);
 
     EXPECT_EQ(HAL_ThreadCleanup(thread, 5000), HALOk);
+}
+
+TEST_F(HALThreadTest, CannotBeMadeWithoutAnEntryAndIsReportedAsMade) {
+    EXPECT_EQ(HAL_ThreadCreate(nullptr, this, &thread), HALOk);
+
+    ASSERT_NE(thread, nullptr);
+    EXPECT_FALSE(IsHALThreadStarted(thread));
+    EXPECT_EQ(HAL_ThreadCleanup(thread, 5000), HALOk);
+}
+
+TEST_F(HALThreadTest, IsNotStartedWithoutAPlaceForItsRecord) {
+    (void)HAL_ConditionSignal(gate);
+
+    EXPECT_EQ(HAL_ThreadCreate(Run, this, nullptr), HALOk);
+
+    EXPECT_EQ(HAL_ConditionTimedWait(gate, 0), HALOk) << "nobody has taken the signal";
+    EXPECT_FALSE(hasReturned.load());
 }
 
 TEST(HALThreadRecord, CountsAsEndedWithoutAThread) {
@@ -197,6 +248,11 @@ TEST(HALSemaphoreRecord, IsNulledByItsEndAndThenFailsToBeWaitedFor) {
     EXPECT_EQ(HAL_SemaphoreDestroy(&semaphore), HALOk);
 }
 
+TEST(HALSemaphoreRecord, IsNeitherMadeNorEndedWithoutAPlaceForIt) {
+    EXPECT_EQ(HAL_SemaphoreCreate(nullptr), HALOk);
+    EXPECT_EQ(HAL_SemaphoreDestroy(nullptr), HALOk);
+}
+
 class HALConditionTest : public testing::Test {
   protected:
     HALConditionTest() { EXPECT_EQ(HAL_ConditionCreate(&condition), HALOk); }
@@ -236,7 +292,7 @@ TEST_F(HALConditionTest, WaitsForALimitBeyond32BitsOfMilliseconds) {
     std::atomic<bool> isReleased{false};
     TestThread waiter([&] {
         waiter.AnnounceWait();
-        isReleased.store(HAL_ConditionTimedWait(condition, 5'000'000'000'000) == HALOk);
+        isReleased.store(HAL_ConditionTimedWait(condition, JustBeyond32BitsMs * 1000) == HALOk);
     });
 
     ASSERT_TRUE(waiter.WaitUntilAsleep());
@@ -290,6 +346,11 @@ TEST(HALConditionRecord, IsNulledByItsEndAndThenFails) {
     EXPECT_EQ(HAL_ConditionSignal(condition), HALConditionFailed);
     EXPECT_EQ(HAL_ConditionReset(condition), HALOk);
     EXPECT_EQ(HAL_ConditionDestroy(&condition), HALOk);
+}
+
+TEST(HALConditionRecord, IsNeitherMadeNorEndedWithoutAPlaceForIt) {
+    EXPECT_EQ(HAL_ConditionCreate(nullptr), HALOk);
+    EXPECT_EQ(HAL_ConditionDestroy(nullptr), HALOk);
 }
 
 }  // namespace

@@ -2,18 +2,11 @@
 
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <regex>
 
+#include "support/text_file.h"
+
 namespace ZV::Test {
-namespace {
-
-std::string ReadText(const std::filesystem::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
-}
-
-}  // namespace
 
 std::string DescribeLog(std::string_view bytes) {
     std::string text;
@@ -35,7 +28,7 @@ testing::AssertionResult MatchesGolden(std::string_view name, const std::string&
     const auto written = std::filesystem::path(ZENTARA_BINARY_DIR) / "golden" / name;
     std::filesystem::create_directories(written.parent_path());
     std::ofstream(written, std::ios::binary) << text;
-    if (ReadText(golden) == text) return testing::AssertionSuccess();
+    if (ReadTextFile(golden) == text) return testing::AssertionSuccess();
     return testing::AssertionFailure() << "diff " << golden << " " << written << "\n" << text;
 }
 

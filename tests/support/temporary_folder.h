@@ -5,11 +5,12 @@
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <random>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include "support/text_file.h"
 
 namespace ZV::Test {
 
@@ -40,10 +41,7 @@ class TemporaryFolder {
         return GetPath(name);
     }
 
-    std::string ReadFile(std::string_view name) const {
-        std::ifstream file(path / name, std::ios::binary);
-        return {std::istreambuf_iterator<char>(file), {}};
-    }
+    std::string ReadFile(std::string_view name) const { return ReadTextFile(path / name); }
 
     /// Names of the files in it, sorted.
     std::vector<std::string> ListFiles() const {

@@ -9,7 +9,7 @@ namespace ZV {
 struct AppendFile;
 
 /// Opens for appending and makes the file when it is not there. Null when that cannot be done, and
-/// on POSIX for a device or a pipe, which could block. Never waits.
+/// for a device or a pipe, which could block. Never waits.
 AppendFile* OpenAppendFile(const char* path);
 
 /// Appends with one write, so that what several threads or processes append lies there in whole

@@ -8,8 +8,7 @@ namespace ZV {
 /// Windows; elsewhere they answer what is true there: no driver to install, privileges by the
 /// effective user id.
 
-/// System folders: the common program files folder, and the system folder. Empty text when unknown.
-/// `path` has room for 260 bytes.
+/// The system's folder for common program files; an empty text when it is unknown.
 void GetCommonProgramFilesFolder(char path[260]);
 
 /// True when the process token is in the built-in Administrators group (effective user id 0 on

@@ -30,6 +30,7 @@ void SetLastPlatformError(std::uint32_t error);
 
 /// Writes the system's text for `error`, with whatever line end the system gives it, to `text`, cut
 /// to `capacity` - 1 bytes and always terminated. False, and an empty text, if the system has none.
+/// The last error stays as it was or becomes `error`, whatever the answer.
 bool GetPlatformErrorText(std::uint32_t error, char* text, std::size_t capacity);
 
 }  // namespace ZV

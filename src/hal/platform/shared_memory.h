@@ -4,7 +4,8 @@
 
 namespace ZV {
 
-/// A block of memory that all processes of the machine see under one name, zeroed when it is new.
+/// A block of memory that all processes of the machine, on Windows those of one session, see under
+/// one name, zeroed when it is new.
 struct SharedMemory;
 
 /// Opens or makes the block, read-write. Null when the system refuses.

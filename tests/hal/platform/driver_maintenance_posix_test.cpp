@@ -3,6 +3,9 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include "hal/driver_selection.h"
+#include "hal/hal.h"
+
 namespace ZV {
 namespace {
 
@@ -38,6 +41,24 @@ TEST(DriverMaintenance, KnowsNeitherElevationNorAVersionNorAProgramFolder) {
 
 TEST(DriverMaintenance, InstallsNothing) {
     InstallDriver("device", "path.inf", true, false);
+}
+
+TEST(DriverMaintenance, FindsNoDriverAndNoElevationOnThisSystem) {
+    bool isElevated = true;
+    std::uint32_t count = 3;
+    char* ids[4] = {};
+    const std::uint8_t classId[16] = {};
+
+    EXPECT_FALSE(IsVistaExactly());
+    EXPECT_FALSE(IsNotElevated(&isElevated));
+    EXPECT_TRUE(isElevated);
+    EXPECT_FALSE(IsNotElevated(nullptr));
+    EXPECT_EQ(HALListingFailed, ListAdapterIds(&count, ids));
+    EXPECT_EQ(HALListingFailed, ListClassDeviceIds(classId, &count, ids));
+    EXPECT_EQ(3u, count);
+    EXPECT_EQ(0u, InstallDriverOnDevice("id", "path"));
+    EXPECT_EQ(0u, InstallDriverOnDeviceForOS("id", "path"));
+    EXPECT_EQ(IsProcessAdministrator(), IsAdministrator());
 }
 
 }  // namespace

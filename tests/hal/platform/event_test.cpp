@@ -135,6 +135,19 @@ TEST_F(AutomaticEvent, WaitsOutALimitOfMoreYearsThanAClockCounts) {
     EXPECT_TRUE(WaitUntil([&] { return isReleased.load(); }));
 }
 
+TEST_F(AutomaticEvent, WaitsOutALimitThatWouldBeNoneIn32Bits) {
+    std::atomic<bool> isReleased{false};
+    TestThread patient([&] {
+        patient.AnnounceWait();
+        isReleased.store(WaitForEvent(event, 0x1'0000'0000) == WaitOutcome::Signalled);
+    });
+
+    ASSERT_TRUE(patient.WaitUntilAsleep());
+    EXPECT_TRUE(SignalEvent(event));
+
+    EXPECT_TRUE(WaitUntil([&] { return isReleased.load(); }));
+}
+
 TEST_F(ManualEvent, ReleasesEveryWaiterAndStaysSignalled) {
     ASSERT_TRUE(StartTwoWaiters());
 

@@ -73,6 +73,17 @@ TEST(PlatformErrorText, IsEmptyForANumberThatTheSystemDoesNotKnow) {
     EXPECT_STREQ(text, "");
 }
 
+TEST(PlatformErrorText, LeavesTheLastErrorThatItIsAskedFor) {
+    char text[256] = "";
+
+    for (const std::uint32_t error : {PlatformErrorBusy, std::uint32_t{0xFFFFFFFE}}) {
+        SetLastPlatformError(error);
+        (void)GetPlatformErrorText(error, text, sizeof text);
+
+        EXPECT_EQ(GetLastPlatformError(), error);
+    }
+}
+
 TEST(PlatformErrorText, IsCutToItsBufferAndTerminated) {
     char text[6] = {'x', 'x', 'x', 'x', 'x', 'x'};
 

@@ -15,6 +15,7 @@
 #include "windows/diagnostics/debugger_listener.h"
 #include "windows/diagnostics/machine_switches.h"
 #include "windows/support/child_process.h"
+#include "windows/support/named_turn.h"
 
 // The log from end to end: switches in the machine's part of the registry, a client in a process of
 // its own that loads the library, a listener to the debugger output or a file at the end.
@@ -142,6 +143,7 @@ TEST_F(LogOfTheLibrary, TakesAPathOfThousandAndTwentyThreeBytesAtMost) {
 // ---- The driver's mode ----
 
 TEST(DriverMode, OfTheMachineDecidesWhetherASwitchIsDueUnlessItIsMissing) {
+    const NamedTurn turn(OpenCameraTableTurn);
     const MachineSwitches switches;
     ASSERT_FALSE(AnyCameraOpen());
     SetLastCameraFlag(true);

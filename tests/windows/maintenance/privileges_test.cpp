@@ -3,13 +3,18 @@
 
 #include <shlobj.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <string>
+#include <vector>
 
 #include "hal/driver_selection.h"
 #include "hal/hal.h"
 #include "hal/platform/win32/maintenance_functions.h"
+#include "support/temporary_folder.h"
+#include "windows/maintenance/installed_device.h"
 #include "windows/support/child_process.h"
+#include "windows/support/debugger_texts.h"
 
 namespace ZV::Test {
 namespace {
@@ -211,9 +216,47 @@ TEST_F(VersionOfTheSystem, KeptReadsTheNativeSystemInformationWhereThereIsSuchAF
 
 constexpr UINT VistaExitCode = 60;
 constexpr UINT OtherExitCode = 61;
+constexpr UINT NeitherExitCode = 62;
 
 TEST(VersionOfAChild, DISABLED_TellsByItsExitCode) {
     ExitProcess(IsVistaExactly() ? VistaExitCode : OtherExitCode);
+}
+
+/// Which way an installation went, by what it has printed.
+UINT GetExitCodeOf(const std::vector<std::string>& texts) {
+    const auto isPrinted = [&](const char* text) {
+        return std::find(texts.begin(), texts.end(), text) != texts.end();
+    };
+    if (isPrinted("UnInstall on XP")) return OtherExitCode;
+    const bool isNewer = isPrinted("UnInstall on Vista") ||
+                         isPrinted("DiInstallDevice function did not load properly");
+    return isNewer ? VistaExitCode : NeitherExitCode;
+}
+
+const DebuggerTexts* textsOfTheChild;
+
+/// Of the newer function Wine has the name alone: the call of it would end the process.
+LONG CALLBACK EndAtAMissingFunction(EXCEPTION_POINTERS* pointers) {
+    constexpr DWORD CallOfAMissingFunction = 0x80000100;
+    if (pointers->ExceptionRecord->ExceptionCode != CallOfAMissingFunction) {
+        return EXCEPTION_CONTINUE_SEARCH;
+    }
+    ExitProcess(GetExitCodeOf(textsOfTheChild->Take()));
+}
+
+/// Its word is the device and the installation file, with a bar between.
+TEST(InstallationOfAChild, DISABLED_TellsItsWayByItsExitCode) {
+    const std::string word = GetChildWord();
+    const std::size_t bar = word.find('|');
+    ASSERT_NE(bar, std::string::npos);
+    const DebuggerTexts texts;
+    textsOfTheChild = &texts;
+    ASSERT_NE(AddVectoredExceptionHandler(/*First=*/1, EndAtAMissingFunction), nullptr);
+
+    EXPECT_EQ(InstallDriverOnDeviceForOS(word.substr(0, bar).c_str(), word.substr(bar + 1).c_str()),
+              0u);
+
+    ExitProcess(GetExitCodeOf(texts.Take()));
 }
 
 /// A copy of this program under a name of its own, for which Wine plays another system.
@@ -232,9 +275,8 @@ class ProgramOnAnotherSystem {
     ProgramOnAnotherSystem(const ProgramOnAnotherSystem&) = delete;
     ProgramOnAnotherSystem& operator=(const ProgramOnAnotherSystem&) = delete;
 
-    [[nodiscard]] static UINT Run() {
-        const ChildProcess child("VersionOfAChild.DISABLED_TellsByItsExitCode",
-                                 {.program = GetPath()});
+    [[nodiscard]] static UINT Run(const std::string& test, const std::string& word = {}) {
+        const ChildProcess child(test, {.program = GetPath(), .word = word});
         return child.WaitForExitCode();
     }
 
@@ -248,22 +290,42 @@ class ProgramOnAnotherSystem {
     }
 };
 
-TEST(VersionOfAnotherSystem, IsVistaForSixPointZeroAloneAndNotForALaterOne) {
-    if (GetProcAddress(GetModuleHandleA("ntdll.dll"), "wine_get_version") == nullptr) {
-        GTEST_SKIP() << "this system plays no other one";
+constexpr struct {
+    const char* name;
+    UINT exitCode;
+} Systems[] = {
+    {"winxp64", OtherExitCode}, {"vista", VistaExitCode}, {"win2008", VistaExitCode},
+    {"win7", OtherExitCode},    {"win10", OtherExitCode},
+};
+
+class VersionOfAnotherSystem : public testing::Test {
+  protected:
+    void SetUp() override {
+        if (GetProcAddress(GetModuleHandleA("ntdll.dll"), "wine_get_version") == nullptr) {
+            GTEST_SKIP() << "this system plays no other one";
+        }
     }
-    constexpr struct {
-        const char* system;
-        UINT exitCode;
-    } Rows[] = {
-        {"winxp64", OtherExitCode}, {"vista", VistaExitCode}, {"win2008", VistaExitCode},
-        {"win7", OtherExitCode},    {"win10", OtherExitCode},
-    };
+};
 
-    for (const auto& row : Rows) {
-        const ProgramOnAnotherSystem program(row.system);
+TEST_F(VersionOfAnotherSystem, IsVistaForSixPointZeroAloneAndNotForALaterOne) {
+    for (const auto& system : Systems) {
+        const ProgramOnAnotherSystem program(system.name);
 
-        EXPECT_EQ(ProgramOnAnotherSystem::Run(), row.exitCode) << row.system;
+        EXPECT_EQ(ProgramOnAnotherSystem::Run("VersionOfAChild.*"), system.exitCode) << system.name;
+    }
+}
+
+TEST_F(VersionOfAnotherSystem, KeptInstallsAsOnXPOnALaterSystemThanVista) {
+    const TemporaryFolder folder;
+    const InstalledDevice device;
+    const std::string inf = folder.WriteFile("camera.inf", MakeInf("root\\zentara-test"));
+    const std::string word = device.GetInstanceId() + ("|" + inf);
+
+    for (const auto& system : Systems) {
+        const ProgramOnAnotherSystem program(system.name);
+
+        EXPECT_EQ(ProgramOnAnotherSystem::Run("InstallationOfAChild.*", word), system.exitCode)
+            << system.name;
     }
 }
 

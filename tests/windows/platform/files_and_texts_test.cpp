@@ -75,6 +75,21 @@ TEST(AppendedFile, IsNotMadeOfAPathThatIsTooLongOrNoName) {
     EXPECT_EQ(OpenAppendFile("Z:\\no\\such\\folder\\log.txt"), nullptr);
 }
 
+TEST(AppendedFile, IsNeitherADeviceNorAPipe) {
+    const std::string pipe = "\\\\.\\pipe\\zentara-test-" + std::to_string(GetCurrentProcessId());
+    HANDLE server = CreateNamedPipeA(pipe.c_str(), PIPE_ACCESS_DUPLEX, PIPE_TYPE_BYTE,
+                                     /*nMaxInstances=*/1, 0, 0, 0, nullptr);
+    ASSERT_NE(server, INVALID_HANDLE_VALUE);
+    SetLastError(SomeError);
+
+    EXPECT_EQ(OpenAppendFile(pipe.c_str()), nullptr);
+    EXPECT_EQ(OpenAppendFile("NUL"), nullptr);
+    EXPECT_EQ(OpenAppendFile("CONOUT$"), nullptr);
+
+    EXPECT_EQ(GetLastError(), SomeError);
+    CloseHandle(server);
+}
+
 // ---- Texts of errors ----
 
 TEST(SystemErrorText, IsThatOfTheSystemWithItsLineEnd) {

@@ -13,6 +13,7 @@
 #include "hal/hal.h"
 #include "hal/open_camera_table.h"
 #include "windows/support/child_process.h"
+#include "windows/support/named_turn.h"
 
 namespace ZV::Test {
 namespace {
@@ -99,21 +100,6 @@ TEST(NamedMemory, IsOneBlockForTwoProcesses) {
 
 // ---- The table of the open cameras ----
 
-/// Keeps other suites from the table, which is one for the machine.
-class TableHold {
-  public:
-    TableHold() { (void)WaitForSingleObject(mutex, INFINITE); }
-    ~TableHold() {
-        ReleaseMutex(mutex);
-        CloseHandle(mutex);
-    }
-    TableHold(const TableHold&) = delete;
-    TableHold& operator=(const TableHold&) = delete;
-
-  private:
-    HANDLE mutex = CreateMutexA(nullptr, FALSE, "zentara-open-camera-table-of-the-tests");
-};
-
 /// A call from one process to the other.
 class Call {
   public:
@@ -149,7 +135,7 @@ TEST(OpenCameraOfAChild, DISABLED_IsHeldUntilTheParentHasSeenIt) {
 }
 
 TEST(OpenCameraOfAnotherProcess, IsInTheTableThatBothSeeByItsName) {
-    const TableHold hold;
+    const NamedTurn turn(OpenCameraTableTurn);
     const std::string name = MakeName();
     const Call held(name + "-held");
     const Call seen(name + "-seen");
@@ -178,7 +164,7 @@ TEST(OpenCameraOfAnotherProcess, IsInTheTableThatBothSeeByItsName) {
 }
 
 TEST(OpenCameraTableByItsName, IsEmptyAndTakesNothingWhereItCannotBeReached) {
-    const TableHold hold;
+    const NamedTurn turn(OpenCameraTableTurn);
     HANDLE event = CreateEventA(nullptr, FALSE, FALSE, OpenCameraTableName);
     ASSERT_NE(event, nullptr);
     ASSERT_NE(GetLastError(), DWORD{ERROR_INVALID_HANDLE});

@@ -155,7 +155,7 @@ void RunInstallation(Installation* installation, const char* instanceId, const c
         CallDiInstallDevice(installation);
         return;
     }
-    // Kept: the word is printed whether or not the function is there.
+    // Before the call, and so also where the function is missing.
     if (bySystemVersion) WriteDebuggerOutput("UnInstall on XP");
     CallInstallSelectedDriver(*installation);
 }

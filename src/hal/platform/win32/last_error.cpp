@@ -20,11 +20,11 @@ bool GetPlatformErrorText(std::uint32_t error, char* text, std::size_t capacity)
         FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS;
     const DWORD length =
         FormatMessageA(flags, nullptr, error, 0, reinterpret_cast<char*>(&systemText), 0, nullptr);
-    if (length == 0) return false;
-    lstrcpynA(text, systemText, static_cast<int>(capacity));
+    if (length != 0) lstrcpynA(text, systemText, static_cast<int>(capacity));
     LocalFree(systemText);
+    // Whoever asks again gets the same answer, also where there was none.
     SetLastError(error);
-    return true;
+    return length != 0;
 }
 
 }  // namespace ZV

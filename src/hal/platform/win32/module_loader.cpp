@@ -3,6 +3,8 @@
 #include <windows.h>
 
 #include <cwchar>
+#include <memory>
+#include <new>
 
 namespace ZV {
 namespace {
@@ -11,7 +13,8 @@ constexpr wchar_t ModuleName[] = L"zentara-simulation.dll";
 constexpr DWORD PathLengthMax = 32768;
 constexpr DWORD ModuleNameLength = sizeof ModuleName / sizeof ModuleName[0];
 
-bool GetModulePath(wchar_t path[PathLengthMax]) {
+/// `path` has room for PathLengthMax characters.
+bool GetModulePath(wchar_t* path) {
     HMODULE image = nullptr;
     const DWORD flags =
         GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT;
@@ -28,12 +31,13 @@ bool GetModulePath(wchar_t path[PathLengthMax]) {
 }  // namespace
 
 const KernelDriver* LoadSimulationDriver() {
-    static wchar_t path[PathLengthMax];
-    if (!GetModulePath(path)) return nullptr;
+    // Too long for the stack of a client's thread.
+    const std::unique_ptr<wchar_t[]> path(new (std::nothrow) wchar_t[PathLengthMax]);
+    if (path == nullptr || !GetModulePath(path.get())) return nullptr;
     // What the module itself needs comes from its folder or the system's, never from the search
     // path.
     const DWORD flags = LOAD_LIBRARY_SEARCH_DLL_LOAD_DIR | LOAD_LIBRARY_SEARCH_SYSTEM32;
-    const HMODULE module = LoadLibraryExW(path, nullptr, flags);
+    const HMODULE module = LoadLibraryExW(path.get(), nullptr, flags);
     if (module == nullptr) return nullptr;
     const FARPROC symbol = GetProcAddress(module, GetKernelDriverName);
     if (symbol == nullptr) return nullptr;
