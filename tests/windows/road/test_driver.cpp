@@ -20,7 +20,6 @@ constexpr char InterfaceKey[] =
 /// Class of the systems' own devices; any will do.
 constexpr GUID SystemClass{
     0x4D36E97D, 0xE325, 0x11CE, {0xBF, 0xC1, 0x08, 0x00, 0x2B, 0xE1, 0x03, 0x18}};
-constexpr char TurnName[] = "ZentaraTestDriverTurn";
 constexpr DWORD TurnLimitMs = 1000000;  // longer than a suite may take
 constexpr auto StopLimit = std::chrono::seconds(60);
 constexpr auto StartLimit = std::chrono::seconds(90);
@@ -136,12 +135,10 @@ std::string GetProgramFolder() {
 }
 
 TestDriver::TestDriver()
-    : turn(CreateMutexA(nullptr, FALSE, TurnName)),
+    : turn(TestDriverTurn, TurnLimitMs),
       manager(OpenSCManagerA(nullptr, nullptr, SC_MANAGER_ALL_ACCESS)) {
-    const DWORD outcome = WaitForSingleObject(turn, TurnLimitMs);
-    hasTurn = outcome == WAIT_OBJECT_0 || outcome == WAIT_ABANDONED;
-    if (!hasTurn) {
-        ADD_FAILURE() << "another suite keeps the driver: " << outcome;
+    if (!turn.IsOurs()) {
+        ADD_FAILURE() << "another suite keeps the driver";
         return;
     }
     StopAndDelete(OpenServiceA(manager, ROAD_SERVICE_NAME, SERVICE_ALL_ACCESS));
@@ -157,8 +154,6 @@ TestDriver::~TestDriver() {
     if (control != INVALID_HANDLE_VALUE) CloseHandle(control);
     StopAndDelete(service);
     CloseServiceHandle(manager);
-    if (hasTurn) ReleaseMutex(turn);
-    CloseHandle(turn);
 }
 
 void TestDriver::Stop() {

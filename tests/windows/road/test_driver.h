@@ -6,6 +6,7 @@
 #include <string>
 
 #include "windows/driver/road_protocol.h"
+#include "windows/support/named_turn.h"
 
 namespace ZV::Test {
 
@@ -33,8 +34,7 @@ class TestDriver {
     bool Control(DWORD code, const void* input, DWORD inputBytes, void* output,
                  DWORD outputBytes) const;
 
-    HANDLE turn = nullptr;
-    bool hasTurn = false;
+    NamedTurn turn;
     SC_HANDLE manager = nullptr;
     SC_HANDLE service = nullptr;
     HANDLE control = INVALID_HANDLE_VALUE;
