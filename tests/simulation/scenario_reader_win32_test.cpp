@@ -18,13 +18,13 @@ class TracePath : public ::testing::Test {
     std::string Load(const std::string& drive, const std::string& trace) {
         folder.WriteFile("scenario.json", R"({"cameras": [{}], "trace": ")" + trace + "\"}");
         std::string message;
-        EXPECT_TRUE(LoadScenario(drive + "scenario.json", &scenario, &message)) << message;
+        EXPECT_TRUE(Simulation::LoadScenario(drive + "scenario.json", &scenario, &message)) << message;
         return scenario.trace;
     }
 
     const std::filesystem::path before = std::filesystem::current_path();
     const TemporaryFolder folder;
-    Scenario scenario;
+    Simulation::Scenario scenario;
 };
 
 TEST_F(TracePath, KeepsTheDriveOfAScenarioThatIsNamedByItAlone) {

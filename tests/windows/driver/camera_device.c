@@ -50,7 +50,7 @@ static UINT32 Pend(Message* message, const DeviceExtension* camera) {
 /* Who leaves a stream ends its thread next, which cancels the requests of that thread. Wine does
  * not bear that a request is completed while its cancellation is on the way. */
 static void NoteStream(DeviceExtension* camera, UINT32 code) {
-    if (code == STREAM_ENTER) camera->isLeft = FALSE;
+    if (code == ATTACH_BUFFER) camera->isLeft = FALSE;
     if (code == STREAM_LEAVE) camera->isLeft = TRUE;
 }
 

@@ -12,7 +12,6 @@
 #define ROAD_TAG 0x5A524F44
 
 /* Codes of which the driver takes note itself. */
-#define STREAM_ENTER 0x22A084
 #define STREAM_LEAVE 0x22A090
 #define ATTACH_BUFFER 0x22A0BA
 
@@ -22,7 +21,7 @@
 typedef struct DeviceExtension {
     BOOLEAN isControl;
     BOOLEAN isPlugged;
-    BOOLEAN isLeft; /* no buffer is completed between STREAM_LEAVE and the next STREAM_ENTER */
+    BOOLEAN isLeft; /* no buffer is completed from STREAM_LEAVE to the next ATTACH_BUFFER */
     UINT32 index;
     RoadPrepared prepared;
     BOOLEAN isPrepared;
