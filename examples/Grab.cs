@@ -1,4 +1,5 @@
-// Takes one image with the first camera and writes its samples to image.raw. Build it for x64.
+// Takes one image of 20 ms with the first camera and writes its samples to image.raw.
+// Build it for x64.
 using System;
 using System.IO;
 using System.Runtime.InteropServices;
@@ -21,19 +22,49 @@ static class Grab
         public uint bayerPattern, errorCode, timeStamp;
     }
 
-    const uint InfoImageSize = 10;
+    // Opaque: the library fills it, and its functions read and change it.
+    [StructLayout(LayoutKind.Sequential, Size = 260)]
+    struct Settings
+    {
+        public uint size;
+    }
 
-    [DllImport("zentara")] static extern uint Zentara_LoadDriver();
-    [DllImport("zentara")] static extern void Zentara_ReleaseDriver();
-    [DllImport("zentara")] static extern uint Zentara_ListCameras([In, Out] CamListItem[] items, ref uint length);
-    [DllImport("zentara")] static extern uint Zentara_OpenCamera(uint cameraId, out ulong handle);
-    [DllImport("zentara")] static extern uint Zentara_CloseCamera(ulong handle);
-    [DllImport("zentara")] static extern uint Zentara_GetInfo(ulong handle, uint key, out uint value);
-    [DllImport("zentara")] static extern uint Zentara_GrabFrame(ulong handle, ref Frame frame);
+    const string Library = "zentara";
+    const CallingConvention C = CallingConvention.Cdecl;
+    const uint InfoImageSize = 10, ParamExposure = 2;
+
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_LoadDriver();
+    [DllImport(Library, CallingConvention = C)]
+    static extern void Zentara_ReleaseDriver();
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_ListCameras([In, Out] CamListItem[] items, ref uint length);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_OpenCamera(uint cameraId, out ulong handle);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_CloseCamera(ulong handle);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_ReadSettingsFromCam(ulong handle, ref Settings settings);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_SetParam(ref Settings settings, uint key, uint value);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_SendSettingsToCam(ulong handle, ref Settings settings);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_GetInfo(ulong handle, uint key, out uint value);
+    [DllImport(Library, CallingConvention = C)]
+    static extern uint Zentara_GrabFrame(ulong handle, ref Frame frame);
 
     static void Check(uint result)
     {
         if (result != 0) throw new IOException("The library answered " + result);
+    }
+
+    static void SetExposure(ulong camera, uint microseconds)
+    {
+        var settings = new Settings();
+        Check(Zentara_ReadSettingsFromCam(camera, ref settings));
+        Check(Zentara_SetParam(ref settings, ParamExposure, microseconds));
+        Check(Zentara_SendSettingsToCam(camera, ref settings));
     }
 
     static void GrabOne(ulong camera)
@@ -65,8 +96,15 @@ static class Grab
             Check(Zentara_ListCameras(items, ref count));
             if (count == 0) throw new IOException("There is no camera");
             Check(Zentara_OpenCamera(items[0].cameraId, out ulong camera));
-            try { GrabOne(camera); }
-            finally { Check(Zentara_CloseCamera(camera)); }
+            try
+            {
+                SetExposure(camera, 20000);
+                GrabOne(camera);
+            }
+            finally
+            {
+                Check(Zentara_CloseCamera(camera));
+            }
         }
         finally
         {

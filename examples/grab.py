@@ -1,4 +1,4 @@
-"""Takes one image with the first camera and writes its samples to image.raw.
+"""Takes one image of 20 ms with the first camera and writes its samples to image.raw.
 
     python3 grab.py LIBRARY
 
@@ -10,6 +10,7 @@ from ctypes import POINTER, byref
 from ctypes import c_uint16 as u16, c_uint32 as u32, c_uint64 as u64, c_void_p as pointer
 
 INFO_IMAGE_SIZE = 10
+PARAM_EXPOSURE = 2
 
 
 class CamListItem(ctypes.Structure):
@@ -24,7 +25,12 @@ class Frame(ctypes.Structure):
                 ("privateAndReserved", u32 * 9)]
 
 
-assert ctypes.sizeof(CamListItem) == 56 and ctypes.sizeof(Frame) == 80
+class Settings(ctypes.Structure):
+    """Opaque: the library fills it, and its functions read and change it."""
+    _fields_ = [("size", u32), ("private", u32 * 64)]
+
+
+assert [ctypes.sizeof(record) for record in (CamListItem, Frame, Settings)] == [56, 80, 260]
 
 
 def check(result, function, arguments):
@@ -39,6 +45,9 @@ def load(path):
         "Zentara_LoadDriver": [],
         "Zentara_ListCameras": [POINTER(CamListItem), POINTER(u32)],
         "Zentara_OpenCamera": [u32, POINTER(u64)],
+        "Zentara_ReadSettingsFromCam": [u64, POINTER(Settings)],
+        "Zentara_SetParam": [POINTER(Settings), u32, u32],
+        "Zentara_SendSettingsToCam": [u64, POINTER(Settings)],
         "Zentara_GetInfo": [u64, u32, POINTER(u32)],
         "Zentara_GrabFrame": [u64, POINTER(Frame)],
         "Zentara_CloseCamera": [u64],
@@ -47,6 +56,13 @@ def load(path):
         function.argtypes, function.restype, function.errcheck = arguments, u32, check
     library.Zentara_ReleaseDriver.restype = None
     return library
+
+
+def set_exposure(library, camera, microseconds):
+    settings = Settings()
+    library.Zentara_ReadSettingsFromCam(camera, byref(settings))
+    library.Zentara_SetParam(byref(settings), PARAM_EXPOSURE, microseconds)
+    library.Zentara_SendSettingsToCam(camera, byref(settings))
 
 
 def grab(library, camera):
@@ -72,6 +88,7 @@ def main(path):
             raise OSError("there is no camera")
         library.Zentara_OpenCamera(items[0].cameraId, byref(camera))
         try:
+            set_exposure(library, camera, 20000)
             grab(library, camera)
         finally:
             library.Zentara_CloseCamera(camera)
