@@ -54,6 +54,7 @@ struct DriverState {
     std::array<std::vector<CountedRequest>, std::size(AllSeries)> counted;
     std::atomic<std::uint32_t> failedCode{0};
     std::uint32_t openDevices = 0;
+    std::uint32_t reclaimed = 0;
     ZentaraSimulationState stateAtEnd{};
     HeldRequest held;
     std::thread lateThread;
@@ -238,13 +239,23 @@ std::uint32_t Open(const char* path, void** handle) {
     return error;
 }
 
+std::uint32_t CountReservations() {
+    ZentaraSimulationState held{};
+    (void)ZentaraSimulation_GetState(AllCameras, &held);  // zeros without a bus
+    return held.reservedBandwidths + held.reservedChannels + held.reservedResources;
+}
+
 void Close(void* handle) {
+    const UncountedAllocations uncounted;
     DriverState& state = GetState();
+    const std::uint32_t before = CountReservations();
     GetSimulation().close(handle);
+    const std::uint32_t after = CountReservations();
     const bool isHeld = Hurry(handle, nullptr);
     std::unique_lock lock(state.mutex);
     if (isHeld) state.changed.wait(lock, [&] { return state.held.outer == nullptr; });
     --state.openDevices;
+    state.reclaimed += before - after;
 }
 
 void End() {
@@ -304,6 +315,12 @@ std::uint32_t CountOpenDevices() {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
     return state.openDevices;
+}
+
+std::uint32_t CountReclaimed() {
+    DriverState& state = GetState();
+    const std::lock_guard hold(state.mutex);
+    return state.reclaimed;
 }
 
 ZentaraSimulationState GetStateAtEnd() {

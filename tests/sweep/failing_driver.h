@@ -39,6 +39,8 @@ std::vector<CountedRequest> GetCounted(RequestSeries series);
 
 /// Handles that are open at the driver.
 std::uint32_t CountOpenDevices();
+/// Reservations that the driver had to take back so far, since a handle was closed with them.
+std::uint32_t CountReclaimed();
 /// What the driver held when the library ended its bus the last time, over all cameras.
 ZentaraSimulationState GetStateAtEnd();
 
