@@ -72,9 +72,9 @@ const KernelDriver& GetSimulation() {
 }
 
 RequestSeries GetSeries(std::uint32_t code) {
-    const bool isOfStream = code == FW_IOCTL_ATTACH_BUFFER || code == FW_IOCTL_STREAM_ENTER ||
-                            code == FW_IOCTL_STREAM_LEAVE;
-    return isOfStream ? RequestSeries::Stream : RequestSeries::Calls;
+    if (code == FW_IOCTL_ATTACH_BUFFER) return RequestSeries::Stream;
+    const bool isSwitch = code == FW_IOCTL_STREAM_ENTER || code == FW_IOCTL_STREAM_LEAVE;
+    return isSwitch ? RequestSeries::Switches : RequestSeries::Calls;
 }
 
 bool MayPend(const KernelRequest& request) {
@@ -83,7 +83,7 @@ bool MayPend(const KernelRequest& request) {
 
 /// Stays pended until something happens to it: an answer at once does nothing.
 bool WaitsForEvent(std::uint32_t code) {
-    return GetSeries(code) == RequestSeries::Stream || code == FW_IOCTL_NOTIFY_WAIT;
+    return GetSeries(code) != RequestSeries::Calls || code == FW_IOCTL_NOTIFY_WAIT;
 }
 
 /// What this request meets.

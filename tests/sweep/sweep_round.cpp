@@ -335,7 +335,7 @@ std::string Round::GetText() const {
     (void)std::snprintf(text, sizeof text, "%s:%s:%s:%s%llu (code 0x%X)",
                         SweepCameras[camera].name.data(), Stories[story].name.data(),
                         FailureNames[static_cast<std::size_t>(failure)].data(),
-                        isRequest && series == RequestSeries::Stream ? "s" : "",
+                        SeriesMarks[isRequest ? static_cast<std::size_t>(series) : 0].data(),
                         static_cast<unsigned long long>(number), code);
     return text;
 }

@@ -3,8 +3,8 @@
 //
 //   ZENTARA_SWEEP_SECONDS  length of the sample; 0 for all rounds
 //   ZENTARA_SWEEP_SEED     of the sample; printed when it is not given
-//   ZENTARA_SWEEP_ONLY     CAMERA:STORY:FAILURE[:NUMBER], each a name or *; s before a number of
-//                          the stream's series
+//   ZENTARA_SWEEP_ONLY     CAMERA:STORY:FAILURE[:NUMBER], each a name or *; s before the number
+//                          of an attached buffer, e of the stream's entering or leaving
 
 #include <gtest/gtest.h>
 
@@ -53,9 +53,9 @@ class Selection {
     bool HasCamera(std::size_t camera) const { return Fits(0, SweepCameras[camera].name); }
     bool HasStory(std::size_t story) const { return Fits(1, Stories[story].name); }
     bool HasRound(const Round& round) const {
-        const bool isOfStream = round.series == RequestSeries::Stream;
+        const std::string_view mark = SeriesMarks[static_cast<std::size_t>(round.series)];
         return Fits(2, FailureNames[static_cast<std::size_t>(round.failure)]) &&
-               Fits(3, (isOfStream ? "s" : "") + std::to_string(round.number));
+               Fits(3, std::string(mark) + std::to_string(round.number));
     }
 
   private:
@@ -132,10 +132,11 @@ Plan MakePlan(const Selection& selection, std::size_t camerasMax, std::mt19937& 
         }
         const std::size_t before = plan.rounds.size();
         AddRounds(camera, story, counted, selection, &plan.rounds);
-        std::printf("%s:%s: %zu and %zu requests, %lld allocations, %zu rounds\n",
+        std::printf("%s:%s: %zu, %zu and %zu requests, %lld allocations, %zu rounds\n",
                     SweepCameras[camera].name.data(), Stories[story].name.data(),
                     counted.requests[0].size(), counted.requests[1].size(),
-                    static_cast<long long>(counted.allocations), plan.rounds.size() - before);
+                    counted.requests[2].size(), static_cast<long long>(counted.allocations),
+                    plan.rounds.size() - before);
         plan.stories.emplace(StoryKey{camera, story}, std::move(counted));
     }
     return plan;
