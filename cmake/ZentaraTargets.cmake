@@ -46,3 +46,42 @@ endfunction()
 function(zentara_compile_alone)
   set_source_files_properties(${ARGN} PROPERTIES SKIP_UNITY_BUILD_INCLUSION ON)
 endfunction()
+
+# What the compiler's guards of the stack call is a library of its own on Windows.
+set(zentara_guards)
+if(WIN32 AND NOT ZENTARA_SANITIZE)
+  set(zentara_guards ssp)
+endif()
+
+# The sources of what is shipped: a table or a text that is overrun ends the process. The sanitizers have checks of their
+# own. scripts/check-hardening looks at this and at the files.
+function(zentara_harden_sources target)
+  if(ZENTARA_SANITIZE)
+    return()
+  endif()
+  target_compile_options(${target} PRIVATE -fstack-protector-strong -fcf-protection=full)
+  if(NOT WIN32)
+    target_compile_options(${target} PRIVATE -fstack-clash-protection)
+  endif()
+  string(TOUPPER "${CMAKE_BUILD_TYPE}" buildType)
+  if("${CMAKE_CXX_FLAGS_${buildType}}" MATCHES "-O[123s]")
+    target_compile_options(${target} PRIVATE -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2)
+  endif()
+endfunction()
+
+# How the system loads a library or a program: anywhere, its code never writable, its tables of addresses written once.
+# It finds the other libraries beside it, never in a folder of the machine that built it.
+function(zentara_harden_image target)
+  if(WIN32)
+    target_link_options(${target} PRIVATE
+      LINKER:--dynamicbase,--high-entropy-va,--nxcompat,--enable-reloc-section)
+    target_link_libraries(${target} PRIVATE ${zentara_guards})
+    return()
+  endif()
+  target_link_options(${target} PRIVATE LINKER:-z,relro,-z,now,-z,noexecstack)
+  get_target_property(type ${target} TYPE)
+  if(type STREQUAL "EXECUTABLE")
+    target_link_options(${target} PRIVATE -pie)
+  endif()
+  set_target_properties(${target} PROPERTIES BUILD_RPATH_USE_ORIGIN ON)
+endfunction()

@@ -85,7 +85,8 @@ TIFF* OpenTiff(const std::string& path, std::string* reason) {
     if (options == nullptr) return nullptr;
     TIFFOpenOptionsSetErrorHandlerExtR(options, KeepTiffMessage, reason);
     TIFFOpenOptionsSetWarningHandlerExtR(options, DropTiffMessage, nullptr);
-    TIFF* file = TIFFOpenExt(path.c_str(), "r", options);
+    // Without a memory map, which a file that is cut meanwhile breaks.
+    TIFF* file = TIFFOpenExt(path.c_str(), "rm", options);
     TIFFOpenOptionsFree(options);
     return file;
 }
@@ -267,7 +268,10 @@ constexpr ImageReader ImageReaders[] = {
 };
 
 const ImageReader* FindReader(const std::string& path, std::string* reason) {
-    std::FILE* file = std::fopen(path.c_str(), "rb");
+    // A pipe would be waited for, a device never ends.
+    std::error_code failure;
+    const bool isFile = std::filesystem::is_regular_file(path, failure);
+    std::FILE* file = isFile ? std::fopen(path.c_str(), "rb") : nullptr;
     if (file == nullptr) {
         *reason = "it cannot be opened";
         return nullptr;

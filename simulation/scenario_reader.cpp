@@ -2,7 +2,6 @@
 
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 
 #include "simulation/configuration.h"
 #include "simulation/fault_reader.h"
@@ -11,6 +10,7 @@
 namespace ZV::Simulation {
 namespace {
 
+constexpr std::size_t ScenarioBytesMax = 4 << 20;
 constexpr std::size_t CamerasMax = 64;
 constexpr std::uint64_t SensorSizeMax = 16384;
 constexpr std::size_t SerialCharactersMax = 28;
@@ -368,13 +368,21 @@ void ReadScenario(const JsonNode& node, Scenario* scenario) {
 }
 
 bool ReadFile(const std::string& path, std::string* text, std::string* message) {
-    std::ifstream file(path, std::ios::binary);
-    if (!file || std::filesystem::is_directory(path)) {
+    // A pipe would be waited for, a device never ends.
+    std::error_code failure;
+    const bool isFile = std::filesystem::is_regular_file(path, failure);
+    std::ifstream file;
+    if (isFile) file.open(path, std::ios::binary);
+    if (!isFile || !file) {
         *message = "'" + path + "' is neither a built-in scenario nor a file that can be read";
         return false;
     }
-    text->assign(std::istreambuf_iterator<char>(file), {});
-    return true;
+    text->resize(ScenarioBytesMax + 1);
+    file.read(text->data(), static_cast<std::streamsize>(text->size()));
+    text->resize(static_cast<std::size_t>(file.gcount()));
+    if (text->size() <= ScenarioBytesMax) return true;
+    *message = path + ": is too large for a scenario";
+    return false;
 }
 
 /// What ends a folder's name, or a drive's where there are drives.

@@ -1,21 +1,18 @@
 #include "image_file.h"
 
-#include <fmt/format.h>
-
 #include <algorithm>
 #include <array>
 #include <cctype>
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
-#include <filesystem>
-#include <random>
 #include <string_view>
 #include <system_error>
 
 #include "image_writers.h"
 #include "paths.h"
 #include "platform.h"
+#include "unfinished_file.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -42,34 +39,6 @@ const KindRow* FindKind(const std::string& path) {
     return row == Kinds.end() ? nullptr : row;
 }
 
-/// A new folder beside the place of a file, removed with what is in it. Only a folder is made
-/// exclusively and then written to by name, as the libraries of the formats want it.
-class UnfinishedFolder {
-  public:
-    explicit UnfinishedFolder(const std::filesystem::path& parent) {
-        std::random_device random;
-        do {
-            path = parent / fmt::format(".zentara-{:08x}", random());
-        } while (!std::filesystem::create_directory(path, failure) && IsTaken());
-    }
-    ~UnfinishedFolder() {
-        std::error_code ignored;
-        if (!failure) std::filesystem::remove_all(path, ignored);
-    }
-    UnfinishedFolder(const UnfinishedFolder&) = delete;
-    UnfinishedFolder& operator=(const UnfinishedFolder&) = delete;
-
-    [[nodiscard]] const std::error_code& GetFailure() const { return failure; }
-    [[nodiscard]] std::string GetPath(const char* name) const { return GetPathText(path / name); }
-
-  private:
-    /// A folder of the name is no failure to the standard library, a file of the name is one.
-    [[nodiscard]] bool IsTaken() const { return !failure || failure == std::errc::file_exists; }
-
-    std::filesystem::path path;
-    std::error_code failure;
-};
-
 }  // namespace
 
 ImageKind GetImageKind(const std::string& path) {
@@ -80,15 +49,12 @@ ImageKind GetImageKind(const std::string& path) {
 std::string WriteImage(const std::string& path, const Image& image) {
     const KindRow* row = FindKind(path);
     if (row == nullptr) return "the ending of the name is none of .fits, .tiff, .png, .raw";
-    // The finished file takes its name in one step, so that nobody ever sees half of it.
-    const UnfinishedFolder folder(MakePath(path).parent_path());
-    if (folder.GetFailure()) return DescribeFailure(folder.GetFailure());
-    const std::string unfinished = folder.GetPath("image");
-    std::string reason = row->write(unfinished, image);
+    const UnfinishedFile unfinished(path);
+    if (unfinished.GetFailure()) return DescribeFailure(unfinished.GetFailure());
+    std::string reason = row->write(unfinished.GetPath(), image);
     if (!reason.empty()) return reason;
-    std::error_code renamed;
-    std::filesystem::rename(MakePath(unfinished), MakePath(path), renamed);
-    return renamed ? DescribeFailure(renamed) : std::string{};
+    const std::error_code failure = unfinished.Finish();
+    return failure ? DescribeFailure(failure) : std::string{};
 }
 
 std::string DescribeFailure(const std::error_code& failure) {

@@ -1,6 +1,5 @@
 #include "output.h"
 
-#include <algorithm>
 #include <nlohmann/json.hpp>
 
 namespace ZentaraProgram {
@@ -31,10 +30,16 @@ void PrintError(const std::string& text) {
 }
 
 std::string MakeHarmless(std::string text) {
-    constexpr unsigned char FirstPrinted = 32, Delete = 127;
-    std::replace_if(
-        text.begin(), text.end(), [](unsigned char c) { return c < FirstPrinted || c == Delete; },
-        '?');
+    constexpr unsigned char FirstPrinted = 32, Delete = 127, LastControl = 0x9F;
+    // In UTF-8 the controls 0x80 to 0x9F are this byte and their own.
+    constexpr unsigned char ControlLead = 0xC2;
+    unsigned char before = 0;
+    for (char& letter : text) {
+        const auto byte = static_cast<unsigned char>(letter);
+        const bool isPair = before == ControlLead && byte > Delete && byte <= LastControl;
+        if (byte < FirstPrinted || byte == Delete || isPair) letter = '?';
+        before = byte;
+    }
     return text;
 }
 

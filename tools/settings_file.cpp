@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <charconv>
-#include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <nlohmann/json.hpp>
@@ -14,6 +13,7 @@
 #include "image_writers.h"
 #include "output.h"
 #include "paths.h"
+#include "unfinished_file.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -245,20 +245,12 @@ std::string WriteSettingsFile(const std::string& path, const Camera& camera,
                                 {"settings", GetSettingsAsJson(block)}};
     const std::string text =
         document.dump(2, ' ', false, ordered_json::error_handler_t::replace) + "\n";
-    // The finished file takes its name in one step, so that nobody ever sees half of it.
-    const std::string unfinished = path + ".part";
-    std::error_code failure;
+    const UnfinishedFile unfinished(path);
+    if (unfinished.GetFailure()) return DescribeFailure(unfinished.GetFailure());
     errno = 0;
-    if (!WriteText(unfinished, text)) {
-        std::string reason = DescribeFileFailure();
-        std::filesystem::remove(MakePath(unfinished), failure);
-        return reason;
-    }
-    std::filesystem::rename(MakePath(unfinished), MakePath(path), failure);
-    if (!failure) return {};
-    std::error_code ignored;
-    std::filesystem::remove(MakePath(unfinished), ignored);
-    return DescribeFailure(failure);
+    if (!WriteText(unfinished.GetPath(), text)) return DescribeFileFailure();
+    const std::error_code failure = unfinished.Finish();
+    return failure ? DescribeFailure(failure) : std::string{};
 }
 
 ordered_json GetValueAsJson(const Setting& setting, SettingValue value) {

@@ -55,6 +55,11 @@ TEST(ScenarioReader, RefusesANameThatIsNeitherBuiltInNorAFile) {
     EXPECT_FALSE(IsAccepted("/"));
 }
 
+TEST(ScenarioReader, RefusesADeviceAndAFileOfManyMegabytesWithoutReadingThem) {
+    EXPECT_FALSE(IsAccepted("/dev/zero"));
+    EXPECT_THAT(Check(std::string(5 << 20, ' ')), HasSubstr("is too large for a scenario"));
+}
+
 TEST(ScenarioReader, CutsTheMessageToTheBuffer) {
     char message[8] = "";
 

@@ -260,6 +260,13 @@ TEST_F(SceneImageTest, AFileOfAnotherKindIsRefused) {
     ExpectRefused("text.png", "it is neither a PNG nor a TIFF nor a FITS file");
 }
 
+TEST_F(SceneImageTest, AFolderOrDeviceInPlaceOfAFileIsRefused) {
+    ExpectRefused(".", "it cannot be opened");
+    std::string message;
+    EXPECT_EQ(nullptr, MakeScene(Describe("/dev/zero"), 4, 4, 1, &message));
+    EXPECT_NE("", message);
+}
+
 TEST_F(SceneImageTest, AFileThatIsShorterThanItsHeaderSaysIsRefusedBeforeThereIsRoomForIt) {
     // Small files with a row of a tebibyte, and with images of gibibytes.
     for (const char* name : {"wide.tiff", "samples.tiff", "wide.png", "short.fits"}) {

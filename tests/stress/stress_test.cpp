@@ -323,7 +323,10 @@ TEST_P(Stress, FourClientsMayCallEverythingAtOnceOnTwoCameras) {
     Run(seed, steps);
     DelaySeam(0);
 
+    EXPECT_NE(0U, CountSeamDelays());
     for (StressedCamera& camera : cameras) {
+        EXPECT_NE(0U, camera.delivered);
+        EXPECT_NE(0U, camera.exposures);
         ExpectWorking(camera);
         ExpectLedgerClosed(camera);
         std::printf("seed %llu: %llu exposures, %llu frames, %llu changes, %llu delays\n",

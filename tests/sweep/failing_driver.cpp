@@ -54,6 +54,7 @@ struct DriverState {
     std::array<std::vector<CountedRequest>, std::size(AllSeries)> counted;
     std::atomic<std::uint32_t> failedCode{0};
     std::uint32_t openDevices = 0;
+    std::uint32_t reclaimed = 0;
     ZentaraSimulationState stateAtEnd{};
     HeldRequest held;
     std::thread lateThread;
@@ -71,9 +72,9 @@ const KernelDriver& GetSimulation() {
 }
 
 RequestSeries GetSeries(std::uint32_t code) {
-    const bool isOfStream = code == FW_IOCTL_ATTACH_BUFFER || code == FW_IOCTL_STREAM_ENTER ||
-                            code == FW_IOCTL_STREAM_LEAVE;
-    return isOfStream ? RequestSeries::Stream : RequestSeries::Calls;
+    if (code == FW_IOCTL_ATTACH_BUFFER) return RequestSeries::Stream;
+    const bool isSwitch = code == FW_IOCTL_STREAM_ENTER || code == FW_IOCTL_STREAM_LEAVE;
+    return isSwitch ? RequestSeries::Switches : RequestSeries::Calls;
 }
 
 bool MayPend(const KernelRequest& request) {
@@ -82,7 +83,7 @@ bool MayPend(const KernelRequest& request) {
 
 /// Stays pended until something happens to it: an answer at once does nothing.
 bool WaitsForEvent(std::uint32_t code) {
-    return GetSeries(code) == RequestSeries::Stream || code == FW_IOCTL_NOTIFY_WAIT;
+    return GetSeries(code) != RequestSeries::Calls || code == FW_IOCTL_NOTIFY_WAIT;
 }
 
 /// What this request meets.
@@ -238,13 +239,23 @@ std::uint32_t Open(const char* path, void** handle) {
     return error;
 }
 
+std::uint32_t CountReservations() {
+    ZentaraSimulationState held{};
+    (void)ZentaraSimulation_GetState(AllCameras, &held);  // zeros without a bus
+    return held.reservedBandwidths + held.reservedChannels + held.reservedResources;
+}
+
 void Close(void* handle) {
+    const UncountedAllocations uncounted;
     DriverState& state = GetState();
+    const std::uint32_t before = CountReservations();
     GetSimulation().close(handle);
+    const std::uint32_t after = CountReservations();
     const bool isHeld = Hurry(handle, nullptr);
     std::unique_lock lock(state.mutex);
     if (isHeld) state.changed.wait(lock, [&] { return state.held.outer == nullptr; });
     --state.openDevices;
+    state.reclaimed += before - after;
 }
 
 void End() {
@@ -304,6 +315,12 @@ std::uint32_t CountOpenDevices() {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
     return state.openDevices;
+}
+
+std::uint32_t CountReclaimed() {
+    DriverState& state = GetState();
+    const std::lock_guard hold(state.mutex);
+    return state.reclaimed;
 }
 
 ZentaraSimulationState GetStateAtEnd() {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string_view>
 #include <vector>
 
 #include "simulation/zentara_simulation.h"
@@ -18,10 +19,13 @@ enum class RequestFailure {
     DeviceGone,        ///< The camera is unplugged before it, and stays so.
 };
 
-/// Requests are numbered in two series, since a stream's own thread sends some of them beside the
-/// callers: attached buffers and the stream's entering and leaving are those of the stream.
-enum class RequestSeries { Calls, Stream };
-inline constexpr RequestSeries AllSeries[] = {RequestSeries::Calls, RequestSeries::Stream};
+/// Requests are numbered in three series, since a stream's own thread sends some of them beside the
+/// callers: attached buffers, as many as frames pass, and the stream's entering and leaving.
+enum class RequestSeries { Calls, Stream, Switches };
+inline constexpr RequestSeries AllSeries[] = {RequestSeries::Calls, RequestSeries::Stream,
+                                              RequestSeries::Switches};
+/// Before a request's number.
+inline constexpr std::string_view SeriesMarks[] = {"", "s", "e"};
 
 struct CountedRequest {
     std::uint32_t code = 0;
@@ -39,6 +43,8 @@ std::vector<CountedRequest> GetCounted(RequestSeries series);
 
 /// Handles that are open at the driver.
 std::uint32_t CountOpenDevices();
+/// Reservations that the driver had to take back so far, since a handle was closed with them.
+std::uint32_t CountReclaimed();
 /// What the driver held when the library ended its bus the last time, over all cameras.
 ZentaraSimulationState GetStateAtEnd();
 

@@ -109,6 +109,13 @@ class Watchdog {
 };
 char Watchdog::m_text[256];
 
+/// The story must go on as if nothing had happened: the failure is one of time alone.
+bool IsHarmless(const Round& round) {
+    if (round.failure == Failure::CompletesLate) return true;
+    return round.failure == Failure::AnsweredAtOnce && round.series == RequestSeries::Calls &&
+           round.code != FW_IOCTL_ASYNC_READ;
+}
+
 /// One round, from load to release.
 class Runner {
   public:
@@ -142,11 +149,13 @@ class Runner {
     void CloseForGood(const Round* round);
     void UseAgain(const char* where);
     void CheckRelease();
+    void CheckReclaimed(std::uint32_t before, const char* where);
 
     const SweepCamera& camera;
     const Story& story;
     Client& client;
     std::size_t firstCall = 0;  ///< Of the story.
+    const std::uint32_t reclaimedAtBegin = CountReclaimed();
 };
 
 bool Runner::Prepare() {
@@ -221,14 +230,24 @@ void Runner::UseAgain(const char* where) {
     client.List();
     if (!client.HasCamera()) return Complain(std::string(where) + ": no camera is listed");
     client.Open();
+    const std::uint32_t reclaimed = CountReclaimed();
     client.Begin(camera.imageFormat);
     client.Grab();
     client.Close();
     if (!HasGoodCalls(from, where)) return;
+    CheckReclaimed(reclaimed, where);
     if (client.GetGrabbed().errorCode != zerrNone || client.GetGrabbed().width == 0) {
         Complain(std::string(where) + ": the frame is bad");
     }
     if (CountOpenDevices() != 0) Complain(std::string(where) + ": a device is left open");
+}
+
+/// The driver takes back what a closed handle has reserved, which hides that nobody has freed it.
+void Runner::CheckReclaimed(std::uint32_t before, const char* where) {
+    const std::uint32_t count = CountReclaimed() - before;
+    if (count == 0) return;
+    Complain(std::string(where) + ": a device is closed with " + std::to_string(count) +
+             " reservations");
 }
 
 void Runner::CheckRelease() {
@@ -257,6 +276,7 @@ void Runner::CheckWhatIsLeft(const Round* round) {
     client.Load();
     UseAgain("used again after a release");
     CheckRelease();
+    if (round == nullptr || IsHarmless(*round)) CheckReclaimed(reclaimedAtBegin, "in all");
 }
 
 struct Belongings {
@@ -297,13 +317,6 @@ void StartHelpers() {
     (void)isDone;
 }
 
-/// The story must go on as if nothing had happened: the failure is one of time alone.
-bool IsHarmless(const Round& round) {
-    if (round.failure == Failure::CompletesLate) return true;
-    return round.failure == Failure::AnsweredAtOnce && round.series == RequestSeries::Calls &&
-           round.code != FW_IOCTL_ASYNC_READ;
-}
-
 constexpr RequestFailure ConvertFailure(Failure failure) {
     constexpr RequestFailure Table[] = {RequestFailure::Fails,
                                         RequestFailure::AnsweredAtOnce,
@@ -322,7 +335,7 @@ std::string Round::GetText() const {
     (void)std::snprintf(text, sizeof text, "%s:%s:%s:%s%llu (code 0x%X)",
                         SweepCameras[camera].name.data(), Stories[story].name.data(),
                         FailureNames[static_cast<std::size_t>(failure)].data(),
-                        isRequest && series == RequestSeries::Stream ? "s" : "",
+                        SeriesMarks[isRequest ? static_cast<std::size_t>(series) : 0].data(),
                         static_cast<unsigned long long>(number), code);
     return text;
 }

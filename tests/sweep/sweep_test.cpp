@@ -3,8 +3,8 @@
 //
 //   ZENTARA_SWEEP_SECONDS  length of the sample; 0 for all rounds
 //   ZENTARA_SWEEP_SEED     of the sample; printed when it is not given
-//   ZENTARA_SWEEP_ONLY     CAMERA:STORY:FAILURE[:NUMBER], each a name or *; s before a number of
-//                          the stream's series
+//   ZENTARA_SWEEP_ONLY     CAMERA:STORY:FAILURE[:NUMBER], each a name or *; s before the number
+//                          of an attached buffer, e of the stream's entering or leaving
 
 #include <gtest/gtest.h>
 
@@ -33,6 +33,7 @@ constexpr std::size_t StreamRequestsMax = 200;
 /// Allocations that fail in a story: all but those of one frame like another.
 constexpr std::int64_t AllocationsMax = 400;
 constexpr std::size_t SampleCameras = IsSanitized ? 2 : 4;  ///< Of each story in a sample.
+constexpr std::size_t KindsLeast = 16;                      ///< Of request, in all stories.
 constexpr std::size_t ProblemsMax = 200;                    ///< Printed before a sweep gives up.
 
 int ReadNumber(const char* variable, int otherwise) {
@@ -48,12 +49,13 @@ class Selection {
         std::istringstream stream(text != nullptr ? text : "");
         for (std::string part; std::getline(stream, part, ':');) parts.push_back(part);
     }
+    bool IsLimited() const { return !parts.empty(); }
     bool HasCamera(std::size_t camera) const { return Fits(0, SweepCameras[camera].name); }
     bool HasStory(std::size_t story) const { return Fits(1, Stories[story].name); }
     bool HasRound(const Round& round) const {
-        const bool isOfStream = round.series == RequestSeries::Stream;
+        const std::string_view mark = SeriesMarks[static_cast<std::size_t>(round.series)];
         return Fits(2, FailureNames[static_cast<std::size_t>(round.failure)]) &&
-               Fits(3, (isOfStream ? "s" : "") + std::to_string(round.number));
+               Fits(3, std::string(mark) + std::to_string(round.number));
     }
 
   private:
@@ -130,10 +132,11 @@ Plan MakePlan(const Selection& selection, std::size_t camerasMax, std::mt19937& 
         }
         const std::size_t before = plan.rounds.size();
         AddRounds(camera, story, counted, selection, &plan.rounds);
-        std::printf("%s:%s: %zu and %zu requests, %lld allocations, %zu rounds\n",
+        std::printf("%s:%s: %zu, %zu and %zu requests, %lld allocations, %zu rounds\n",
                     SweepCameras[camera].name.data(), Stories[story].name.data(),
                     counted.requests[0].size(), counted.requests[1].size(),
-                    static_cast<long long>(counted.allocations), plan.rounds.size() - before);
+                    counted.requests[2].size(), static_cast<long long>(counted.allocations),
+                    plan.rounds.size() - before);
         plan.stories.emplace(StoryKey{camera, story}, std::move(counted));
     }
     return plan;
@@ -176,6 +179,7 @@ class Tally {
         codes.insert(outcome.code);
     }
     std::size_t CountCodes() const { return codes.size() - codes.count(0); }
+    bool HasCode(std::uint32_t code) const { return codes.count(code) != 0; }
     void Print() const {
         std::printf("\n%-10s", "story");
         for (const std::string_view name : FailureNames) std::printf("%16s", name.data());
@@ -200,6 +204,17 @@ class Tally {
     std::set<std::uint32_t> codes;
 };
 
+/// Every kind of request that the stories have has failed in some round.
+void ExpectEveryKind(const std::vector<Round>& rounds, const Tally& tally) {
+    std::set<std::uint32_t> planned;
+    for (const Round& round : rounds) planned.insert(round.code);
+    planned.erase(0);  // allocations
+    EXPECT_GE(planned.size(), KindsLeast);
+    for (const std::uint32_t code : planned) {
+        EXPECT_TRUE(tally.HasCode(code)) << "no request 0x" << std::hex << code << " has failed";
+    }
+}
+
 TEST(Sweep, EveryRequestAndAllocationThatFailsLeavesTheLibraryInOrder) {
     const int seconds = ReadNumber("ZENTARA_SWEEP_SECONDS", SampleSeconds);
     const auto seed = static_cast<std::uint32_t>(
@@ -208,7 +223,8 @@ TEST(Sweep, EveryRequestAndAllocationThatFailsLeavesTheLibraryInOrder) {
     std::mt19937 random(seed);
     const auto end = Clock::now() + std::chrono::seconds(seconds);
     const std::size_t camerasMax = isSample ? SampleCameras : std::size(SweepCameras);
-    Plan plan = MakePlan(Selection(), camerasMax, random);
+    const Selection selection;
+    Plan plan = MakePlan(selection, camerasMax, random);
     const std::size_t least =
         isSample ? ShuffleForSample(&plan.rounds, random) : plan.rounds.size();
     Tally tally;
@@ -228,6 +244,7 @@ TEST(Sweep, EveryRequestAndAllocationThatFailsLeavesTheLibraryInOrder) {
     std::printf("%zu of %zu rounds, %zu kinds of request, seed %u\n", done, plan.rounds.size(),
                 tally.CountCodes(), seed);
     EXPECT_NE(0U, done);
+    if (!selection.IsLimited()) ExpectEveryKind(plan.rounds, tally);
 }
 
 }  // namespace

@@ -172,6 +172,20 @@ TEST(Program, ASerialNumberThatIsNotUtf8IsPrintedWithReplacementsInJson) {
     EXPECT_EQ(expected, json::parse(info.output)["serialNumber"]);
 }
 
+TEST(Program, ASerialNumberOfACameraGivesTheTerminalNoCommand) {
+    // "A", an escape, "[J"; then the same command as one control of UTF-8.
+    const TemporaryFolder folder;
+    const std::string scenario = folder.GetPath("serial.json");
+    WriteFile(scenario, R"({"base": "mono",
+        "cameras": [{"configuration": {"18": "0x411B5B4A", "19": "0x42C29B4A", "20": 0}}]})");
+
+    const ProgramResult list = RunProgram({"list", "--simulation", scenario});
+    const ProgramResult info = RunProgram({"info", "0", "--simulation", scenario});
+
+    EXPECT_THAT(list.output, HasSubstr("A?[JB\xC2?J")) << list.errors;
+    EXPECT_THAT(info.output, HasSubstr("A?[JB\xC2?J")) << info.errors;
+}
+
 TEST(Program, ARefusedScenarioEndsWithCode2AndNamesThePlace) {
     const TemporaryFolder folder;
     WriteFile(folder.GetPath("bad.json"), R"({"base": "mono", "cameras": [{"colour": 1}]})");

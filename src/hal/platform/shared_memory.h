@@ -8,7 +8,8 @@ namespace ZV {
 /// one name, zeroed when it is new.
 struct SharedMemory;
 
-/// Opens or makes the block, read-write. Null when the system refuses.
+/// Opens or makes the block, read-write. Null when the system refuses; on POSIX also for a block
+/// that everyone may write to and that neither this user nor the administrator has made.
 SharedMemory* OpenSharedMemory(const char* name, std::size_t bytes);
 
 /// The block in this process, for the life of `memory`.

@@ -45,6 +45,19 @@ TEST(AppendFileSeam, OpensNoNamedPipeAndDoesNotWaitForItsReader) {
         testing::ExitedWithCode(0), "");
 }
 
+TEST(AppendFileSeam, MakesAFileThatItsOwnerAloneMayWriteWhateverTheProcessAllows) {
+    const TemporaryFolder folder;
+    const std::string path = folder.GetPath("log");
+    const mode_t former = umask(0);
+
+    Open(path);
+
+    umask(former);
+    struct stat status {};
+    ASSERT_EQ(0, stat(path.c_str(), &status));
+    EXPECT_EQ(0644U, status.st_mode & 07777U);
+}
+
 TEST(AppendFileSeam, OpensNoDeviceAndNoNamedPipeThatIsRead) {
     const TemporaryFolder folder;
     const std::string path = folder.GetPath("pipe");

@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/mman.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -125,6 +126,36 @@ TEST_F(NamedMemory, GrowsForOneThatNeedsMore) {
     CloseSharedMemory(smallAgain);
     CloseSharedMemory(small);
     CloseSharedMemory(large);
+}
+
+TEST_F(NamedMemory, IsOpenToOthersAsFarAsTheUmaskLetsIt) {
+    const mode_t former = umask(027);
+    SharedMemory* memory = Open();
+    umask(former);
+
+    struct stat status {};
+    ASSERT_EQ(0, stat(("/dev/shm" + SystemName()).c_str(), &status));
+    EXPECT_EQ(0640U, status.st_mode & 07777U);
+    CloseSharedMemory(memory);
+}
+
+TEST_F(NamedMemory, IsNotTakenFromAStrangerWhoLetsEveryoneWriteToIt) {
+    if (geteuid() != 0) GTEST_SKIP() << "only the administrator can be two users";
+    SharedMemory* memory = Open();
+    ASSERT_NE(memory, nullptr);
+    ASSERT_EQ(0, chmod(("/dev/shm" + SystemName()).c_str(), 0666));
+    constexpr uid_t Stranger = 65534, OtherStranger = 65533;
+    const auto opensAs = [this](uid_t user) {
+        return IsTrueInChild([&] { return setuid(user) == 0 && Open() != nullptr; });
+    };
+
+    EXPECT_TRUE(opensAs(Stranger)) << "the administrator's";
+    ASSERT_EQ(0, chown(("/dev/shm" + SystemName()).c_str(), Stranger, Stranger));
+
+    EXPECT_TRUE(opensAs(Stranger)) << "their own";
+    EXPECT_FALSE(opensAs(OtherStranger));
+    EXPECT_EQ(nullptr, Open());
+    CloseSharedMemory(memory);
 }
 
 TEST(SharedMemoryName, IsRefusedWhenItIsNone) {

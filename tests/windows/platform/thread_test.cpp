@@ -121,5 +121,16 @@ TEST(ProcessPriority, IsRaisedAndLoweredForARealDeviceAlone) {
     EXPECT_EQ(GetPriorityClass(GetCurrentProcess()), DWORD{NORMAL_PRIORITY_CLASS});
 }
 
+TEST(ProcessPriority, KeptIsTakenFromOneLoopByTheEndOfAnothersWork) {
+    RaiseProcessPriority(true);
+    RaiseProcessPriority(true);
+
+    LowerProcessPriority(true);
+    EXPECT_EQ(GetPriorityClass(GetCurrentProcess()), DWORD{NORMAL_PRIORITY_CLASS});
+
+    LowerProcessPriority(true);
+    EXPECT_EQ(GetPriorityClass(GetCurrentProcess()), DWORD{NORMAL_PRIORITY_CLASS});
+}
+
 }  // namespace
 }  // namespace ZV::Test

@@ -50,12 +50,25 @@ bool IsRemoved(const struct stat& status) {
     return status.st_nlink == 0;
 }
 
+/// A stranger who lays a block there for everyone to write to could cut it under those that read
+/// it.
+bool IsTrusted(const struct stat& status) {
+    const bool isOwn = status.st_uid == geteuid() || status.st_uid == 0;
+    return isOwn || (status.st_mode & S_IWOTH) == 0;
+}
+
 /// Takes part in the block behind `file`, zeroed for the first and at least `bytes` long. False
-/// with errno; EAGAIN when the block is just being begun or removed.
+/// with errno; EAGAIN when the block is just being begun or removed, EACCES when it is a
+/// stranger's.
 bool JoinBlock(int file, std::size_t bytes) {
+    struct stat status {};
+    if (fstat(file, &status) != 0) return false;
+    if (!IsTrusted(status)) {
+        errno = EACCES;
+        return false;
+    }
     if (flock(file, LOCK_EX | LOCK_NB) == 0 && ftruncate(file, 0) != 0) return false;
     if (flock(file, LOCK_SH | LOCK_NB) != 0) return false;
-    struct stat status {};
     if (fstat(file, &status) != 0) return false;
     if (IsRemoved(status)) {
         errno = EAGAIN;
