@@ -19,6 +19,19 @@ bool MakePipe(HANDLE* reading, HANDLE* writing, bool isReadByChild) {
     return SetHandleInformation(isReadByChild ? *writing : *reading, HANDLE_FLAG_INHERIT, 0);
 }
 
+/// On a busy machine Wine may lose a process in its start.
+bool Create(std::string* line, STARTUPINFOA* start, PROCESS_INFORMATION* started) {
+    constexpr int Tries = 3;
+    for (int i = 0; i < Tries; ++i) {
+        if (CreateProcessA(nullptr, line->data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
+                           start, started)) {
+            return true;
+        }
+        if (GetLastError() != ERROR_INTERNAL_ERROR) return false;
+    }
+    return false;
+}
+
 void CloseAndClear(HANDLE* handle) {
     if (*handle != nullptr) CloseHandle(*handle);
     *handle = nullptr;
@@ -38,8 +51,7 @@ ChildProcess::ChildProcess(const std::string& program, const std::string& argume
         start.hStdInput = childInput;
         start.hStdOutput = childOutput;
         start.hStdError = GetStdHandle(STD_ERROR_HANDLE);
-        if (CreateProcessA(nullptr, line.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
-                           &start, &started)) {
+        if (Create(&line, &start, &started)) {
             process = started.hProcess;
             CloseHandle(started.hThread);
         }
