@@ -1,4 +1,5 @@
-/* A program without a runtime, which any compiler for Windows can build; it ends with the number of cameras. */
+/* A program without a runtime, which any compiler for Windows can build; it ends with the number of
+ * cameras. */
 #include <zentara/zentara.h>
 
 static Zentara_CamListItem cameras[10];

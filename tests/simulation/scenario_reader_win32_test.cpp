@@ -18,7 +18,8 @@ class TracePath : public ::testing::Test {
     std::string Load(const std::string& drive, const std::string& trace) {
         folder.WriteFile("scenario.json", R"({"cameras": [{}], "trace": ")" + trace + "\"}");
         std::string message;
-        EXPECT_TRUE(Simulation::LoadScenario(drive + "scenario.json", &scenario, &message)) << message;
+        EXPECT_TRUE(Simulation::LoadScenario(drive + "scenario.json", &scenario, &message))
+            << message;
         return scenario.trace;
     }
 
