@@ -41,7 +41,7 @@ std::string ReadImage(const std::string& path, Image* image) {
 
 bool CanHold(const std::string& path, std::uint64_t sampleBytes, std::uint64_t ratio) {
     std::error_code failure;
-    const std::uint64_t bytes = std::filesystem::file_size(path, failure);
+    const std::uint64_t bytes = std::filesystem::file_size(MakePath(path), failure);
     return !failure && sampleBytes / ratio <= bytes;
 }
 

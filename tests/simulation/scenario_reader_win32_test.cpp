@@ -16,7 +16,8 @@ class TracePath : public ::testing::Test {
     ~TracePath() override { std::filesystem::current_path(before); }
 
     std::string Load(const std::string& drive, const std::string& trace) {
-        folder.WriteFile("scenario.json", R"({"cameras": [{}], "trace": ")" + trace + "\"}");
+        folder.WriteFile("scenario.json",
+                         R"({"cameras": [{"model": "SolvaneA1"}], "trace": ")" + trace + "\"}");
         std::string message;
         EXPECT_TRUE(Simulation::LoadScenario(drive + "scenario.json", &scenario, &message))
             << message;
