@@ -1,18 +1,22 @@
 #pragma once
 
+#include <cstdint>
 #include <filesystem>
 #include <fstream>
-#include <sstream>
 #include <string>
+#include <system_error>
 
 namespace ZV::Test {
 
-/// All of a file, "" when there is none. In one piece: a file that grows meanwhile is not followed.
+/// A file as long as it is now, "" when there is none: what is appended meanwhile is not followed.
 inline std::string ReadTextFile(const std::filesystem::path& path) {
-    const std::ifstream file(path, std::ios::binary);
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
+    std::error_code missing;
+    const std::uintmax_t size = std::filesystem::file_size(path, missing);
+    std::string text(missing ? 0 : size, '\0');
+    std::ifstream file(path, std::ios::binary);
+    file.read(text.data(), static_cast<std::streamsize>(text.size()));
+    text.resize(static_cast<std::size_t>(file.gcount()));
+    return text;
 }
 
 }  // namespace ZV::Test
