@@ -9,7 +9,8 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
-#include <filesystem>
+
+#include "simulation/regular_file.h"
 
 namespace ZV::Simulation {
 namespace {
@@ -24,9 +25,8 @@ constexpr std::uint64_t DeflateRatio = 1100;
 std::uint64_t CountPixelsHeld(const std::string& path, std::uint64_t ratio,
                               std::uint64_t pixelBits) {
     constexpr std::uint64_t BitsPerByte = 8;
-    std::error_code failure;
-    const std::uint64_t bytes = std::filesystem::file_size(path, failure);
-    return failure || pixelBits == 0 ? 0 : bytes * ratio * BitsPerByte / pixelBits;
+    const std::uint64_t bytes = MeasureRegularFile(path).value_or(0);
+    return pixelBits == 0 ? 0 : bytes * ratio * BitsPerByte / pixelBits;
 }
 
 /// Takes over the size and makes room, which a file that holds fewer pixels gets none of. False
@@ -268,10 +268,7 @@ constexpr ImageReader ImageReaders[] = {
 };
 
 const ImageReader* FindReader(const std::string& path, std::string* reason) {
-    // A pipe would be waited for, a device never ends.
-    std::error_code failure;
-    const bool isFile = std::filesystem::is_regular_file(path, failure);
-    std::FILE* file = isFile ? std::fopen(path.c_str(), "rb") : nullptr;
+    std::FILE* file = MeasureRegularFile(path) ? std::fopen(path.c_str(), "rb") : nullptr;
     if (file == nullptr) {
         *reason = "it cannot be opened";
         return nullptr;

@@ -6,6 +6,7 @@
 #include "simulation/configuration.h"
 #include "simulation/fault_reader.h"
 #include "simulation/json_node.h"
+#include "simulation/regular_file.h"
 
 namespace ZV::Simulation {
 namespace {
@@ -368,12 +369,9 @@ void ReadScenario(const JsonNode& node, Scenario* scenario) {
 }
 
 bool ReadFile(const std::string& path, std::string* text, std::string* message) {
-    // A pipe would be waited for, a device never ends.
-    std::error_code failure;
-    const bool isFile = std::filesystem::is_regular_file(path, failure);
     std::ifstream file;
-    if (isFile) file.open(path, std::ios::binary);
-    if (!isFile || !file) {
+    if (MeasureRegularFile(path)) file.open(path, std::ios::binary);
+    if (!file.is_open()) {
         *message = "'" + path + "' is neither a built-in scenario nor a file that can be read";
         return false;
     }
@@ -385,15 +383,21 @@ bool ReadFile(const std::string& path, std::string* text, std::string* message) 
     return false;
 }
 
+constexpr bool HasDrives = std::filesystem::path::preferred_separator != '/';
 /// What ends a folder's name, or a drive's where there are drives.
-constexpr const char* FolderEnds = std::filesystem::path::preferred_separator == '/' ? "/" : "/\\:";
+constexpr const char* FolderEnds = HasDrives ? "/\\:" : "/";
+
+bool HasRootOrDrive(const std::string& path) {
+    const bool hasDrive = HasDrives && path.size() > 1 && path[1] == ':';
+    return hasDrive || path.find_first_of(FolderEnds) == 0;
+}
 
 // Files that a scenario names lie beside it. Texts are joined, whatever code page their letters are
 // of.
 void ResolvePaths(const std::string& scenarioPath, Scenario* scenario) {
     const std::size_t folderLength = scenarioPath.find_last_of(FolderEnds) + 1;
     const auto resolve = [&](std::string* path) {
-        if (path->empty() || std::filesystem::path(*path).has_root_path()) return;
+        if (path->empty() || HasRootOrDrive(*path)) return;
         path->insert(0, scenarioPath, 0, folderLength);
     };
     resolve(&scenario->trace);

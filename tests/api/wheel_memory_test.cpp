@@ -36,6 +36,8 @@ TEST(WheelWithoutMemory, ForItsSemaphorePrintsTheTextOfTheLastErrorForEachFrame)
     const std::string text = HAL_ErrorMessage(HALSemaphoreFailed);
     ASSERT_FALSE(text.empty());
     testing::internal::CaptureStdout();
+    // To capture makes a file, which may change the last error.
+    SetLastPlatformError(PlatformErrorAccessDenied);
 
     const FilterResult first = wheel.Process(&in, &out);
     const FilterResult second = wheel.Process(&in, &out);
