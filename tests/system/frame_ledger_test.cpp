@@ -43,6 +43,7 @@ struct LedgerFault {
     std::uint64_t unseenMin = 0, unseenMax = 0;  ///< Exposed frames whose start never arrives.
     std::uint64_t restarts = 0;                  ///< Starts beside the first of a frame.
     std::uint64_t brokenOff = 0;                 ///< Frames that are not sent to their end.
+    std::uint64_t failedTriggersMax = 0;         ///< Requests for an exposure that may fail.
 };
 
 std::ostream& operator<<(std::ostream& stream, const LedgerFault& fault) {
@@ -71,8 +72,7 @@ constexpr LedgerFault Faults[] = {
     {"startWithoutTail", R"({"kind": "missingTail", "packet": 0, "frame": 5})", 0b110, 1, 1},
     {"overwritten", R"({"kind": "overwriteRequest", "frame": 6, "packet": 1})", 0b111, 0, 30},
     {"startInside", R"({"kind": "frameStart", "frame": 7, "packet": 2})", 0b111, 0, 0, 1},
-    // A trigger that falls into the reset is lost with the frame.
-    {"busReset", R"({"kind": "busReset", "frame": 8, "packet": 2})", 0b111, 0, 30, 0, 1},
+    {"busReset", R"({"kind": "busReset", "frame": 8, "packet": 2})", 0b111, 0, 30, 0, 1, 1},
     {"otherSettings", R"({"kind": "wrongPsn", "frame": 4, "count": 3})"},
 };
 
@@ -182,6 +182,15 @@ void ExpectWholeFramesWereSent(const CountingClient& client, const SimulationWor
     }
 }
 
+/// Asks until the camera has exposed. What falls into a reset of the bus fails and is not done.
+void Trigger(const CameraSession& session, std::uint64_t* failuresLeft) {
+    std::uint32_t result = Zentara_Trigger(session.GetHandle());
+    for (; result == zerrDriverFault && *failuresLeft > 0; --*failuresLeft) {
+        result = Zentara_Trigger(session.GetHandle());
+    }
+    ASSERT_ZERR(zerrNone, result);
+}
+
 TEST_P(FrameLedger, EveryExposedFrameIsDeliveredOrCounted) {
     const LedgerFault& fault = GetFault();
     if ((fault.versions >> GetVersion() & 1) == 0) return;  // another fault there
@@ -194,8 +203,9 @@ TEST_P(FrameLedger, EveryExposedFrameIsDeliveredOrCounted) {
     client.Queue(Queued);
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
 
+    std::uint64_t failuresLeft = fault.failedTriggersMax;
     for (std::uint64_t i = 0; i < Triggers; ++i) {
-        ASSERT_ZERR(zerrNone, Zentara_Trigger(session.GetHandle()));
+        ASSERT_NO_FATAL_FAILURE(Trigger(session, &failuresLeft));
     }
     ASSERT_TRUE(WaitUntil([&] {
         const ZentaraSimulationState state = session.world.GetState();
