@@ -17,7 +17,9 @@ namespace {
 
 constexpr std::size_t FramesMax = 8;
 constexpr std::uint32_t StatusLast = FrameRefused;
-constexpr std::uint16_t StrideMax = 1200;  // An input is no longer than some slots of this.
+/// Two blocks of the largest size, 1024 bytes, fit a payload.
+constexpr std::uint16_t StrideMax = 2200;
+constexpr std::uint16_t FreeLengthMax = 4096;
 
 /// What the camera is set to, and how the driver behaves.
 struct StreamPlan {
@@ -153,7 +155,8 @@ class HostileCamera {
 /// Packets in memory of exactly their length.
 void FeedFreeLengths(FuzzInput input, HostileCamera& camera) {
     while (!input.IsEmpty()) {
-        const std::span<const std::uint8_t> bytes = input.TakeBytes(input.TakeShort() % 2048);
+        const std::span<const std::uint8_t> bytes =
+            input.TakeBytes(input.TakeShort() % FreeLengthMax);
         const auto payload = std::make_unique<std::uint8_t[]>(bytes.size());
         std::copy(bytes.begin(), bytes.end(), payload.get());
         camera.Parse(payload.get(), static_cast<std::uint32_t>(bytes.size()));
