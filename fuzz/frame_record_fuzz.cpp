@@ -24,15 +24,22 @@ enum Switches : std::uint8_t {
     LeavesCamera = 4,  ///< The record names whatever the input says.
     InHasNoBuffer = 8,
     OutHasNoBuffer = 16,
-    HasAnySize = 32,  ///< The frames' sides are the input's words and not cut to what is small.
+    HasAnySize = 32,      ///< The frames' sides are the input's words and not cut to what is small.
+    HasWholeFields = 64,  ///< Every field and setting is as wide in the input as it is in memory.
 };
+
+/// A number of which most inputs give the low part alone: that is where the good values are.
+template <typename Low, typename Number>
+void TakeField(FuzzInput& input, std::uint8_t switches, Number* field) {
+    *field = (switches & HasWholeFields) != 0 ? input.Take<Number>() : input.Take<Low>();
+}
 
 /// A record's fields in the input's order. Sides that are not cut are rarely of any use.
 Zentara_Frame TakeRecord(FuzzInput& input, std::uint8_t switches, ZentaraHandle handle) {
     constexpr std::uint32_t SideMask = 0x7F;
     Zentara_Frame frame{};
     frame.bufferSize = input.TakeWord() % HeldBytesMax;
-    frame.format = input.TakeByte();
+    TakeField<std::uint8_t>(input, switches, &frame.format);
     frame.width = input.TakeWord();
     frame.height = input.TakeWord();
     if ((switches & HasAnySize) == 0) {
@@ -40,14 +47,14 @@ Zentara_Frame TakeRecord(FuzzInput& input, std::uint8_t switches, ZentaraHandle 
         frame.height &= SideMask;
     }
     frame.size = input.TakeWord();
-    frame.bits = input.TakeByte();
-    frame.bayerPattern = input.TakeByte();
+    TakeField<std::uint8_t>(input, switches, &frame.bits);
+    TakeField<std::uint8_t>(input, switches, &frame.bayerPattern);
     const ZentaraHandle named = (switches & LeavesCamera) != 0 ? input.TakeWide() : handle;
     std::memcpy(frame.privateCamera, &named, sizeof named);
-    frame.privateBinning = input.TakeByte();
-    frame.privateRealTime = input.TakeByte();
-    frame.privatePattern = input.TakeByte();
-    frame.privateFilled = input.TakeByte();
+    TakeField<std::uint8_t>(input, switches, &frame.privateBinning);
+    TakeField<std::uint8_t>(input, switches, &frame.privateRealTime);
+    TakeField<std::uint8_t>(input, switches, &frame.privatePattern);
+    TakeField<std::uint8_t>(input, switches, &frame.privateFilled);
     return frame;
 }
 
@@ -103,11 +110,13 @@ class Frames {
     bool isShared = false;
 };
 
-Zentara_Settings TakeSettings(FuzzInput& input, ZentaraHandle handle) {
+Zentara_Settings TakeSettings(FuzzInput& input, std::uint8_t switches, ZentaraHandle handle) {
     Zentara_Settings block{};
     (void)Zentara_ReadDefaultSettings(handle, &block);
     for (std::uint32_t key = KeyPostProcessFirst; key <= KeyPostProcessLast; ++key) {
-        (void)Zentara_SetParam(&block, key, input.TakeShort());
+        std::uint32_t value = 0;
+        TakeField<std::uint16_t>(input, switches, &value);
+        (void)Zentara_SetParam(&block, key, value);
     }
     return block;
 }
@@ -136,7 +145,7 @@ void RunOnce(FuzzInput input) {
     const std::uint8_t algorithm = input.TakeByte();
     Frames frames(input, switches, handle);
     if (!CanVouch(*frames.GetIn()) || !CanVouch(*frames.GetOut())) return;
-    Zentara_Settings block = TakeSettings(input, handle);
+    Zentara_Settings block = TakeSettings(input, switches, handle);
     frames.GiveBuffers(input);
     AskHelpers(*frames.GetIn());
     ZentaraResult result = zerrNone;
