@@ -12,6 +12,7 @@
 #include <string_view>
 
 #include "fits_names.h"
+#include "image_readers.h"
 #include "output.h"
 #include "paths.h"
 #include "zentara/zentara.h"
@@ -77,10 +78,7 @@ class FitsInput {
 /// The library of the format also unpacks what is compressed; only plain files get that far.
 std::string FindDoorProblem(const std::string& path) {
     constexpr std::string_view Begin = "SIMPLE  =";
-    std::error_code failure;
-    const auto status = std::filesystem::status(MakePath(path), failure);
-    if (!std::filesystem::exists(status)) return "there is no such file";
-    if (!std::filesystem::is_regular_file(status)) return "it is no file";
+    if (std::string problem = FindFileProblem(path); !problem.empty()) return problem;
     std::ifstream file(MakePath(path), std::ios::binary);
     if (!file) return "it cannot be opened";
     std::array<char, Begin.size()> begin{};

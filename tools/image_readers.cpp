@@ -6,6 +6,7 @@
 
 #include "fits_reader.h"
 #include "paths.h"
+#include "platform.h"
 #include "zentara/zentara.h"
 
 namespace ZentaraProgram {
@@ -32,11 +33,16 @@ std::string ReadImage(const std::string& path, Image* image) {
     const auto* reader = std::find_if(Readers.begin(), Readers.end(),
                                       [&](const ReaderRow& row) { return row.kind == kind; });
     if (reader == Readers.end()) return "the ending of the name is none of .fits, .tiff, .png";
+    const std::string problem = FindFileProblem(path);
+    return problem.empty() ? reader->read(path, image) : problem;
+}
+
+std::string FindFileProblem(const std::string& path) {
     std::error_code failure;
     const auto status = std::filesystem::status(MakePath(path), failure);
     if (!std::filesystem::exists(status)) return "there is no such file";
-    if (!std::filesystem::is_regular_file(status)) return "it is no file";
-    return reader->read(path, image);
+    const bool isFile = std::filesystem::is_regular_file(status) && !IsDevice(path);
+    return isFile ? std::string{} : "it is no file";
 }
 
 bool CanHold(const std::string& path, std::uint64_t sampleBytes, std::uint64_t ratio) {

@@ -16,6 +16,9 @@ std::string ReadImage(const std::string& path, Image* image);
 std::string ReadPng(const std::string& path, Image* image);
 std::string ReadTiff(const std::string& path, Image* image);
 
+/// Why nothing at `path` can be read as a file; an empty text for a file.
+std::string FindFileProblem(const std::string& path);
+
 /// Whether a file is long enough for `sampleBytes` bytes of samples, when one byte of it stands for
 /// `ratio` of them at most. Asked before there is room for the image.
 bool CanHold(const std::string& path, std::uint64_t sampleBytes, std::uint64_t ratio);

@@ -20,6 +20,9 @@ bool IsTerminal(std::FILE* stream);
 /// `fopen` for a name in UTF-8.
 std::FILE* OpenFile(const std::string& path, const char* mode);
 
+/// Whether a name that can be opened leads to a device, a console or a pipe. Waits for none.
+bool IsDevice(const std::string& path);
+
 /// A name as a library takes it that opens the file itself by the narrow functions of the system.
 std::string GetNarrowPath(const std::string& path);
 

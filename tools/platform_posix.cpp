@@ -1,4 +1,5 @@
 #include <dlfcn.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cstdint>
@@ -46,6 +47,11 @@ bool IsTerminal(std::FILE* stream) {
 
 std::FILE* OpenFile(const std::string& path, const char* mode) {
     return std::fopen(path.c_str(), mode);
+}
+
+bool IsDevice(const std::string& path) {
+    struct stat facts = {};
+    return stat(path.c_str(), &facts) == 0 && !S_ISREG(facts.st_mode) && !S_ISDIR(facts.st_mode);
 }
 
 std::string GetNarrowPath(const std::string& path) {

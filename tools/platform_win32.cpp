@@ -103,6 +103,16 @@ std::FILE* OpenFile(const std::string& path, const char* mode) {
     return _wfopen(Widen(path).c_str(), Widen(mode).c_str());
 }
 
+// By its name a device would be taken for a file; to open one does not wait.
+bool IsDevice(const std::string& path) {
+    const int descriptor = _wopen(Widen(path).c_str(), _O_RDONLY | _O_BINARY);
+    if (descriptor < 0) return false;
+    const auto handle = reinterpret_cast<HANDLE>(_get_osfhandle(descriptor));
+    const bool isDevice = GetFileType(handle) != FILE_TYPE_DISK;
+    _close(descriptor);
+    return isDevice;
+}
+
 // The program asks for UTF-8 as its code page; a system that is too old for that has one of its
 // own.
 std::string GetNarrowPath(const std::string& path) {

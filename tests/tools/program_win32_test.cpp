@@ -30,6 +30,18 @@ TEST(ProgramOnWindows, AnOlderFileThatAnotherProgramHoldsStaysAndNothingIsLeftBe
     EXPECT_THAT(folder.ListFiles(), ElementsAre("image.raw"));
 }
 
+// By their names they pass for files; a console would be waited for.
+TEST(ProgramOnWindows, ADeviceIsNoImageAndNoScenario) {
+    for (const char* device : {"NUL", "CON", "NUL.png", "CONIN$"}) {
+        const ProgramResult image = RunProgram({"histogram", std::string(device)});
+        const ProgramResult listed = RunProgram({"list", "--simulation", device});
+
+        EXPECT_NE(0, image.exitCode) << device;
+        EXPECT_EQ(2, listed.exitCode) << device;
+        EXPECT_THAT(listed.errors, HasSubstr("neither a built-in scenario nor a file")) << device;
+    }
+}
+
 TEST(ProgramOnWindows, AFileWithBackslashesInItsPathIsWritten) {
     const TemporaryFolder folder;
     std::string path = folder.GetPath("") + "\\image.fits";
