@@ -172,6 +172,7 @@ class Stream {
             progress.Show(sums, false);
         }
         Stop();
+        sums.Settle();
         progress.Show(sums, true);
         return code;
     }
@@ -255,6 +256,7 @@ void ReportAsJson(const StreamSums& sums) {
                              {"gaps", sums.gaps},
                              {"drops", sums.drops},
                              {"repeats", sums.repeats},
+                             {"misnumbered", sums.misnumbered},
                              {"damaged", sums.damaged},
                              {"errors", errors},
                              {"lastNumber", sums.GetLastNumber()},
@@ -271,6 +273,8 @@ void ReportAsText(const StreamSums& sums) {
         Print(fmt::format("{} frames with the error {}\n", count, GetFrameErrorName(code)));
     }
     if (sums.repeats > 0) Print(fmt::format("{} frames came twice\n", sums.repeats));
+    if (sums.misnumbered > 0)
+        Print(fmt::format("{} frames bear a wrong number\n", sums.misnumbered));
     if (sums.gaps > 0) Print(fmt::format("missing frames: {}\n", sums.DescribeMissing()));
     if (sums.files > 0) Print(fmt::format("{} files written\n", sums.files));
 }
@@ -281,6 +285,10 @@ void Report(const CommonOptions& common, const StreamSums& sums) {
     } else {
         ReportAsText(sums);
     }
+}
+
+bool HasLosses(const StreamSums& sums) {
+    return sums.damaged > 0 || sums.drops > 0 || sums.misnumbered > 0;
 }
 
 ExitCode CheckOptions(const StreamOptions& options) {
@@ -314,7 +322,7 @@ ExitCode RunStream(const CommonOptions& common, const StreamOptions& options) {
         return session.Judge(result == zerrNone ? ZentaraResult{zerrDriverFault} : result);
     }
     if (code != ExitDone) return code;
-    return stream.GetSums().damaged > 0 || stream.GetSums().drops > 0 ? ExitDamaged : ExitDone;
+    return HasLosses(stream.GetSums()) ? ExitDamaged : ExitDone;
 }
 
 }  // namespace ZentaraProgram

@@ -20,17 +20,23 @@ constexpr std::array ErrorRows{
     ErrorRow{zerrUnplugged, "unplugged"},
 };
 
+/// More of the 65536 numbers are taken for a step back.
+constexpr std::uint32_t ForwardMax = 32767;
+
+std::uint32_t GetStep(std::uint64_t from, std::uint16_t to) {
+    return static_cast<std::uint16_t>(to - from);
+}
+
+bool IsForward(std::uint32_t step) {
+    return step > 0 && step <= ForwardMax;
+}
+
 }  // namespace
 
 StreamSums::StreamSums(std::uint32_t frameNumbers) : numbersPerFrame(std::max(1U, frameNumbers)) {}
 
 void StreamSums::Count(const Zentara_Frame& frame) {
-    const auto step = static_cast<std::uint16_t>(frame.frameNumber - lastNumber);
-    if (!std::exchange(hasBegun, true)) {
-        lastNumber = frame.frameNumber;
-    } else {
-        CountGap(step);
-    }
+    CountNumber(frame.frameNumber);
     ++frames;
     bytes += frame.size;
     if (frame.errorCode == zerrNone) return;
@@ -38,7 +44,39 @@ void StreamSums::Count(const Zentara_Frame& frame) {
     ++errors[frame.errorCode];
 }
 
-void StreamSums::CountGap(std::uint32_t step) {
+void StreamSums::CountNumber(std::uint16_t number) {
+    if (!std::exchange(hasBegun, true)) {
+        lastNumber = number;
+        return;
+    }
+    if (doubted == number) {
+        ++repeats;
+        return;
+    }
+    if (const auto suspect = std::exchange(doubted, std::nullopt)) Judge(*suspect, number);
+    const std::uint32_t step = GetStep(lastNumber, number);
+    if (step > numbersPerFrame) {
+        doubted = number;
+    } else {
+        Advance(step);
+    }
+}
+
+/// A jump is believed as soon as the next frame goes on from it; one back, which could as well be a
+/// jump ahead by most of the numbers, only if that frame does not go on from the one before it.
+void StreamSums::Judge(std::uint16_t number, std::uint16_t next) {
+    const std::uint32_t jump = GetStep(lastNumber, number);
+    const bool goesOn = IsForward(GetStep(number, next));
+    const bool goesOnFromLast = IsForward(GetStep(lastNumber, next));
+    const bool isWrong = IsForward(jump) ? !goesOn && goesOnFromLast : !goesOn || goesOnFromLast;
+    if (isWrong) {
+        ++misnumbered;
+    } else {
+        Advance(jump);
+    }
+}
+
+void StreamSums::Advance(std::uint32_t step) {
     if (step == 0) {
         ++repeats;
         return;
@@ -49,11 +87,23 @@ void StreamSums::CountGap(std::uint32_t step) {
     if (lost == 0) return;
     ++gaps;
     drops += lost;
-    if (missing.size() < MissingMax) missing.push_back({former + 1, lastNumber - 1});
+    if (missing.size() >= MissingMax) return;
+    missing.push_back({former + 1, former + std::uint64_t{lost} * numbersPerFrame});
+}
+
+void StreamSums::Settle() {
+    const auto suspect = std::exchange(doubted, std::nullopt);
+    if (!suspect) return;
+    const std::uint32_t jump = GetStep(lastNumber, *suspect);
+    if (IsForward(jump)) {
+        Advance(jump);
+    } else {
+        ++misnumbered;
+    }
 }
 
 void StreamSums::ForgetCounts() {
-    frames = bytes = damaged = gaps = drops = files = repeats = 0;
+    frames = bytes = damaged = gaps = drops = files = repeats = misnumbered = 0;
     missing.clear();
     errors.clear();
 }

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <map>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -9,7 +10,7 @@
 
 namespace ZentaraProgram {
 
-/// Numbers of frames that did not come, first and last.
+/// Numbers under which no frame came, first and last.
 struct MissingFrames {
     std::uint64_t first = 0, last = 0;
 
@@ -20,7 +21,10 @@ struct MissingFrames {
 ///
 /// The camera numbers its frames in 16 bits; here they go on counting beyond 65535. A loss shows
 /// between two frames that came: what was lost before the first and behind the last is unknown, and
-/// so are whole rounds of the number.
+/// so are whole rounds of the number. A number that jumps is doubted until the next frame, or
+/// `Settle`: one that the next frame does not go on from was wrong, as a damaged header makes it.
+/// Its frame then counts as `misnumbered`, and as missing the number that none came under. Only a
+/// first number that is wrong shows as a gap.
 class StreamSums {
   public:
     /// Runs of missing frames that are kept; of further ones the count alone.
@@ -31,12 +35,15 @@ class StreamSums {
 
     void Count(const Zentara_Frame& frame);
 
-    /// Counts from 0 again; the numbers go on.
+    /// Ends the doubt about the last number; no frame follows.
+    void Settle();
+
+    /// Counts from 0 again; the numbers go on, and so does a doubt.
     void ForgetCounts();
 
     [[nodiscard]] double GetRate() const;
     [[nodiscard]] double GetMegabytesPerSecond() const;
-    /// Of the frame that came last; 0 before the first.
+    /// Of the last frame but those whose number is doubted or wrong; 0 before the first.
     [[nodiscard]] std::uint64_t GetLastNumber() const { return lastNumber; }
     [[nodiscard]] const std::vector<MissingFrames>& GetMissing() const { return missing; }
     /// Delivered frames of each error code but 0.
@@ -45,15 +52,19 @@ class StreamSums {
     [[nodiscard]] std::string DescribeMissing() const;
 
     std::uint64_t frames = 0, bytes = 0, damaged = 0, gaps = 0, drops = 0, files = 0;
-    std::uint64_t repeats = 0;  ///< Frames under the number of the one before.
+    std::uint64_t repeats = 0;      ///< Frames under the number of the one before.
+    std::uint64_t misnumbered = 0;  ///< Frames under a number that cannot be theirs.
     double seconds = 0;
 
   private:
-    void CountGap(std::uint32_t step);
+    void CountNumber(std::uint16_t number);
+    void Judge(std::uint16_t number, std::uint16_t next);
+    void Advance(std::uint32_t step);
 
     std::uint32_t numbersPerFrame;
     std::uint64_t lastNumber = 0;
     bool hasBegun = false;
+    std::optional<std::uint16_t> doubted;
     std::vector<MissingFrames> missing;
     std::map<std::uint32_t, std::uint64_t> errors;
 };

@@ -477,6 +477,22 @@ TEST(Program, AStreamNamesTheFramesThatAreMissingAndTheErrorsOfTheOthers) {
     EXPECT_EQ(12, report["frames"]);
 }
 
+TEST(Program, AStreamTakesNoWrongNumberForAGap) {
+    const TracedScenario scenario(
+        R"({"sensor": {"width": 64, "height": 48}, "streamingVersion": 1,
+            "faults": [{"kind": "corruptPacket", "packet": 0, "offset": 8, "bytes": 2,
+                        "frame": 5}]})");
+
+    const ProgramResult result =
+        RunProgram({"stream", "0", "--simulation", scenario.GetName(), "--count", "12", "--json"});
+    const json report = json::parse(result.output);
+
+    EXPECT_EQ(6, result.exitCode) << result.errors;
+    EXPECT_EQ(1, report["misnumbered"]);
+    EXPECT_LT(report["lastNumber"], 1000) << report.dump();
+    EXPECT_LT(report["drops"], 1000);
+}
+
 TEST(Program, TheTextsOfTheLibraryDoNotMixWithItsOwnOutput) {
     const ProgramResult result = RunProgram({"list", "--simulation", "model:Unknown", "--json"});
 

@@ -21,6 +21,7 @@ StreamSums CountNumbers(std::initializer_list<std::uint32_t> numbers,
                         std::uint32_t numbersPerFrame = 1) {
     StreamSums sums(numbersPerFrame);
     for (const std::uint32_t number : numbers) sums.Count(MakeFrame(number));
+    sums.Settle();
     return sums;
 }
 
@@ -44,12 +45,67 @@ TEST(StreamSumsTest, EachGapNamesItsFrames) {
 
 TEST(StreamSumsTest, TheNumberGoesOnBeyondItsSixteenBits) {
     const StreamSums whole = CountNumbers({65534, 65535, 0, 1});
-    const StreamSums broken = CountNumbers({65533, 1, 65535, 3});
+    const StreamSums broken = CountNumbers({65533, 1, 32768, 65535, 3});
 
     EXPECT_EQ(0U, whole.gaps);
     EXPECT_EQ(65537U, whole.GetLastNumber());
-    EXPECT_EQ(3U + 65533U + 3U, broken.drops);
-    EXPECT_EQ("65534-65536, 65538-131070, 131072-131074", broken.DescribeMissing());
+    EXPECT_EQ(3U + 32766U + 32766U + 3U, broken.drops);
+    EXPECT_EQ("65534-65536, 65538-98303, 98305-131070, 131072-131074", broken.DescribeMissing());
+}
+
+TEST(StreamSumsTest, AWrongNumberIsNoGapButItsOwnNumberIsMissing) {
+    const StreamSums ahead = CountNumbers({3, 4, 900, 6, 7});
+    const StreamSums back = CountNumbers({3, 4, 65530, 6, 7});
+
+    for (const StreamSums& sums : {ahead, back}) {
+        EXPECT_EQ(1U, sums.misnumbered);
+        EXPECT_EQ(1U, sums.drops);
+        EXPECT_EQ("5", sums.DescribeMissing());
+        EXPECT_EQ(7U, sums.GetLastNumber());
+    }
+}
+
+TEST(StreamSumsTest, AWrongNumberBesideALossHidesNothing) {
+    const StreamSums sums = CountNumbers({4, 6, 2, 9, 10});
+
+    EXPECT_EQ(1U, sums.misnumbered);
+    EXPECT_EQ("5, 7-8", sums.DescribeMissing());
+}
+
+TEST(StreamSumsTest, TwoFramesInTheOtherOrderAreNoRoundOfTheNumber) {
+    const StreamSums sums = CountNumbers({4, 6, 5, 7});
+
+    EXPECT_EQ(1U, sums.misnumbered);
+    EXPECT_EQ(1U, sums.drops);
+    EXPECT_EQ("6", sums.DescribeMissing()) << "it came in no place of its own";
+}
+
+TEST(StreamSumsTest, AGapOfMostOfTheNumbersIsBelievedOnceTheStreamGoesOnBehindIt) {
+    const StreamSums sums = CountNumbers({4, 50000, 50001, 50002});
+
+    EXPECT_EQ(0U, sums.misnumbered);
+    EXPECT_EQ(49995U, sums.drops);
+    EXPECT_EQ("5-49999", sums.DescribeMissing());
+}
+
+TEST(StreamSumsTest, TheLastNumberIsBelievedAheadAndNotBack) {
+    const StreamSums ahead = CountNumbers({4, 7});
+    const StreamSums back = CountNumbers({4, 2});
+
+    EXPECT_EQ("5-6", ahead.DescribeMissing());
+    EXPECT_EQ(0U, back.gaps);
+    EXPECT_EQ(1U, back.misnumbered);
+}
+
+TEST(StreamSumsTest, ADoubtOutlivesTheForgettingOfTheCounts) {
+    StreamSums sums(1);
+    for (const std::uint32_t number : {3U, 4U, 900U}) sums.Count(MakeFrame(number));
+
+    sums.ForgetCounts();
+    for (const std::uint32_t number : {6U, 7U}) sums.Count(MakeFrame(number));
+
+    EXPECT_EQ(1U, sums.misnumbered);
+    EXPECT_EQ("5", sums.DescribeMissing());
 }
 
 TEST(StreamSumsTest, AGapIsSeenAcrossTheForgettingOfTheCounts) {
@@ -57,16 +113,17 @@ TEST(StreamSumsTest, AGapIsSeenAcrossTheForgettingOfTheCounts) {
 
     sums.ForgetCounts();
     sums.Count(MakeFrame(8));
+    sums.Settle();
 
     EXPECT_EQ(1U, sums.frames);
     EXPECT_EQ("7", sums.DescribeMissing());
 }
 
 TEST(StreamSumsTest, AFrameThatComesTwiceIsNoGap) {
-    const StreamSums sums = CountNumbers({4, 4, 5});
+    const StreamSums sums = CountNumbers({4, 4, 5, 7, 7, 8});
 
-    EXPECT_EQ(1U, sums.repeats);
-    EXPECT_EQ(0U, sums.gaps);
+    EXPECT_EQ(2U, sums.repeats);
+    EXPECT_EQ("6", sums.DescribeMissing());
 }
 
 TEST(StreamSumsTest, TheExposuresOfOneFrameAreNoGap) {
@@ -74,7 +131,7 @@ TEST(StreamSumsTest, TheExposuresOfOneFrameAreNoGap) {
 
     EXPECT_EQ(1U, sums.gaps);
     EXPECT_EQ(1U, sums.drops);
-    EXPECT_EQ("10-14", sums.DescribeMissing());
+    EXPECT_EQ("10-12", sums.DescribeMissing()) << "13 to 15 are the exposures of frame 15";
 }
 
 TEST(StreamSumsTest, DamagedFramesAreCountedByTheirCode) {
@@ -94,6 +151,7 @@ TEST(StreamSumsTest, DamagedFramesAreCountedByTheirCode) {
 TEST(StreamSumsTest, AStreamFullOfGapsKeepsALimitedList) {
     StreamSums sums(1);
     for (std::uint32_t i = 0; i <= StreamSums::MissingMax + 5; ++i) sums.Count(MakeFrame(2 * i));
+    sums.Settle();
 
     EXPECT_EQ(StreamSums::MissingMax, sums.GetMissing().size());
     EXPECT_EQ(StreamSums::MissingMax + 5, sums.gaps);
