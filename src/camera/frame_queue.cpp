@@ -69,11 +69,6 @@ tStFrameInfo* FrameQueue::FindHeld() const {
     return nullptr;
 }
 
-std::size_t FrameQueue::GetCount() const {
-    const std::lock_guard hold(leafMutex);
-    return count;
-}
-
 void FrameQueue::MarkAllInvalid() {
     const std::lock_guard hold(leafMutex);
     for (std::size_t place = 0; place < count; ++place) frames[place]->valid = false;

@@ -33,7 +33,10 @@ class FrameQueue {
     tStFrameInfo* TakeAny();
     /// The frame that the stream layer holds, or null. It stays in the queue.
     tStFrameInfo* FindHeld() const;
-    std::size_t GetCount() const;
+    std::size_t GetCount() const {
+        const std::lock_guard hold(leafMutex);
+        return count;
+    }
     void MarkAllInvalid();
 
   private:

@@ -29,7 +29,8 @@ using Clock = std::chrono::steady_clock;
 using namespace std::chrono_literals;
 
 constexpr auto MeasuringStep = 250ms;
-constexpr std::uint32_t CamerasMax = 64;
+constexpr std::uint32_t CamerasMax = 10;  // as many as a listing gives
+constexpr auto BeginLimit = 60s;
 
 std::atomic<bool> isInterrupted{false};
 /// The library's own words go to standard output; they are not looked at here.
@@ -149,9 +150,13 @@ class Soak {
         return true;
     }
 
-    void Watch() {
+    /// False when a camera gives no frame at all.
+    bool AwaitAll() {
         begin = Clock::now();
-        while (!isInterrupted && !DoAllStream()) Test::Disturb(MeasuringStep);
+        return Test::WaitUntil([this] { return isInterrupted || DoAllStream(); }, BeginLimit);
+    }
+
+    void Watch() {
         begin = Clock::now();
         const auto end = begin + std::chrono::seconds(options.seconds);
         auto minute = begin + std::chrono::seconds(options.minuteSeconds);
@@ -165,8 +170,9 @@ class Soak {
         }
     }
 
-    /// 0 if nothing grew, every frame is accounted for and no call failed without a reason.
-    int End() {
+    /// 0 if all cameras streamed, nothing grew, every frame is accounted for and no call failed
+    /// without a reason.
+    int End(bool haveAllStreamed) {
         isOver = true;
         for (std::thread& thread : threads) thread.join();
         Zentara_ReleaseDriver();
@@ -174,8 +180,10 @@ class Soak {
         const SoakSums sums = AddUp();
         if (!judge.IsSteady()) (void)std::fputs("memory, threads or handles have grown\n", output);
         if (sums.unaccounted != 0) (void)std::fputs("frames are missing without a count\n", output);
+        if (!haveAllStreamed) (void)std::fputs("a camera has not begun to stream\n", output);
         if (sums.failures != 0) (void)std::fputs("calls have failed\n", output);
-        return judge.IsSteady() && sums.unaccounted == 0 && sums.failures == 0 ? 0 : 1;
+        const bool isGood = haveAllStreamed && judge.IsSteady() && sums.unaccounted == 0;
+        return isGood && sums.failures == 0 ? 0 : 1;
     }
 
   private:
@@ -218,7 +226,7 @@ int Run(int count, char** arguments) {
     Options options;
     if (!ReadOptions(count, arguments, &options)) {
         std::fputs(
-            "zentara-soak [--seconds N] [--cameras N] [--faults RATE] [--state FILE] "
+            "zentara-soak [--seconds N] [--cameras 1-10] [--faults RATE] [--state FILE] "
             "[--minute SECONDS]\n",
             stderr);
         return 2;
@@ -237,8 +245,9 @@ int Run(int count, char** arguments) {
         (void)std::fputs("the cameras cannot be listed\n", output);
         return 2;
     }
-    soak.Watch();
-    return soak.End();
+    const bool haveAllStreamed = soak.AwaitAll();
+    if (haveAllStreamed) soak.Watch();
+    return soak.End(haveAllStreamed);
 }
 
 }  // namespace

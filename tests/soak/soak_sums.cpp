@@ -15,25 +15,17 @@ struct SumRow {
 };
 
 constexpr std::array Rows{
-    SumRow{"seconds", &SoakSums::seconds},
-    SumRow{"frames", &SoakSums::frames},
-    SumRow{"bytes", &SoakSums::bytes},
-    SumRow{"gaps", &SoakSums::gaps},
-    SumRow{"missing", &SoakSums::missing},
-    SumRow{"damaged", &SoakSums::damaged},
-    SumRow{"repeats", &SoakSums::repeats},
-    SumRow{"begun", &SoakSums::begun},
-    SumRow{"dropped", &SoakSums::dropped},
-    SumRow{"refused", &SoakSums::refused},
-    SumRow{"bad", &SoakSums::bad},
-    SumRow{"cleared", &SoakSums::cleared},
-    SumRow{"withoutTaker", &SoakSums::withoutTaker},
-    SumRow{"unaccounted", &SoakSums::unaccounted},
-    SumRow{"changes", &SoakSums::changes},
-    SumRow{"restarts", &SoakSums::restarts},
-    SumRow{"reopens", &SoakSums::reopens},
-    SumRow{"unplugs", &SoakSums::unplugs},
-    SumRow{"failures", &SoakSums::failures},
+    SumRow{"seconds", &SoakSums::seconds},   SumRow{"frames", &SoakSums::frames},
+    SumRow{"bytes", &SoakSums::bytes},       SumRow{"gaps", &SoakSums::gaps},
+    SumRow{"missing", &SoakSums::missing},   SumRow{"damaged", &SoakSums::damaged},
+    SumRow{"repeats", &SoakSums::repeats},   SumRow{"misnumbered", &SoakSums::misnumbered},
+    SumRow{"begun", &SoakSums::begun},       SumRow{"dropped", &SoakSums::dropped},
+    SumRow{"refused", &SoakSums::refused},   SumRow{"bad", &SoakSums::bad},
+    SumRow{"cleared", &SoakSums::cleared},   SumRow{"withoutTaker", &SoakSums::withoutTaker},
+    SumRow{"waiting", &SoakSums::waiting},   SumRow{"unaccounted", &SoakSums::unaccounted},
+    SumRow{"changes", &SoakSums::changes},   SumRow{"changesDropped", &SoakSums::changesDropped},
+    SumRow{"restarts", &SoakSums::restarts}, SumRow{"reopens", &SoakSums::reopens},
+    SumRow{"unplugs", &SoakSums::unplugs},   SumRow{"failures", &SoakSums::failures},
 };
 
 const SumRow* FindRow(const std::string& name) {

@@ -9,10 +9,15 @@ namespace ZV::Soak {
 struct SoakSums {
     std::uint64_t seconds = 0;
     std::uint64_t frames = 0, bytes = 0, gaps = 0, missing = 0, damaged = 0, repeats = 0;
+    std::uint64_t misnumbered = 0;
     /// Of the engine: what became of the frames that no client saw.
     std::uint64_t begun = 0, dropped = 0, refused = 0, bad = 0, cleared = 0, withoutTaker = 0;
-    std::uint64_t unaccounted = 0;  ///< Begun and neither delivered nor counted: a fault.
-    std::uint64_t changes = 0, restarts = 0, reopens = 0, unplugs = 0;
+    std::uint64_t waiting = 0;  ///< In the engine's queue when the camera was closed.
+    std::uint64_t unaccounted =
+        0;                      ///< Begun, or delivered to the client, without a count: a fault.
+    std::uint64_t changes = 0;  ///< Queued settings that were sent.
+    std::uint64_t changesDropped = 0;  ///< Queued and never sent, as a last entry is.
+    std::uint64_t restarts = 0, reopens = 0, unplugs = 0;
     std::uint64_t failures = 0;  ///< Calls that failed with no fault to explain it.
 
     SoakSums& operator+=(const SoakSums& other);

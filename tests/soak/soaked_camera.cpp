@@ -4,9 +4,10 @@
 #include <chrono>
 #include <cstdio>
 
-#include "camera/camera.h"
+#include "camera/morvane_fw_camera.h"
 #include "simulation/zentara_simulation.h"
 #include "support/settings_words.h"
+#include "support/wait_until.h"
 
 namespace ZV::Soak {
 namespace {
@@ -20,8 +21,18 @@ constexpr std::uint64_t FramesPerReopen = 1500;
 constexpr std::uint64_t FramesPerUnplug = 4000;
 constexpr auto FrameLimit = 30s;
 constexpr auto ListLimit = 10s;
-/// One frame of two that wait stays in the queue when the stream ends, for each stream.
-constexpr std::uint64_t LeftInQueueMax = 2;
+/// Frames that wait for the run loop.
+struct WaitingFrames : MorvaneFWCamera {
+    static std::uint64_t Count(const ZCamera& camera) {
+        return (static_cast<const MorvaneFWCamera&>(camera).*&WaitingFrames::streaming)
+            .frameQueue.GetCount();
+    }
+};
+
+std::uint64_t SumFates(const StreamCounters& counters) {
+    return counters.delivered.GetSum() + counters.heldBack.Get() + counters.dropped.Get() +
+           counters.bad.Get() + counters.cleared.Get();
+}
 
 }  // namespace
 
@@ -47,12 +58,16 @@ void SoakedCamera::Run(const std::atomic<bool>& isOver) {
     if (!Open()) return;
     QueueAll();
     BeginStream();
-    while (!isOver) TakeTurn();
+    while (!isOver) {
+        if (!TakeTurn()) return;
+    }
     EndStream(false);
+    Expect(Zentara_Abort(handle));  // no callback any more: what has come is counted
     Close();
 }
 
-void SoakedCamera::TakeTurn() {
+/// False when the camera is lost to the soak.
+bool SoakedCamera::TakeTurn() {
     Slot* slot = Take();
     if (slot == nullptr) {
         std::fprintf(stderr, "camera %u: no frame came\n", position);
@@ -63,20 +78,28 @@ void SoakedCamera::TakeTurn() {
     ++served;
     if (served % FramesPerChange == 0) QueueChange();
     if (served % FramesPerUnplug == 0) {
+        isPlugged = false;
         (void)ZentaraSimulation_Unplug(position);
-        Reopen();
-        const std::lock_guard hold(sumsMutex);
-        ++sums.unplugs;
-    } else if (served % FramesPerReopen == 0) {
-        Reopen();
-        const std::lock_guard hold(sumsMutex);
-        ++sums.reopens;
-    } else if (served % FramesPerRestart == 0) {
+        {
+            const std::lock_guard hold(sumsMutex);
+            ++sums.unplugs;
+        }
+        return Reopen();
+    }
+    if (served % FramesPerReopen == 0) {
+        {
+            const std::lock_guard hold(sumsMutex);
+            ++sums.reopens;
+        }
+        return Reopen();
+    }
+    if (served % FramesPerRestart == 0) {
         EndStream(false);
         BeginStream();
         const std::lock_guard hold(sumsMutex);
         ++sums.restarts;
     }
+    return true;
 }
 
 SoakedCamera::Slot* SoakedCamera::Take() {
@@ -102,20 +125,26 @@ void SoakedCamera::CountStream() {
     sums.missing += stream.drops;
     sums.damaged += stream.damaged;
     sums.repeats += stream.repeats;
+    sums.misnumbered += stream.misnumbered;
     stream.ForgetCounts();
 }
 
 void SoakedCamera::Receive(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t) {
     auto& slot = *reinterpret_cast<Slot*>(static_cast<std::uintptr_t>(userPrivate));
+    ++slot.camera->received;
     const std::lock_guard hold(slot.camera->doneMutex);
     slot.camera->done.push_back(&slot);
     slot.camera->arrived.notify_one();
 }
 
-void SoakedCamera::ReceiveChange(std::uint64_t userPrivate, std::uint32_t, std::uint32_t,
+/// The sending of a change fails when the camera is gone.
+void SoakedCamera::ReceiveChange(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
                                  std::uint32_t) {
-    reinterpret_cast<SoakedCamera*>(static_cast<std::uintptr_t>(userPrivate))->isChangeQueued =
-        false;
+    const auto& change = *reinterpret_cast<Change*>(static_cast<std::uintptr_t>(userPrivate));
+    SoakedCamera& camera = *change.camera;
+    if (change.opening != camera.opening) return;
+    ++camera.changesMade;
+    if (camera.isPlugged) camera.Expect(errorCode);
 }
 
 void SoakedCamera::Queue(Slot& slot) {
@@ -127,14 +156,11 @@ void SoakedCamera::QueueAll() {
     for (Slot& slot : slots) Queue(slot);
 }
 
-/// A change is one frame's neighbour in the queue; a bus reset may make it fail.
 void SoakedCamera::QueueChange() {
-    if (isChangeQueued.exchange(true)) return;
-    Test::SetWide(change, zprm64Exposure, 100000 * (1 + random() % 20));
-    Expect(Zentara_QueueSettings(handle, &change, ReceiveChange, zcbFrameDone,
-                                 reinterpret_cast<std::uintptr_t>(this), 0));
-    const std::lock_guard hold(sumsMutex);
-    ++sums.changes;
+    Change& change = changes.emplace_back(Change{this, opening, settings});
+    Test::SetWide(change.settings, zprm64Exposure, 100000 * (1 + random() % 20));
+    Expect(Zentara_QueueSettings(handle, &change.settings, ReceiveChange, zcbFrameDone,
+                                 reinterpret_cast<std::uintptr_t>(&change), 0));
 }
 
 bool SoakedCamera::Open() {
@@ -148,8 +174,13 @@ bool SoakedCamera::Open() {
         auto* const found = std::find_if(
             items.data(), last, [this](const auto& item) { return item.uniqueId == uniqueId; });
         if (found == last) continue;
-        Expect(Zentara_OpenCamera(found->cameraId, &handle));
-        Expect(Zentara_ReadSettingsFromCam(handle, &change));
+        const ZentaraResult opened = Zentara_OpenCamera(found->cameraId, &handle);
+        if (opened != zerrNone) {
+            handle = {};
+            Expect(opened);
+            return false;
+        }
+        Expect(Zentara_ReadSettingsFromCam(handle, &settings));
         const auto bytes = reinterpret_cast<ZCamera*>(handle)->GetImageSize();
         for (Slot& slot : slots) {
             slot.pixels.assign(bytes, 0);
@@ -165,27 +196,38 @@ bool SoakedCamera::Open() {
 }
 
 void SoakedCamera::Close() {
-    CountStream();
     CountEngine();
+    CountChanges();
     const std::lock_guard listing(listMutex);
     Expect(Zentara_CloseCamera(handle));
+    handle = {};
 }
 
-/// Every frame that began is delivered or counted, or waits in the queue.
+/// Every frame that began is delivered or counted, or waits in the queue, and the client was called
+/// for each that found a taker. A frame that is at work has a moment to come to its count.
 void SoakedCamera::CountEngine() {
-    const StreamCounters& counters = reinterpret_cast<ZCamera*>(handle)->GetStreamCounters();
-    const std::uint64_t fates = counters.delivered.GetSum() + counters.heldBack.Get() +
-                                counters.dropped.Get() + counters.bad.Get() +
-                                counters.cleared.Get();
-    const std::uint64_t begun = counters.begun.Get();
+    ZCamera& camera = *reinterpret_cast<ZCamera*>(handle);
+    const StreamCounters& counters = camera.GetStreamCounters();
+    const bool isAccounted = Test::WaitUntil([&] {
+        return counters.begun.Get() == SumFates(counters) + WaitingFrames::Count(camera) &&
+               counters.delivered.GetSum() == counters.withoutTaker.GetSum() + received;
+    });
     const std::lock_guard hold(sumsMutex);
-    sums.begun += begun;
+    sums.begun += counters.begun.Get();
     sums.dropped += counters.dropped.Get();
     sums.refused += counters.refused.Get();
     sums.bad += counters.bad.Get();
     sums.cleared += counters.cleared.Get();
     sums.withoutTaker += counters.withoutTaker.GetSum();
-    if (fates > begun || begun - fates > LeftInQueueMax) ++sums.unaccounted;
+    sums.waiting += WaitingFrames::Count(camera);
+    if (!isAccounted) ++sums.unaccounted;
+}
+
+/// Behind an abort: what has not been told by now never will be.
+void SoakedCamera::CountChanges() {
+    const std::lock_guard hold(sumsMutex);
+    sums.changes += changesMade;
+    sums.changesDropped += changes.size() - changesMade;
 }
 
 void SoakedCamera::BeginStream() {
@@ -197,11 +239,12 @@ void SoakedCamera::BeginStream() {
 void SoakedCamera::EndStream(bool isExpectedToFail) {
     const ZentaraResult stopped = Zentara_SetStreaming(handle, 0);
     if (!isExpectedToFail) Expect(stopped);
+    stream.Settle();
     CountStream();
 }
 
 /// Also of a camera that was unplugged: it is plugged in again before it is listed.
-void SoakedCamera::Reopen() {
+bool SoakedCamera::Reopen() {
     EndStream(true);
     (void)Zentara_Abort(handle);  // what is queued is ours again
     Close();
@@ -209,11 +252,16 @@ void SoakedCamera::Reopen() {
         const std::lock_guard hold(doneMutex);
         done.clear();
     }
-    isChangeQueued = false;
+    ++opening;
+    formerChanges.swap(changes);
+    changes.clear();
+    changesMade = received = 0;
     (void)ZentaraSimulation_Plug(position);
-    if (!Open()) return;
+    isPlugged = true;
+    if (!Open()) return false;
     QueueAll();
     BeginStream();
+    return true;
 }
 
 }  // namespace ZV::Soak

@@ -27,7 +27,7 @@ class SoakedCamera {
     SoakedCamera(const SoakedCamera&) = delete;
     SoakedCamera& operator=(const SoakedCamera&) = delete;
 
-    /// Until `isOver`; then the camera is closed.
+    /// Until `isOver`, or until the camera cannot be opened; then it is closed.
     void Run(const std::atomic<bool>& isOver);
     /// So far. Thread-safe.
     [[nodiscard]] SoakSums GetSums() const;
@@ -41,32 +41,46 @@ class SoakedCamera {
         std::vector<std::uint8_t> pixels;
     };
 
+    /// Settings in the queue. They are the library's until the change is made or dropped, of which
+    /// the latter is not told: none is used twice.
+    struct Change {
+        SoakedCamera* camera = nullptr;
+        std::uint32_t opening = 0;
+        Zentara_Settings settings{};
+    };
+
     static void Receive(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
                         std::uint32_t flags);
     static void ReceiveChange(std::uint64_t userPrivate, std::uint32_t userData,
                               std::uint32_t errorCode, std::uint32_t flags);
     bool Open();
     void Close();
-    void Reopen();
+    bool Reopen();
     void BeginStream();
     void EndStream(bool isExpectedToFail);
     void QueueAll();
     void Queue(Slot& slot);
     void QueueChange();
     void Serve(Slot& slot);
-    void TakeTurn();
+    bool TakeTurn();
     Slot* Take();
     void CountEngine();
     void CountStream();
+    void CountChanges();
     void Expect(ZentaraResult result);
 
     const std::uint32_t position, uniqueId;
     std::mutex& listMutex;
     std::mt19937 random;
-    ZentaraHandle handle{};
+    ZentaraHandle handle{};  ///< 0 while the camera is not open.
     std::array<Slot, FrameCount> slots;
-    Zentara_Settings change{};
-    std::atomic<bool> isChangeQueued{false};
+    Zentara_Settings settings{};
+    /// Of this opening and of the one before, which a callback may outlive.
+    std::deque<Change> changes, formerChanges;
+    std::atomic<std::uint64_t> changesMade{0};  ///< Of this opening.
+    std::atomic<std::uint64_t> received{0};     ///< Frames of this opening.
+    std::atomic<std::uint32_t> opening{0};
+    std::atomic<bool> isPlugged{true};
     std::uint64_t served = 0;
     ZentaraProgram::StreamSums stream{1};
 
