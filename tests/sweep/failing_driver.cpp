@@ -4,6 +4,8 @@
 #include <atomic>
 #include <chrono>
 #include <condition_variable>
+#include <cstddef>
+#include <cstring>
 #include <mutex>
 #include <thread>
 
@@ -55,6 +57,7 @@ struct DriverState {
     std::atomic<std::uint32_t> failedCode{0};
     std::uint32_t openDevices = 0;
     std::uint32_t reclaimed = 0;
+    bool hasEnded = false;
     ZentaraSimulationState stateAtEnd{};
     HeldRequest held;
     std::thread lateThread;
@@ -86,6 +89,14 @@ bool WaitsForEvent(std::uint32_t code) {
     return GetSeries(code) != RequestSeries::Calls || code == FW_IOCTL_NOTIFY_WAIT;
 }
 
+std::uint32_t GetAddress(const KernelRequest& request) {
+    constexpr std::size_t Offset = offsetof(AsyncReadRecord, offsetLow);
+    std::uint32_t address = 0;
+    if (request.code != FW_IOCTL_ASYNC_WRITE || request.inputBytes < Offset + 4) return 0;
+    std::memcpy(&address, static_cast<const std::uint8_t*>(request.input) + Offset, 4);
+    return address;
+}
+
 /// What this request meets.
 RequestFailure Count(const KernelRequest& request) {
     DriverState& state = GetState();
@@ -93,7 +104,7 @@ RequestFailure Count(const KernelRequest& request) {
     if (!state.isCounting) return RequestFailure::None;
     const RequestSeries series = GetSeries(request.code);
     auto& counted = state.counted[static_cast<std::size_t>(series)];
-    counted.push_back({request.code, MayPend(request)});
+    counted.push_back({request.code, MayPend(request), GetAddress(request)});
     if (series != state.series || counted.size() != state.number) return RequestFailure::None;
     state.failedCode = request.code;
     return state.failure;
@@ -265,6 +276,7 @@ void End() {
     {
         const std::lock_guard hold(state.mutex);
         state.stateAtEnd = held;
+        state.hasEnded = true;
     }
     GetSimulation().end();
 }
@@ -323,10 +335,17 @@ std::uint32_t CountReclaimed() {
     return state.reclaimed;
 }
 
-ZentaraSimulationState GetStateAtEnd() {
+void ForgetEnd() {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
-    return state.stateAtEnd;
+    state.hasEnded = false;
+}
+
+bool HasEnded(ZentaraSimulationState* held) {
+    DriverState& state = GetState();
+    const std::lock_guard hold(state.mutex);
+    *held = state.stateAtEnd;
+    return state.hasEnded;
 }
 
 }  // namespace ZV::Test

@@ -30,6 +30,7 @@ inline constexpr std::string_view SeriesMarks[] = {"", "s", "e"};
 struct CountedRequest {
     std::uint32_t code = 0;
     bool mayPend = false;
+    std::uint32_t address = 0;  ///< Of the register that is written.
 };
 
 /// From here on requests are counted; number `number` of `series`, from 1, meets `failure`.
@@ -45,7 +46,10 @@ std::vector<CountedRequest> GetCounted(RequestSeries series);
 std::uint32_t CountOpenDevices();
 /// Reservations that the driver had to take back so far, since a handle was closed with them.
 std::uint32_t CountReclaimed();
-/// What the driver held when the library ended its bus the last time, over all cameras.
-ZentaraSimulationState GetStateAtEnd();
+/// Forgets that the library has ended its bus.
+void ForgetEnd();
+/// True when the library has ended its bus since; `held` is what the driver held then, over all
+/// cameras.
+bool HasEnded(ZentaraSimulationState* held);
 
 }  // namespace ZV::Test

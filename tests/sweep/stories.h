@@ -44,11 +44,13 @@ class Client {
     void Close();
     void Release();
 
-    /// Puts an image format and a short exposure in force.
+    /// Puts an image format and a short exposure in force, all else by default. Whatever the camera
+    /// was left with, each of its registers is written: other values come first.
     void Begin(std::uint32_t imageFormat);
     void ReadSettings();
     void Send();
-    /// A send of values that all differ from those of a camera after its first setup.
+    /// A send of values that all differ from those in force, as far as the model has more than one,
+    /// and one that turns on real-time video and tweaks a register.
     void SendOthers();
     void Grab();
     /// Queues all frames with settings changes among them, streams, changes what stops the stream,
@@ -58,7 +60,8 @@ class Client {
     void Balance();
     void Expose();
 
-    /// Calls that every lock is free for, in any state: they return.
+    /// Calls for which locks must be free: they return. `deliveryLock`, `queueLock`, `streamLock`;
+    /// an image through the same camera takes the rest.
     void TakeEveryLock();
 
     bool HasCamera() const { return listedCount != 0; }
@@ -70,7 +73,7 @@ class Client {
     const Zentara_Frame& GetGrabbed() const { return frames[0].record; }
 
   private:
-    static constexpr std::size_t CallsMax = 128;
+    static constexpr std::size_t CallsMax = 256;
     /// Room for four words of two bytes a pixel.
     static constexpr std::uint32_t BufferBytes = Width * Height * 8;
     struct Frame {
@@ -78,6 +81,8 @@ class Client {
         std::vector<std::uint8_t> pixels;
     };
 
+    void ChooseOthers(Zentara_Settings* block) const;
+    std::uint32_t ChooseOtherWord(Zentara_Settings* block, std::uint32_t key) const;
     ZentaraResult Note(const char* name, ZentaraResult result);
     static void Serve(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
                       std::uint32_t flags);
@@ -90,6 +95,7 @@ class Client {
     std::uint32_t listedCount = 0;
     ZentaraHandle handle = 0;
     Zentara_Settings settings{};
+    Zentara_Settings others{};
     std::array<Zentara_Settings, 4> changes{};
     std::array<Frame, FrameCount> frames;
     std::uint32_t queued = 0;
@@ -97,14 +103,14 @@ class Client {
     std::atomic<std::uint32_t> served{0};
 };
 
-/// Where a story begins.
-enum class Stage { Loaded, Opened, Streaming };
+/// Where a story begins and ends.
+enum class Stage { Unloaded, Loaded, Opened, Streaming };
 
 struct Story {
     std::string_view name;
     Stage begins;
     void (*run)(Client& client);
-    bool endsRelease;  ///< The library is not loaded behind it.
+    Stage ends;  ///< Without a failure.
 };
 
 extern const Story Stories[8];
