@@ -39,17 +39,16 @@ constexpr std::array<std::string_view, HostileCameraKinds> Kinds{"mono",
                                                                  "model:TirelM2",
                                                                  "model:SolvaneH1",
                                                                  "model:SolvaneJ1",
-                                                                 "model:Unknown"};
-
-constexpr std::uint32_t SmallWidth = 64;
-constexpr std::uint32_t SmallHeight = 48;
+                                                                 "model:Unknown",
+                                                                 "colour",
+                                                                 "wheel"};
 
 CameraScenario MakeHostileCamera(std::size_t kind) {
     Scenario named;
     Require(Simulation::MakeBuiltInScenario(Kinds[kind % Kinds.size()], &named));
     CameraScenario camera = named.cameras.front();
-    camera.sensor.width = SmallWidth;
-    camera.sensor.height = SmallHeight;
+    camera.sensor.width = HostileSensorWidth;
+    camera.sensor.height = HostileSensorHeight;
     return camera;
 }
 

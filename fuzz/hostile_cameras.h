@@ -9,8 +9,12 @@
 
 namespace ZV::Fuzzing {
 
-/// One of each model, and the first generation.
-inline constexpr std::size_t HostileCameraKinds = 26;
+/// One of each model, the first generation, one with a mosaic and one with a filter wheel.
+inline constexpr std::size_t HostileCameraKinds = 28;
+
+/// Pixels of each camera's sensor.
+inline constexpr std::uint32_t HostileSensorWidth = 64;
+inline constexpr std::uint32_t HostileSensorHeight = 48;
 
 /// Well-made cameras with small sensors, of the kinds that `first`, `first` + 1 and so on name
 /// modulo HostileCameraKinds.

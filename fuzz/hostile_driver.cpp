@@ -10,6 +10,8 @@
 #include <memory>
 #include <mutex>
 #include <string>
+#include <thread>
+#include <utility>
 #include <vector>
 
 #include "hal/control_records.h"
@@ -18,7 +20,9 @@
 #include "hal/platform/simulation_module.h"
 #include "hal/stream_format.h"
 
-// Threads: the library's. One mutex guards all; a request is ended after it has been let go.
+// Threads: the library's, the target's, and one of its own, which ends what is answered late. One
+// mutex guards all; a request is ended after it has been let go. The bus is never destroyed: the
+// thread waits there for as long as the process lives.
 
 namespace ZV::Fuzzing {
 namespace {
@@ -28,10 +32,14 @@ using Simulation::RegisterFile;
 
 struct HostileHandle;
 
-/// A request that stays until a buffer is delivered, or until it is cancelled or its handle closed.
+using Clock = std::chrono::steady_clock;
+
+/// A request that stays until a buffer is delivered, it is due to be answered late, it is cancelled
+/// or its handle closed.
 struct PendedRequest {
     KernelRequest* request;
-    const HostileHandle* handle;
+    HostileHandle* handle;
+    Clock::time_point due = Clock::time_point::max();
 };
 
 struct HostileCamera {
@@ -45,6 +53,7 @@ struct HostileCamera {
 
 struct HostileHandle {
     HostileCamera* camera;
+    std::size_t ending = 0;  ///< Late requests that have been let go and are not ended yet.
 };
 
 struct HostilePlan {
@@ -54,14 +63,15 @@ struct HostilePlan {
 
 struct HostileBus {
     std::mutex mutex;
-    std::condition_variable attachedMore;
+    std::condition_variable attachedMore, plannedLate, endedLate;
     std::vector<std::unique_ptr<HostileCamera>> cameras;
     HostilePlan plan;
     std::uint64_t nextHandle = 1;
+    bool hasLateThread = false;
 };
 
 HostileBus& GetBus() {
-    static HostileBus bus;
+    static HostileBus& bus = *new HostileBus;
     return bus;
 }
 
@@ -155,6 +165,60 @@ bool StaysPended(const KernelRequest& request) {
     return request.code == FW_IOCTL_ATTACH_BUFFER || request.code == FW_IOCTL_NOTIFY_WAIT;
 }
 
+// ---- Late answers
+
+PendedRequest* FindLate(HostileBus& bus) {
+    PendedRequest* first = nullptr;
+    for (const auto& camera : bus.cameras) {
+        for (PendedRequest& row : camera->pended) {
+            const bool isLate = row.due != Clock::time_point::max();
+            if (isLate && (first == nullptr || row.due < first->due)) first = &row;
+        }
+    }
+    return first;
+}
+
+void Forget(const PendedRequest& pended) {
+    std::erase_if(pended.handle->camera->pended,
+                  [&pended](const PendedRequest& row) { return row.request == pended.request; });
+}
+
+/// Lets go of the mutex while it ends the request.
+void EndLate(std::unique_lock<std::mutex>& lock, HostileBus& bus, const PendedRequest pended) {
+    Forget(pended);
+    const std::uint32_t answered = Answer(*pended.handle->camera, *pended.request);
+    ++pended.handle->ending;
+    lock.unlock();
+    pended.request->complete(pended.request, PlatformErrorNone, answered);
+    lock.lock();
+    --pended.handle->ending;
+    bus.endedLate.notify_all();
+}
+
+void EndAllLate() {
+    HostileBus& bus = GetBus();
+    std::unique_lock lock(bus.mutex);
+    for (;;) {
+        const PendedRequest* const first = FindLate(bus);
+        if (first == nullptr) {
+            bus.plannedLate.wait(lock);
+        } else if (const PendedRequest due = *first; due.due <= Clock::now()) {
+            EndLate(lock, bus, due);
+        } else {
+            bus.plannedLate.wait_until(lock, due.due);
+        }
+    }
+}
+
+void PendLate(HostileBus& bus, HostileHandle& handle, KernelRequest* request,
+              std::uint32_t number) {
+    constexpr std::uint32_t DelayMask = 1023;
+    const auto delay = std::chrono::microseconds(number & DelayMask);
+    handle.camera->pended.push_back({request, &handle, Clock::now() + delay});
+    if (!std::exchange(bus.hasLateThread, true)) std::thread(EndAllLate).detach();
+    bus.plannedLate.notify_one();
+}
+
 // ---- The driver's table
 
 std::uint32_t OpenList(void** list) {
@@ -200,9 +264,10 @@ void Close(void* opened) {
     const std::unique_ptr<HostileHandle> handle(static_cast<HostileHandle*>(opened));
     std::deque<PendedRequest> own;
     {
-        const std::lock_guard hold(GetBus().mutex);
+        std::unique_lock lock(GetBus().mutex);
         own = TakePended(*handle);
         --handle->camera->openHandles;
+        GetBus().endedLate.wait(lock, [&handle] { return handle->ending == 0; });
     }
     for (const PendedRequest& row : own) {
         row.request->complete(row.request, PlatformErrorOperationAborted, 0);
@@ -217,9 +282,14 @@ std::uint32_t Control(void* opened, KernelRequest* request, std::uint32_t* bytes
     const std::uint32_t error = bus.plan.error;
     const bool canPend = request->isOverlapped != 0;
     if (mischief == Mischief::Fail) return error;
-    if (mischief == Mischief::None && StaysPended(*request) && canPend) {
+    const bool isOrdered = mischief == Mischief::None || mischief == Mischief::Late;
+    if (isOrdered && StaysPended(*request) && canPend) {
         handle.camera->pended.push_back({request, &handle});
         bus.attachedMore.notify_all();
+        return PlatformErrorIoPending;
+    }
+    if (mischief == Mischief::Late && canPend) {
+        PendLate(bus, handle, request, error);
         return PlatformErrorIoPending;
     }
     std::uint32_t answered = 0;
@@ -308,11 +378,11 @@ bool DeliverRequest(std::size_t camera, const std::function<void(std::span<std::
     return true;
 }
 
-void WaitForRing(std::size_t camera) {
+bool WaitForRing(std::size_t camera) {
     constexpr std::chrono::milliseconds Limit{20};
     std::unique_lock lock(GetBus().mutex);
     const std::deque<PendedRequest>& pended = GetBus().cameras[camera]->pended;
-    (void)GetBus().attachedMore.wait_for(lock, Limit, [&pended] {
+    return GetBus().attachedMore.wait_for(lock, Limit, [&pended] {
         return std::count_if(pended.begin(), pended.end(), IsAttached) >=
                static_cast<std::ptrdiff_t>(StreamRequestCount);
     });

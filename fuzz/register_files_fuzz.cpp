@@ -1,12 +1,13 @@
 #include <array>
-#include <cstring>
+#include <cstdlib>
 #include <vector>
 
+#include "fuzz/camera_feed.h"
 #include "fuzz/client_calls.h"
 #include "fuzz/fuzz_input.h"
+#include "fuzz/good_packets.h"
 #include "fuzz/hostile_cameras.h"
 #include "fuzz/hostile_driver.h"
-#include "hal/stream_format.h"
 
 // A camera whose registers say anything, and the whole road of a client over it. Input: the kind of
 // camera to start from, steps before it is listed, a byte 0xFF, then steps while it is open. Each
@@ -21,12 +22,16 @@ constexpr std::size_t FrameBytes = 1 << 16;
 constexpr std::size_t FramesMax = 16;
 constexpr std::size_t StepsMax = 200;
 
-/// The client of one execution, with one buffer for all frames. All of it outlives the stream.
+/// The client of one execution, with one buffer for all queued frames. All of it outlives the
+/// stream.
 struct Client {
     ZentaraHandle handle = 0;
     Zentara_Settings block{}, queuedBlock{};
     std::array<Zentara_Frame, FramesMax> frames{};
     std::size_t queued = 0;
+    Zentara_Frame grabbed{};
+    std::vector<std::uint8_t> grabbedPixels;
+    GoodPackets packets{0};
 };
 
 std::vector<std::uint8_t>& GetPixels() {
@@ -138,63 +143,70 @@ void ReadReserved(FuzzInput& input, Client& client) {
     RequireKnownResult(_Zentara_factory_reserved0(client.handle, 2, words.data(), quadlets, 0));
 }
 
-void RepeatBytes(std::span<const std::uint8_t> bytes, std::span<std::uint8_t> buffer) {
-    for (std::size_t at = 0; at < buffer.size() && !bytes.empty(); at += bytes.size()) {
-        const std::size_t count = std::min(bytes.size(), buffer.size() - at);
-        std::memcpy(buffer.data() + at, bytes.data(), count);
-    }
-}
-
-struct PacketHead {
-    std::uint8_t psn, frameNumber;
-    bool isFirst;
+struct Delivery {
+    std::uint8_t form, frameNumber;
+    std::span<const std::uint8_t> bytes;
 };
 
-/// What a camera of streaming version 1 or 2 would send, around bytes that are there already.
-void MakePacketGood(std::span<std::uint8_t> slot, const PacketHead& head, std::uint32_t offset) {
-    const std::size_t length = slot.size() - PacketSlotExtraBytes;
-    slot[PacketLengthOffset] = static_cast<std::uint8_t>(length);
-    slot[PacketLengthOffset + 1] = static_cast<std::uint8_t>(length >> 8);
-    std::uint8_t* const payload = slot.data() + PacketPayloadOffset;
-    payload[PlainFlagsOffset] = head.isFirst ? PlainFlagFirst : 0;
-    payload[PlainMarkOffset] = PlainMark;
-    payload[PlainFrameNumberOffset] = head.frameNumber;
-    payload[PlainOffsetHighOffset] = static_cast<std::uint8_t>(offset >> 16);
-    payload[PlainOffsetLowOffset] = static_cast<std::uint8_t>(offset >> 8);
-    payload[PlainOffsetLowOffset + 1] = static_cast<std::uint8_t>(offset);
-    if (head.isFirst) {
-        payload[PlainHeaderBytes + HeaderPsnOffset] = head.psn;
-        payload[PlainHeaderBytes + HeaderFieldOffset] = FieldFirst;
-    }
-    std::memset(payload + length - TailMarkBytes, TailMarkByte, TailMarkBytes);
-}
-
-void MakeFrameGood(std::span<std::uint8_t> buffer, std::uint8_t frameNumber, bool isStart) {
-    constexpr std::size_t SmallestSlot =
-        PacketSlotExtraBytes + PlainHeaderBytes + FrameHeaderBytes + TailMarkBytes;
-    const std::size_t stride = GetPacketStride(0);
-    if (stride <= SmallestSlot) return;
-    const auto psn = static_cast<std::uint8_t>(GetRegister(0, BlockName::Control, 1) >> 24);
-    std::uint32_t offset = 0;
-    bool isFirst = isStart;
-    for (std::size_t at = 0; at + stride <= buffer.size(); at += stride) {
-        MakePacketGood(buffer.subspan(at, stride), {psn, frameNumber, isFirst}, offset);
-        offset += static_cast<std::uint32_t>(stride - PacketSlotExtraBytes - PlainHeaderBytes -
-                                             TailMarkBytes - (isFirst ? FrameHeaderBytes : 0));
-        isFirst = false;
-    }
-}
-
-/// A request of the input's bytes, over and over; by a bit of the first one with good packets.
-void Deliver(FuzzInput& input, Client&) {
+Delivery TakeDelivery(FuzzInput& input) {
     const std::uint8_t form = input.TakeByte();
     const std::uint8_t frameNumber = input.TakeByte();
-    const std::span<const std::uint8_t> bytes = input.TakeBytes(input.TakeByte());
-    const bool isDelivered = DeliverRequest(0, [&](std::span<std::uint8_t> buffer) {
-        RepeatBytes(bytes, buffer);
-        if ((form & 1) != 0) MakeFrameGood(buffer, frameNumber, (form & 2) != 0);
-    });
-    if (isDelivered) WaitForRing(0);
+    return {form, frameNumber, input.TakeBytes(input.TakeByte())};
+}
+
+void Deliver(FuzzInput& input, Client& client) {
+    const Delivery delivery = TakeDelivery(input);
+    if (client.packets.Deliver(delivery.form, delivery.frameNumber, delivery.bytes)) {
+        (void)WaitForRing(0);
+    }
+}
+
+/// What the camera sends while the client waits for images.
+FeedPlan TakeFeed(FuzzInput& input, const Client& client) {
+    constexpr std::uint8_t RequestsMax = 32;
+    const auto requests = static_cast<std::uint8_t>(input.TakeByte() % (RequestsMax + 1));
+    const Delivery delivery = TakeDelivery(input);
+    return {client.handle, delivery.form, delivery.frameNumber, requests, delivery.bytes};
+}
+
+void GiveBuffer(std::vector<std::uint8_t>& pixels, Zentara_Frame& frame) {
+    frame.pBuffer = pixels.empty() ? nullptr : pixels.data();
+    frame.bufferSize = static_cast<std::uint32_t>(pixels.size());
+}
+
+void Grab(FuzzInput& input, Client& client) {
+    client.grabbedPixels = std::vector<std::uint8_t>(input.TakeShort());
+    GiveBuffer(client.grabbedPixels, client.grabbed);
+    const CameraFeed feed(0, client.packets, TakeFeed(input, client));
+    RequireKnownResult(Zentara_GrabFrame(client.handle, &client.grabbed));
+}
+
+using MeasuringCall = ZentaraResult (*)(Zentara_Settings*, std::uint32_t, std::uint32_t,
+                                        std::uint32_t, std::uint32_t);
+
+void Measure(MeasuringCall measure, FuzzInput& input, Client& client) {
+    const std::uint32_t x = input.TakeShort();
+    const std::uint32_t y = input.TakeShort();
+    const std::uint32_t width = input.TakeShort();
+    const std::uint32_t height = input.TakeShort();
+    const CameraFeed feed(0, client.packets, TakeFeed(input, client));
+    RequireKnownResult(measure(&client.block, x, y, width, height));
+}
+void Balance(FuzzInput& input, Client& client) {
+    Measure(Zentara_WhiteBalance, input, client);
+}
+void Expose(FuzzInput& input, Client& client) {
+    Measure(Zentara_AutoExpose, input, client);
+}
+
+/// The frame that was grabbed last. A copy may replace the buffer, which is therefore malloc's.
+void Finish(FuzzInput& input, Client& client) {
+    Zentara_Frame finished{};
+    finished.bufferSize = input.TakeShort();
+    if (finished.bufferSize != 0) finished.pBuffer = std::malloc(finished.bufferSize);
+    RequireKnownResult(
+        Zentara_PostProcessSingleFrame(client.handle, &client.block, &client.grabbed, &finished));
+    std::free(finished.pBuffer);
 }
 
 void OpenFirst(Client& client) {
@@ -212,11 +224,12 @@ void OpenAnew(FuzzInput&, Client& client) {
 
 using Step = void (*)(FuzzInput&, Client&);
 /// The first four concern the camera alone and may stand before its listing.
-constexpr std::array<Step, 21> Steps{
-    StoreQuadlet, ChangeQuadlet, StoreQuadlets, MakeMischief,  ReadInfo,  ReadTexts,
-    ReadSettings, ReadDefaults,  Access,        ReadBlock,     Preflight, Send,
-    StartStream,  StopStream,    QueueFrame,    QueueSettings, Trigger,   Abort,
-    ReadReserved, Deliver,       OpenAnew};
+constexpr std::array<Step, 25> Steps{
+    StoreQuadlet,  ChangeQuadlet, StoreQuadlets, MakeMischief, ReadInfo,
+    ReadTexts,     ReadSettings,  ReadDefaults,  Access,       ReadBlock,
+    Preflight,     Send,          StartStream,   StopStream,   QueueFrame,
+    QueueSettings, Trigger,       Abort,         ReadReserved, Deliver,
+    OpenAnew,      Grab,          Balance,       Expose,       Finish};
 constexpr std::size_t CameraSteps = 4;
 
 void PrepareCamera(FuzzInput& input, Client& client) {
