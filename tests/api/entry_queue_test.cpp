@@ -2,7 +2,11 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <atomic>
+#include <iterator>
 #include <memory>
+#include <numeric>
 #include <thread>
 #include <vector>
 
@@ -118,27 +122,76 @@ TEST_F(EntryQueue, AnExposureBelongsToTheFirstEntryThatHasNotHadItsCallback) {
     EXPECT_EQ(0u, find());
 }
 
-TEST_F(EntryQueue, StaysWholeWhileThreadsAppendTakeAndClear) {
-    constexpr std::uint32_t Rounds = 2000;
-    std::thread appender([&] {
-        for (std::uint32_t i = 0; i < Rounds; ++i) (void)Append(i, i % 3 == 0 ? 1 : 0);
-    });
-    std::thread taker([&] {
-        std::uint64_t ticket = 0;
-        for (std::uint32_t i = 0; i < Rounds; ++i) {
-            LetGoOfEntry(context, TakeSettingsEntry(context, 1, 2, &ticket));
-            LetGoOfEntry(context, TakeFirstEntry(context));
-        }
-    });
-    for (std::uint32_t i = 0; i < Rounds; ++i) {
-        QueueEntry* const held = HoldEntry(context, i % 100);
-        if (i % 64 == 0) ClearQueue(context);
-        LetGoOfEntry(context, held);
-    }
-    appender.join();
-    taker.join();
+/// A thread that appends entries numbered from 0, every third a change, and one that takes them.
+class SharedEntryQueue : public EntryQueue {
+  protected:
+    static constexpr std::uint32_t Rounds = 2000;
 
-    EXPECT_LE(GetQueueCount(context), 100u);
+    void StartBoth() {
+        appender = std::thread([this] {
+            for (std::uint32_t i = 0; i < Rounds; ++i) {
+                while (!Append(i, i % 3 == 0 ? QueueKindSettings : QueueKindFrame)) {
+                    std::this_thread::yield();
+                }
+            }
+            isAppended = true;
+        });
+        taker = std::thread([this] {
+            while (!isAppended || GetQueueCount(context) != 0) {
+                std::uint64_t ticket = 0;
+                Keep(changes, TakeSettingsEntry(context, 1, 2, &ticket));
+                Keep(firsts, TakeFirstEntry(context));
+            }
+        });
+    }
+    void Keep(std::vector<std::uint32_t>& numbers, QueueEntry* entry) {
+        if (entry == nullptr) return;
+        numbers.push_back(entry->userData);
+        LetGoOfEntry(context, entry);
+    }
+    void JoinBoth() {
+        appender.join();
+        taker.join();
+        EXPECT_EQ(0u, GetQueueCount(context));
+        EXPECT_TRUE(std::ranges::is_sorted(firsts));
+        EXPECT_TRUE(std::ranges::is_sorted(changes));
+    }
+    std::vector<std::uint32_t> GetAllTaken() const {
+        std::vector<std::uint32_t> all;
+        std::ranges::merge(firsts, changes, std::back_inserter(all));
+        return all;
+    }
+
+    std::thread appender, taker;
+    std::atomic<bool> isAppended{false};
+    std::vector<std::uint32_t> firsts, changes;  // of the taker
+};
+
+TEST_F(SharedEntryQueue, StaysWholeWhileThreadsAppendTakeAndClear) {
+    StartBoth();
+    std::uint64_t held = 0;
+    while (!isAppended) {
+        QueueEntry* const entry = HoldEntry(context, static_cast<std::uint32_t>(held % 4));
+        if (entry != nullptr) {
+            EXPECT_GT(Rounds, entry->userData);
+            EXPECT_EQ(entry->userData % 3 == 0 ? QueueKindSettings : QueueKindFrame, entry->kind);
+        }
+        if (held++ % 64 == 0) ClearQueue(context);
+        LetGoOfEntry(context, entry);
+    }
+    JoinBoth();
+
+    const std::vector<std::uint32_t> taken = GetAllTaken();
+    EXPECT_EQ(taken.end(), std::ranges::adjacent_find(taken)) << "none is taken twice";
+}
+
+TEST_F(SharedEntryQueue, LosesNothingWhileOneThreadAppendsAndOneTakes) {
+    StartBoth();
+    JoinBoth();
+
+    std::vector<std::uint32_t> everything(Rounds);
+    std::iota(everything.begin(), everything.end(), 0u);
+    EXPECT_EQ(everything, GetAllTaken());
 }
 
 }  // namespace

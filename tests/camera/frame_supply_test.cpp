@@ -1,8 +1,13 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <cstdlib>
+#include <memory>
+#include <thread>
+#include <vector>
 
 #include "camera/test_camera.h"
+#include "support/wait_until.h"
 
 namespace ZV::Test {
 
@@ -76,6 +81,28 @@ TEST_F(CameraAskedForFrames, RefusesExactlyOneFrameAfterAnAbort) {
     EXPECT_NE(nullptr, PeekDone());
 }
 
+TEST_F(CameraAskedForFrames, RefusesAFrameForEachAbortAtMostWhileAnotherThreadAborts) {
+    constexpr std::uint64_t Aborts = 500;
+    const StreamCounters& counters = camera->GetStreamCounters();
+    std::atomic<bool> hasAborted{false};
+    std::thread client([&] {
+        for (std::uint64_t i = 0; i < Aborts; ++i) EXPECT_EQ(CameraOk, camera->Abort());
+        hasAborted = true;
+    });
+    std::uint64_t asked = 0;
+    while (!hasAborted) {
+        (void)PeekDone();
+        ++asked;
+    }
+    client.join();
+    (void)PeekDone();  // may be the one that the last abort refuses
+
+    EXPECT_NE(nullptr, PeekDone()) << "no abort is left over";
+    EXPECT_EQ(asked + 2, counters.begun.Get() + counters.refused.Get());
+    EXPECT_LE(1u, counters.refused.Get());
+    EXPECT_GE(Aborts, counters.refused.Get());
+}
+
 TEST_F(CameraAskedForFrames, HoldsAFrameForTheStreamLayerFromItsPushOn) {
     tStFrameInfo* frame = Peek();
 
@@ -141,6 +168,33 @@ TEST_F(CameraAskedForFrames, KeepsAnAbortForLaterWhenNoExternalBufferIsLeft) {
     EXPECT_EQ(nullptr, Peek()) << "this is the frame that the abort refuses";
 
     EXPECT_FALSE(camera->streaming.abortPending);
+}
+
+TEST_F(CameraAskedForFrames, TakesEachExternalBufferOnceWhileAClientOffersMore) {
+    constexpr std::size_t Offered = 2000;
+    camera->supportsExternalBuffers = true;
+    camera->streaming.usesExternalBuffers = true;
+    std::vector<std::unique_ptr<void, decltype(&std::free)>> buffers;
+    for (std::size_t i = 0; i < Offered; ++i) buffers.emplace_back(std::malloc(1), &std::free);
+    std::thread client([&] {
+        for (const auto& buffer : buffers) {
+            EXPECT_EQ(CameraOk, camera->AddExternalImageBuffer(buffer.get()));
+        }
+    });
+    std::vector<void*> taken;
+    EXPECT_TRUE(WaitUntil([&] {
+        while (PeekDone() != nullptr) {
+            tStFrameInfo* const frame = camera->streaming.frameQueue.TakeOldest();
+            taken.push_back(frame->buffer);
+            frame->buffer = nullptr;
+            FreeFrame(frame);
+        }
+        return taken.size() == Offered;
+    }));
+    client.join();
+
+    ASSERT_EQ(Offered, taken.size());
+    for (std::size_t i = 0; i < Offered; ++i) EXPECT_EQ(buffers[i].get(), taken[i]) << i;
 }
 
 TEST_F(CameraAskedForFrames, RefusesExternalBuffersOnAModelWithoutThem) {

@@ -1,13 +1,21 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <cstdlib>
 #include <thread>
 #include <vector>
 
+#include "support/wait_until.h"
 #include "system/single_frame.h"
 
 namespace ZV::Test {
 namespace {
+
+void CountDelivery(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
+                   std::uint32_t) {
+    EXPECT_ZERR(zerrNone, errorCode);
+    ++*reinterpret_cast<std::atomic<std::size_t>*>(static_cast<std::uintptr_t>(userPrivate));
+}
 
 TEST_F(SingleFrame, FinishesBytesByEveryAlgorithmInEveryFormat) {
     OwnedFrame mosaic = GrabMosaic();
@@ -530,34 +538,37 @@ TEST_F(SingleFrameOfTwoCameras, IsRefusedOnceTheFramesCameraIsClosed) {
 }
 
 TEST_F(SingleFrame, MayBeFinishedBesideADelivery) {
+    constexpr std::size_t Rounds = 200;
     OwnedFrame mosaic = GrabMosaic();
     const auto expected = Finish(mosaic, zbayerAverage, zfmtRGB24);
     Send(zfmtBayer8, zfmtRGB24, zbayerAverage, /*isPostProcessing=*/true);
-    std::vector<std::vector<std::uint8_t>> grabbed;
-    std::thread grabber([&] {
-        for (int i = 0; i < 20; ++i) {
-            OwnedFrame frame(expected.size());
-            EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
-            grabbed.push_back(frame.GetImage());
-        }
-    });
+    std::vector<OwnedFrame> queued;
+    for (std::size_t i = 0; i < Rounds; ++i) queued.emplace_back(expected.size());
+    std::atomic<std::size_t> delivered{0};
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
     std::thread converter([&] {
-        for (int i = 0; i < 200; ++i) {
+        for (std::size_t i = 0; i < Rounds; ++i) {
             OwnedFrame target(expected.size());
             target->format = zfmtRGB24;
             EXPECT_ZERR(zerrNone, Zentara_BayerToRgb(zbayerAverage, mosaic.Get(), target.Get()));
             EXPECT_TRUE(expected == target.GetImage());
         }
     });
-    for (int i = 0; i < 200; ++i) {
+    for (std::size_t i = 0; i < Rounds; ++i) {
+        // One behind the other, so that deliveries go on until the last frame is finished.
+        EXPECT_TRUE(WaitUntil([&] { return i < delivered + 4; }));
+        EXPECT_ZERR(zerrNone,
+                    Zentara_QueueFrame(handle, queued[i].Get(), CountDelivery, zcbFrameDone,
+                                       reinterpret_cast<std::uintptr_t>(&delivered), 0));
         OwnedFrame target(expected.size());
         EXPECT_ZERR(zerrNone, Process(zfmtRGB24, zbayerAverage, mosaic, target));
         EXPECT_TRUE(expected == target.GetImage());
     }
-    grabber.join();
+    EXPECT_TRUE(WaitUntil([&] { return delivered == Rounds; }));
     converter.join();
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
 
-    for (const auto& image : grabbed) EXPECT_TRUE(expected == image);
+    for (const OwnedFrame& frame : queued) EXPECT_TRUE(expected == frame.GetImage());
 }
 
 }  // namespace

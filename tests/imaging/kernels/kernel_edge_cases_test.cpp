@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <atomic>
 #include <cstdint>
 #include <limits>
 #include <numeric>
@@ -12,6 +13,7 @@
 
 #include "imaging/kernels/kernel_fixture.h"
 #include "imaging/kernels/kernel_judge.h"
+#include "imaging/kernels/kernel_selection.h"
 #include "imaging/kernels/kernels.h"
 
 namespace ZV::Testing {
@@ -419,6 +421,37 @@ TEST_P(KernelEdgeCases, ThreadsMayRunKernelsSideBySide) {
     for (std::thread& thread : threads) thread.join();
 
     EXPECT_EQ(isRight, (std::array{true, true, true, true}));
+}
+
+TEST_P(KernelEdgeCases, TheFormMayChangeWhileThreadsRunKernels) {
+    const Bytes source = MakeRamp(60 * 40);
+    Bytes wanted(120 * 80);
+    ASSERT_EQ(Judge::EnlargePlane8(source.data(), {60, 40}, 60, {0, 0, 60, 40}, wanted.data(), 120,
+                                   {120, 80}, 2.0, 2.0, InterpolateCubic),
+              KernelOk);
+    std::atomic<int> running{3};
+    std::atomic<int> wrong{0};
+
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 3; ++i) {
+        threads.emplace_back([&] {
+            for (int round = 0; round < CountKernelRounds(100); ++round) {
+                Bytes plane(120 * 80);
+                const KernelStatus status =
+                    EnlargePlane8(source.data(), {60, 40}, 60, {0, 0, 60, 40}, plane.data(), 120,
+                                  {120, 80}, 2.0, 2.0, InterpolateCubic);
+                if (status != KernelOk || plane != wanted) ++wrong;
+            }
+            --running;
+        });
+    }
+    while (running != 0) {
+        EXPECT_TRUE(ForceKernels("plain"));
+        EXPECT_TRUE(ForceKernels(GetParam()));
+    }
+    for (std::thread& thread : threads) thread.join();
+
+    EXPECT_EQ(0, wrong);
 }
 
 ZENTARA_FOR_ALL_KERNEL_FORMS(KernelEdgeCases);
