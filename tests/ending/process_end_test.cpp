@@ -100,7 +100,8 @@ TEST_P(ProcessEnd, ComesWithinTwoSecondsAtAnyMoment) {
 
 INSTANTIATE_TEST_SUITE_P(Ways, ProcessEnd,
                          testing::Values("return", "exit", "quickExit", "exitAtOnce", "terminate",
-                                         "callback"),
+                                         "frameCallback", "exposureCallback", "settingsCallback",
+                                         "triggerWait"),
                          [](const auto& way) { return std::string(way.param); });
 
 }  // namespace

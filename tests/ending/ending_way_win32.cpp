@@ -1,0 +1,57 @@
+#include <windows.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <cstring>
+
+#include "ending/ending_way.h"
+
+namespace ZV::Test {
+
+namespace {
+
+void ReturnFromMain() {}
+
+void Exit() {
+    std::exit(0);
+}
+
+void ExitProcessAtOnce() {
+    ExitProcess(0);
+}
+
+void TerminateItself() {
+    TerminateProcess(GetCurrentProcess(), 0);
+}
+
+constexpr EndingWay Ways[] = {{"return", ReturnFromMain},
+                              {"exit", Exit},
+                              {"exitProcess", ExitProcessAtOnce},
+                              {"terminateItself", TerminateItself},
+                              {"terminatedByParent", RestForEver},
+                              {"frameCallback", Exit, EndPlace::FrameCallback},
+                              {"exposureCallback", Exit, EndPlace::ExposureCallback},
+                              {"settingsCallback", Exit, EndPlace::SettingsCallback},
+                              {"triggerWait", Exit, EndPlace::TriggerWait}};
+
+}  // namespace
+
+const EndingWay* FindEndingWay(const char* name) {
+    for (const EndingWay& way : Ways) {
+        if (std::strcmp(way.name, name) == 0) return &way;
+    }
+    return nullptr;
+}
+
+void TellEnd() {
+    static std::atomic<bool> isTold{false};
+    if (isTold.exchange(true)) return;
+    DWORD written = 0;
+    if (WriteFile(GetStdHandle(STD_OUTPUT_HANDLE), "E", 1, &written, nullptr) == 0) ExitProcess(3);
+}
+
+void RestForEver() {
+    for (;;) Sleep(INFINITE);
+}
+
+}  // namespace ZV::Test
