@@ -9,7 +9,7 @@ namespace ZV {
 struct SharedMemory;
 
 /// Opens or makes the block, read-write. Null when the system refuses; on POSIX also for a block
-/// that everyone may write to and that neither this user nor the administrator has made.
+/// that neither this user nor the administrator has made.
 SharedMemory* OpenSharedMemory(const char* name, std::size_t bytes);
 
 /// The block in this process, for the life of `memory`.

@@ -139,23 +139,44 @@ TEST_F(NamedMemory, IsOpenToOthersAsFarAsTheUmaskLetsIt) {
     CloseSharedMemory(memory);
 }
 
-TEST_F(NamedMemory, IsNotTakenFromAStrangerWhoLetsEveryoneWriteToIt) {
-    if (geteuid() != 0) GTEST_SKIP() << "only the administrator can be two users";
-    SharedMemory* memory = Open();
-    ASSERT_NE(memory, nullptr);
-    ASSERT_EQ(0, chmod(("/dev/shm" + SystemName()).c_str(), 0666));
-    constexpr uid_t Stranger = 65534, OtherStranger = 65533;
-    const auto opensAs = [this](uid_t user) {
+class MemoryOfAStranger : public NamedMemory {
+  protected:
+    static constexpr uid_t Stranger = 65534, OtherStranger = 65533;
+
+    void SetUp() override {
+        if (geteuid() != 0) GTEST_SKIP() << "only the administrator can be two users";
+        memory = Open();
+        ASSERT_NE(memory, nullptr);
+    }
+    void TearDown() override { CloseSharedMemory(memory); }
+
+    void GiveTo(uid_t user, mode_t mode) const {
+        ASSERT_EQ(0, chown(("/dev/shm" + SystemName()).c_str(), user, user));
+        ASSERT_EQ(0, chmod(("/dev/shm" + SystemName()).c_str(), mode));
+    }
+    bool OpensAs(uid_t user) const {
         return IsTrueInChild([&] { return setuid(user) == 0 && Open() != nullptr; });
-    };
+    }
 
-    EXPECT_TRUE(opensAs(Stranger)) << "the administrator's";
-    ASSERT_EQ(0, chown(("/dev/shm" + SystemName()).c_str(), Stranger, Stranger));
+    SharedMemory* memory = nullptr;
+};
 
-    EXPECT_TRUE(opensAs(Stranger)) << "their own";
-    EXPECT_FALSE(opensAs(OtherStranger));
-    EXPECT_EQ(nullptr, Open());
-    CloseSharedMemory(memory);
+TEST_F(MemoryOfAStranger, IsTakenByThemAlone) {
+    for (const mode_t mode : {0600U, 0644U, 0664U, 0666U}) {
+        GiveTo(Stranger, mode);
+
+        EXPECT_TRUE(OpensAs(Stranger)) << mode;
+        EXPECT_FALSE(OpensAs(OtherStranger)) << mode;
+        EXPECT_EQ(nullptr, Open()) << mode << ", which keeps no administrator out";
+    }
+}
+
+TEST_F(MemoryOfAStranger, IsTakenByAllWhenTheStrangerIsTheAdministratorWhoLetsThem) {
+    GiveTo(0, 0666);
+    EXPECT_TRUE(OpensAs(Stranger));
+
+    GiveTo(0, 0644);
+    EXPECT_FALSE(OpensAs(Stranger));
 }
 
 TEST(SharedMemoryName, IsRefusedWhenItIsNone) {

@@ -25,7 +25,8 @@ namespace {
 constexpr std::size_t NameBytesMax = 128;
 constexpr int OpenAttempts = 1000;
 
-/// "System-wide" between users is the administrator's choice: the umask decides who else may write.
+/// "System-wide" between users is the administrator's choice: theirs alone is the block that others
+/// take, and their umask decides who may write to it.
 constexpr mode_t FileMode = 0666;
 
 }  // namespace
@@ -50,11 +51,9 @@ bool IsRemoved(const struct stat& status) {
     return status.st_nlink == 0;
 }
 
-/// A stranger who lays a block there for everyone to write to could cut it under those that read
-/// it.
+/// The owner of a block may cut it under those that read it, whatever its mode says.
 bool IsTrusted(const struct stat& status) {
-    const bool isOwn = status.st_uid == geteuid() || status.st_uid == 0;
-    return isOwn || (status.st_mode & S_IWOTH) == 0;
+    return status.st_uid == geteuid() || status.st_uid == 0;
 }
 
 /// Takes part in the block behind `file`, zeroed for the first and at least `bytes` long. False
