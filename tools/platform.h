@@ -2,6 +2,7 @@
 
 #include <cstdio>
 #include <string>
+#include <system_error>
 #include <vector>
 
 /// The few things that the program itself wants of the operating system. Texts are UTF-8.
@@ -22,6 +23,10 @@ std::FILE* OpenFile(const std::string& path, const char* mode);
 
 /// Whether a name that can be opened leads to a device, a console or a pipe. Waits for none.
 bool IsDevice(const std::string& path);
+
+/// Makes a folder; where the system has modes, one that nobody else may enter. An error of
+/// `file_exists` when something has the name.
+std::error_code MakePrivateFolder(const std::string& path);
 
 /// A name as a library takes it that opens the file itself by the narrow functions of the system.
 std::string GetNarrowPath(const std::string& path);

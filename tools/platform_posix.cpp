@@ -2,6 +2,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstdint>
 #include <cstdlib>
 #include <string>
@@ -52,6 +53,11 @@ std::FILE* OpenFile(const std::string& path, const char* mode) {
 bool IsDevice(const std::string& path) {
     struct stat facts = {};
     return stat(path.c_str(), &facts) == 0 && !S_ISREG(facts.st_mode) && !S_ISDIR(facts.st_mode);
+}
+
+std::error_code MakePrivateFolder(const std::string& path) {
+    if (mkdir(path.c_str(), S_IRWXU) == 0) return {};
+    return {errno, std::generic_category()};
 }
 
 std::string GetNarrowPath(const std::string& path) {

@@ -113,6 +113,12 @@ bool IsDevice(const std::string& path) {
     return isDevice;
 }
 
+// Kept out of it is who is kept out of the folder around it.
+std::error_code MakePrivateFolder(const std::string& path) {
+    if (CreateDirectoryW(Widen(path).c_str(), nullptr)) return {};
+    return {static_cast<int>(GetLastError()), std::system_category()};
+}
+
 // The program asks for UTF-8 as its code page; a system that is too old for that has one of its
 // own.
 std::string GetNarrowPath(const std::string& path) {

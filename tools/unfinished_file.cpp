@@ -5,6 +5,7 @@
 #include <random>
 
 #include "paths.h"
+#include "platform.h"
 
 namespace ZentaraProgram {
 namespace {
@@ -17,7 +18,8 @@ UnfinishedFile::UnfinishedFile(const std::string& path) : finished(MakePath(path
     std::random_device random;
     do {
         folder = finished.parent_path() / fmt::format(".zentara-{:08x}", random());
-    } while (!std::filesystem::create_directory(folder, failure) && IsTaken());
+        failure = MakePrivateFolder(GetPathText(folder));
+    } while (failure == std::errc::file_exists);
 }
 
 UnfinishedFile::~UnfinishedFile() {

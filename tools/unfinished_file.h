@@ -7,9 +7,8 @@
 namespace ZentaraProgram {
 
 /// A file that takes its name in one step when it is finished, so that nobody ever sees half of it.
-/// Until then it lies in a new folder beside its place, which no one else can have laid there: a
-/// link of a name that could be guessed would lead the writer elsewhere. The folder goes with the
-/// object.
+/// Until then it lies in a new folder beside its place, which no one else can have laid there nor
+/// may enter: a link in the writer's way would lead it elsewhere. The folder goes with the object.
 class UnfinishedFile {
   public:
     explicit UnfinishedFile(const std::string& path);
@@ -26,9 +25,6 @@ class UnfinishedFile {
     [[nodiscard]] std::error_code Finish() const;
 
   private:
-    /// A folder of the name is no failure to the standard library, a file of the name is one.
-    [[nodiscard]] bool IsTaken() const { return !failure || failure == std::errc::file_exists; }
-
     const std::filesystem::path finished;
     std::filesystem::path folder;
     std::error_code failure;

@@ -1,11 +1,13 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 #include <string>
 
 #include "support/rounds.h"
 #include "tools/program.h"
+#include "tools/unfinished_file.h"
 
 // Nobody who may write beside a file, or who chooses folders, leads the program or the library to
 // another file than theirs.
@@ -42,6 +44,20 @@ TEST(Image, IsWrittenThroughNoLink) {
     ASSERT_EQ(0, grabbed.exitCode) << grabbed.errors;
     EXPECT_EQ("untouched", ReadFile(folder.GetPath("other")));
     EXPECT_FALSE(std::filesystem::is_symlink(place));
+}
+
+TEST(UnfinishedImage, LiesWhereNobodyElseMayEnterWhateverTheUmaskAllows) {
+    const TemporaryFolder folder;
+    const mode_t former = umask(0);
+    {
+        const ZentaraProgram::UnfinishedFile unfinished(folder.GetPath("a.raw"));
+        ASSERT_FALSE(unfinished.GetFailure());
+        const auto inside = std::filesystem::path(unfinished.GetPath()).parent_path();
+
+        EXPECT_EQ(std::filesystem::perms::owner_all, std::filesystem::status(inside).permissions());
+    }
+    umask(former);
+    EXPECT_TRUE(folder.ListFiles().empty());
 }
 
 /// A copy of the library in a folder of its own, and the module in another that is searched for
