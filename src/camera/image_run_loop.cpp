@@ -35,6 +35,31 @@ std::uint16_t ConvertFrameStatus(std::uint32_t frameStatus) {
     return frameStatus < std::size(StatusCodes) ? StatusCodes[frameStatus] : FrameStatusOutOfSync;
 }
 
+/// Counts a frame as bad unless it has come to another fate, also when the way there is left by
+/// what the standard library throws.
+class BadFrame {
+  public:
+    explicit BadFrame(StreamCounters& streamCounters) : counters(streamCounters) {}
+    ~BadFrame() {
+        if (!hasOtherFate) counters.bad.Add();
+    }
+    BadFrame(const BadFrame&) = delete;
+    BadFrame& operator=(const BadFrame&) = delete;
+
+    void Redeem() { hasOtherFate = true; }
+
+  private:
+    StreamCounters& counters;
+    bool hasOtherFate = false;
+};
+
+bool RunPipeline(ZImagePipeline* pipeline, ZExImage& image) {
+    bool isComplete = true;
+    // Kept: the result is not looked at; what the pipeline could not do leaves the image as it was.
+    if (pipeline != nullptr) (void)pipeline->ProcessImage(&image, &isComplete);
+    return isComplete;
+}
+
 }  // namespace
 
 void MorvaneFWCamera::PrivateImageStreamingRunLoop() {
@@ -93,20 +118,20 @@ tStFrameInfo* MorvaneFWCamera::TakeOldestFrame() {
 }
 
 void MorvaneFWCamera::ServeFrame(tStFrameInfo* frame) {
-    if (!streaming.isStreaming || !IsFrameValid(frame)) {
-        DiscardFrame(frame);
-        streamCounters.bad.Add();
-        return;
-    }
+    BadFrame fate(streamCounters);
+    if (!streaming.isStreaming || !IsFrameValid(frame)) return DiscardFrame(frame);
     const std::unique_ptr<tStFrameInfo, void (*)(tStFrameInfo*)> served(frame, FreeFrame);
     // Nothing has been written to a refused frame: it must not show what its buffer held.
     if (frame->frameStatus == FrameRefused) std::memset(frame->buffer, 0, frame->bufferSize);
-    ZExImage* image = MakeImage(*frame);
-    if (image == nullptr) {
-        streamCounters.bad.Add();
-        return;
+    std::unique_ptr<ZExImage> image(MakeImage(*frame));
+    if (image == nullptr) return;
+    const bool isComplete = RunPipeline(imagePipeline, *image);
+    fate.Redeem();
+    if (isComplete) {
+        DeliverImage(image.release());
+    } else {
+        streamCounters.heldBack.Add();
     }
-    DeliverImage(image);
 }
 
 bool MorvaneFWCamera::IsFrameValid(tStFrameInfo* frame) {
@@ -166,14 +191,7 @@ std::uint32_t MorvaneFWCamera::ChooseImageFormat(std::uint32_t bitDepth) {
 
 void MorvaneFWCamera::DeliverImage(ZExImage* image) {
     std::unique_ptr<ZExImage> owned(image);
-    bool isComplete = true;
-    // Kept: the result is not looked at; what the pipeline could not do leaves the image as it was.
-    if (imagePipeline != nullptr) (void)imagePipeline->ProcessImage(image, &isComplete);
     const StreamCallbacks callbacks = streaming.callbacks.Get();
-    if (!isComplete) {
-        streamCounters.heldBack.Add();
-        return;
-    }
     streamCounters.delivered.Add(image->GetErrorCode());
     if (callbacks.image == nullptr) {
         streamCounters.withoutTaker.Add(image->GetErrorCode());

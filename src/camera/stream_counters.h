@@ -47,7 +47,7 @@ struct StreamCounters {
     StreamCounter begun;       ///< Got a record and a buffer.
     StreamCounter refused;     ///< After an abort, without a stream, a buffer or memory.
     StreamCounter dropped;     ///< The youngest of two that wait, when a third begins.
-    StreamCounter bad;         ///< Discarded by the run loop: stale, refused, of another size.
+    StreamCounter bad;         ///< Discarded by the run loop: stale, refused, without memory.
     StreamCounter cleared;     ///< Taken out of the queue by a stop.
     StreamCounter heldBack;    ///< Kept by the pipeline: colours that are not an image yet.
     StatusCounters delivered;  ///< Handed to the image callback, by frame status code.

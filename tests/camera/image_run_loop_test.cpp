@@ -1,7 +1,12 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <new>
+
 #include "camera/test_camera.h"
+#include "imaging/image_filter.h"
 #include "imaging/image_formats.h"
+#include "imaging/image_pipeline.h"
 
 namespace ZV::Test {
 
@@ -121,6 +126,39 @@ TEST_F(CameraWithARunLoop, DropsAFrameWhoseRecordDoesNotDescribeItsOwnBuffer) {
 
     ASSERT_TRUE(AwaitImages(1));
     EXPECT_EQ(64u, client.GetDeliveries()[0].width);
+}
+
+/// A filter without memory, as long as it is told so.
+class StarvedFilter : public ZImageFilter {
+  public:
+    FilterResult Process(ZInImageBufferStruct*, ZOutImageBufferStruct*) override {
+        if (isStarved) throw std::bad_alloc();
+        return FilterDeclined;
+    }
+    FilterResult Init(std::uint32_t, std::uint32_t) override { return FilterDone; }
+    FilterResult SetOutputFormat(std::uint32_t) override { return FilterDone; }
+
+    std::atomic<bool> isStarved{true};
+};
+
+class CameraWithAStarvedFilter : public CameraWithARunLoop {
+  protected:
+    StarvedFilter filter;  // borrowed by the pipeline, until the camera is closed
+};
+
+TEST_F(CameraWithAStarvedFilter, CountsAFrameThatEndsInTheFilterAsBadAndGoesOn) {
+    camera->GetImagePipeline()->AddFilter(&filter);
+    const StreamCounters& counters = camera->GetStreamCounters();
+
+    Bring();
+    ASSERT_TRUE(WaitUntil([&] { return counters.bad.Get() == 1; }));
+    EXPECT_EQ(0U, counters.delivered.GetSum());
+
+    filter.isStarved = false;
+    Bring();
+    ASSERT_TRUE(AwaitImages(1));
+    EXPECT_EQ(1U, counters.bad.Get());
+    EXPECT_EQ(1U, counters.delivered.GetSum());
 }
 
 TEST_F(CameraWithARunLoop, NeverServesAFrameThatIsBeingFilled) {
