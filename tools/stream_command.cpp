@@ -10,6 +10,7 @@
 #include <mutex>
 #include <nlohmann/json.hpp>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "capture.h"
@@ -67,6 +68,12 @@ class FrameRing {
         Slot* slot = done.front();
         done.pop_front();
         return slot;
+    }
+
+    /// The slots that were delivered and not taken. Behind an abort there are no more.
+    std::deque<Slot*> TakeRest() {
+        const std::lock_guard lock(mutex);
+        return std::exchange(done, {});
     }
 
   private:
@@ -157,9 +164,7 @@ class Stream {
         while (code == ExitDone && !IsFinished()) {
             Slot* slot = ring.Take();
             sums.seconds = std::chrono::duration<double>(Clock::now() - begin).count();
-            if (IsInterrupted()) {
-                code = ExitInterrupted;
-            } else if (slot != nullptr) {
+            if (slot != nullptr) {
                 lastFrame = Clock::now();
                 code = Serve(slot, result);
             } else if (std::chrono::duration<double>(Clock::now() - lastFrame).count() >
@@ -169,15 +174,19 @@ class Stream {
             } else {
                 TriggerRest();
             }
+            if (code == ExitDone && IsInterrupted()) code = ExitInterrupted;
             progress.Show(sums, false);
         }
         Stop();
+        code = KeepRest(code);
         sums.Settle();
         progress.Show(sums, true);
         return code;
     }
 
     [[nodiscard]] const StreamSums& GetSums() const { return sums; }
+    /// Frames that came behind those that were asked for.
+    [[nodiscard]] std::uint64_t GetSurplus() const { return surplus; }
 
   private:
     [[nodiscard]] bool IsFinished() const {
@@ -196,14 +205,32 @@ class Stream {
     }
 
     ExitCode Serve(Slot* slot, ZentaraResult* result) {
-        sums.Count(slot->buffer.frame);
-        if (!options.output.empty()) {
-            const ExitCode written = Write(*slot);
-            if (written != ExitDone) return written;
-        }
+        const ExitCode kept = Keep(*slot);
+        if (kept != ExitDone) return kept;
         *result = ring.Queue(camera, slot);
         if (*result == zerrNone && !IsFinished()) *result = TriggerNext();
         return *result == zerrNone ? ExitDone : ExitFailed;
+    }
+
+    ExitCode Keep(const Slot& slot) {
+        sums.Count(slot.buffer.frame);
+        if (options.output.empty() || !isWritable) return ExitDone;
+        const ExitCode written = Write(slot);
+        isWritable = written == ExitDone;
+        return written;
+    }
+
+    /// What came before the stream had stopped is as good as the frames before it, unless no more
+    /// were asked for.
+    ExitCode KeepRest(ExitCode code) {
+        for (const Slot* slot : ring.TakeRest()) {
+            if (options.count > 0 && sums.frames >= options.count) {
+                ++surplus;
+            } else if (Keep(*slot) != ExitDone) {
+                code = ExitFailed;
+            }
+        }
+        return code;
     }
 
     ExitCode Write(const Slot& slot) {
@@ -241,10 +268,11 @@ class Stream {
     FrameRing ring;
     ProgressLine progress;
     StreamSums sums;
-    bool isStopped = false;
+    std::uint64_t surplus = 0;
+    bool isStopped = false, isWritable = true;
 };
 
-void ReportAsJson(const StreamSums& sums) {
+void ReportAsJson(const StreamSums& sums, std::uint64_t surplus) {
     nlohmann::json errors = nlohmann::json::object();
     for (const auto& [code, count] : sums.GetErrors()) errors[GetFrameErrorName(code)] = count;
     nlohmann::json missing = nlohmann::json::array();
@@ -261,10 +289,11 @@ void ReportAsJson(const StreamSums& sums) {
                              {"errors", errors},
                              {"lastNumber", sums.GetLastNumber()},
                              {"missing", missing},
+                             {"surplus", surplus},
                              {"files", sums.files}});
 }
 
-void ReportAsText(const StreamSums& sums) {
+void ReportAsText(const StreamSums& sums, std::uint64_t surplus) {
     Print(fmt::format(
         "{} frames in {:.2f} s: {:.1f} frames/s, {:.1f} MB/s; {} gaps, {} drops, {} damaged\n",
         sums.frames, sums.seconds, sums.GetRate(), sums.GetMegabytesPerSecond(), sums.gaps,
@@ -276,14 +305,15 @@ void ReportAsText(const StreamSums& sums) {
     if (sums.misnumbered > 0)
         Print(fmt::format("{} frames bear a wrong number\n", sums.misnumbered));
     if (sums.gaps > 0) Print(fmt::format("missing frames: {}\n", sums.DescribeMissing()));
+    if (surplus > 0) Print(fmt::format("{} more frames came before it had stopped\n", surplus));
     if (sums.files > 0) Print(fmt::format("{} files written\n", sums.files));
 }
 
-void Report(const CommonOptions& common, const StreamSums& sums) {
+void Report(const CommonOptions& common, const Stream& stream) {
     if (common.asJson) {
-        ReportAsJson(sums);
+        ReportAsJson(stream.GetSums(), stream.GetSurplus());
     } else {
-        ReportAsText(sums);
+        ReportAsText(stream.GetSums(), stream.GetSurplus());
     }
 }
 
@@ -316,7 +346,7 @@ ExitCode RunStream(const CommonOptions& common, const StreamOptions& options) {
     ZentaraResult result = zerrNone;
     const ExitCode code = stream.Run(&result);
     session.Close();  // No callback can come any more, so the stream's buffers may go.
-    Report(common, stream.GetSums());
+    Report(common, stream);
     if (code == ExitFailed) {
         if (result != zerrNone) PrintError("the stream ended: " + DescribeResult(result));
         return session.Judge(result == zerrNone ? ZentaraResult{zerrDriverFault} : result);

@@ -358,6 +358,41 @@ TEST(Program, AnInterruptEndsAStreamCleanlyWithCode130) {
     EXPECT_THAT(folder.ListFiles(), testing::Each(MatchesPattern("night-[0-9]{6}[.]raw")));
 }
 
+TEST(Program, AnInterruptedStreamAccountsForEveryFrameUpToTheLastFile) {
+    const TemporaryFolder folder;
+    RunningProgram program({"stream", "0", "--simulation", "mono", "--duration", "600", "--json",
+                            "--buffers", "20", "-o", folder.GetPath("night.fits")});
+    ASSERT_TRUE(
+        ZV::Test::WaitUntil([&] { return !folder.ListFiles().empty(); }, std::chrono::seconds(60)));
+
+    program.Interrupt();
+    const ProgramResult result = program.Wait();
+
+    EXPECT_EQ(130, result.exitCode);
+    const json report = json::parse(result.output);
+    EXPECT_EQ(report["frames"], report["files"]);
+    EXPECT_EQ(report["files"], folder.ListFiles().size());
+    EXPECT_EQ(0, report["surplus"]);
+}
+
+TEST(Program, AStreamTellsOfFramesThatCameBehindThoseThatWereAskedFor) {
+    const TracedScenario scenario(R"({"sensor": {"width": 64, "height": 48}})");
+    const TemporaryFolder folder;
+
+    json report;
+    EXPECT_TRUE(ZV::Test::WaitUntil(
+        [&] {
+            report = json::parse(
+                RunProgram({"stream", "0", "--simulation", scenario.GetName(), "--count", "1",
+                            "--buffers", "20", "--json", "-o", folder.GetPath("night.fits")})
+                    .output);
+            return report["surplus"] > 0;
+        },
+        std::chrono::seconds(60)));
+    EXPECT_EQ(1, report["frames"]);
+    EXPECT_EQ(1, report["files"]);
+}
+
 /// FNV-1a of 64 bits as 16 hexadecimal digits, as a trace holds it.
 std::string GetChecksum(const std::string& bytes) {
     std::uint64_t hash = 0xCBF29CE484222325U;
