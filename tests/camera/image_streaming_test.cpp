@@ -1,10 +1,27 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <cstdint>
+
 #include "camera/test_camera.h"
 #include "hal/platform/clock.h"
 #include "imaging/ex_image.h"
 
 namespace ZV::Test {
+
+/// The reference of the callback with this number; it counts those who came to the wrong one.
+struct NumberedReference {
+    int number;
+    std::atomic<std::uint32_t> calls{0}, wrongCalls{0};
+};
+
+template <int Number>
+void* ReceiveNumbered(ZImageReceivedCallbackStruct* record) {
+    auto& reference = *static_cast<NumberedReference*>(record->refCon);
+    ++(reference.number == Number ? reference.calls : reference.wrongCalls);
+    ZCamera::FreeImage(record->image);
+    return nullptr;
+}
 
 class OneStreamingCamera : public CameraWorld, public testing::Test {
   protected:
@@ -28,6 +45,7 @@ class OneStreamingCamera : public CameraWorld, public testing::Test {
         return WaitUntil([&] { return of.GetImageCount() >= before + count; });
     }
 
+    NumberedReference first{1}, second{2};
     TestClient client;
     TestClient other;  // lasts until the close, as whatever a stream writes to must
 };
@@ -56,6 +74,23 @@ TEST_F(OneStreamingCamera, KeepsTheFirstCallbackWhenItIsStartedASecondTime) {
 
     EXPECT_TRUE(AwaitMoreImages(client));
     EXPECT_EQ(0u, other.GetImageCount());
+}
+
+TEST_F(OneStreamingCamera, CallsEachCallbackWithItsOwnReferenceWhileAClientReplacesThem) {
+    ASSERT_EQ(CameraOk, camera->StartStreamingImages(ReceiveNumbered<1>, nullptr, false, &first));
+
+    const auto replace = [&](int rounds) {
+        for (int i = 0; i < rounds; ++i) {
+            camera->SetStreamingCallback(ReceiveNumbered<2>, &second);
+            camera->SetStreamingCallback(ReceiveNumbered<1>, &first);
+        }
+    };
+    EXPECT_TRUE(WaitUntil([&] {
+        replace(500);
+        return first.calls + second.calls >= 200;
+    }));
+
+    EXPECT_EQ(0u, first.wrongCalls + second.wrongCalls);
 }
 
 TEST_F(OneStreamingCamera, TakesANewParameterSetNumberForEachStart) {
@@ -116,6 +151,20 @@ TEST_F(OneStreamingCamera, StaysMarkedAsStreamingWhenTheStartFailsAtTheStreamSwi
     EXPECT_EQ(CameraOk, camera->StopStreamingImages());
     SetWaitClockDivisor(1);
     EXPECT_FALSE(camera->IsCameraStreaming());
+}
+
+TEST_F(OneStreamingCamera, GivesTheLockThatAFailedStopHasNotTaken) {
+    ASSERT_EQ(CameraOk, Start());
+    ASSERT_TRUE(world.AddFault(R"({"kind": "failRequest", "code": "FW_IOCTL_STOP"})"));
+
+    EXPECT_NE(CameraOk, camera->StopStreamingImages());
+
+    HALSemaphore* const lock = camera->streaming.streamLock;
+    EXPECT_EQ(HALOk, HAL_SemaphoreWait(lock));
+    EXPECT_EQ(HALOk, HAL_SemaphoreWait(lock)) << "kept: one more than there should be";
+    EXPECT_EQ(HALOk, HAL_SemaphoreSignal(lock));
+    EXPECT_EQ(HALOk, HAL_SemaphoreSignal(lock));
+    EXPECT_EQ(CameraOk, camera->StopStreamingImages());
 }
 
 TEST_F(OneStreamingCamera, ReturnsAFailedTakeOverAndDoesNotStream) {
