@@ -69,6 +69,8 @@ ZentaraResult OpenCamera(const char* function, std::uint32_t cameraId, ZentaraHa
         ZLogMessage(function, "Camera is already open");
         return zerrBadCameraId;
     }
+    // A listing that ended early, for want of memory, may not have come to it.
+    if (FindCamera(GetHandle(&camera)) == nullptr) RegisterCamera(&camera);
     const CameraResult opened = ConnectCamera(camera);
     if (opened != CameraOk) return TranslateCameraResult(opened);
     ZLogMessage(function, "Opened %s camera", camera.GetModelName());

@@ -16,6 +16,10 @@ namespace {
 
 constexpr std::int64_t AllocationsMax = 20'000;  ///< Far above what any run takes.
 constexpr ZentaraResult GreatestCode = 32;
+constexpr const char* TwoCameras =
+    R"({"base": "mono", "timeScale": 0, "cameras": [
+        {"sensor": {"width": 64, "height": 48, "noise": false}},
+        {"model": "Folary", "sensor": {"width": 64, "height": 48, "noise": false}}]})";
 
 bool IsKnown(ZentaraResult result) {
     return result <= GreatestCode;
@@ -170,6 +174,34 @@ TEST_F(FailingAllocation, OfAListingLeavesNoCameraWhoseCallsHang) {
         if (HasFailure()) break;
     }
     EXPECT_FALSE(hasRefused);
+}
+
+TEST(FailingListing, OfTwoCamerasLeavesNoneThatOpensAndIsNoHandle) {
+    SetWaitClockDivisor(1000);
+    SimulationWorld world(TwoCameras);
+    bool hasRefused = true;
+    for (std::int64_t failing = 1; hasRefused && failing < AllocationsMax; ++failing) {
+        SCOPED_TRACE(failing);
+        ASSERT_ZERR(zerrNone, Zentara_LoadDriver());
+        Zentara_CamListItem items[4] = {};
+        std::uint32_t length = 4;
+
+        BeginAllocations(failing);
+        EXPECT_PRED1(IsKnown, Zentara_ListCameras(items, &length));
+        hasRefused = EndAllocations();
+
+        // A listing that ended early may have told of none, and one of them is there all the same.
+        ZentaraHandle handle = 0;
+        if (Zentara_OpenCamera(0, &handle) == zerrNone) {
+            EXPECT_ZERR(zerrNone, Zentara_Abort(handle));
+            EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
+        }
+        Zentara_ReleaseDriver();
+        EXPECT_EQ(0u, world.GetState().openHandles);
+        if (testing::Test::HasFailure()) break;
+    }
+    EXPECT_FALSE(hasRefused);
+    SetWaitClockDivisor(1);
 }
 
 }  // namespace
