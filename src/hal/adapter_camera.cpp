@@ -224,6 +224,10 @@ HALStatus AdapterCameraStartStreaming(HALCamera camera, std::uint32_t,
     AdapterContext* const context = GetAdapterContext(camera);
     if (context == nullptr) return HALAdapterThreadNotStarted;
     if (context->streaming.load(std::memory_order_relaxed) != 0) return HALOk;
+    // Without its event the thread would never rest, without its mutex nothing guards the frame.
+    if (context->streamMutex == nullptr || context->stopEvent == nullptr) {
+        return HALAdapterThreadNotStarted;
+    }
     {
         const std::lock_guard guard(sourceMutex);
         context->source = packetSource;

@@ -1,11 +1,13 @@
 #include "memory/failing_allocator.h"
 
+#include <fcntl.h>
 #include <pthread.h>
 #include <sys/mman.h>
 #include <sys/types.h>
 
 #include <atomic>
 #include <cerrno>
+#include <cstdarg>
 #include <cstddef>
 #include <new>
 
@@ -72,6 +74,9 @@ void* __real__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) n
 
 int __real_pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
                           void* (*entry)(void*), void* argument);
+int __real_pthread_mutex_init(pthread_mutex_t* mutex, const pthread_mutexattr_t* attributes);
+int __real_open(const char* path, int flags, ...);
+int __real_ftruncate(int file, off_t bytes);
 int __real_shm_open(const char* name, int flags, mode_t mode);
 void* __real_mmap(void* address, std::size_t bytes, int protection, int flags, int file,
                   off_t offset);
@@ -110,6 +115,30 @@ int __wrap_pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
                           void* (*entry)(void*), void* argument) {
     if (!MayAllocate()) return EAGAIN;
     return __real_pthread_create(thread, attributes, entry, argument);
+}
+
+int __wrap_pthread_mutex_init(pthread_mutex_t* mutex, const pthread_mutexattr_t* attributes) {
+    if (!MayAllocate()) return ENOMEM;
+    return __real_pthread_mutex_init(mutex, attributes);
+}
+
+int __wrap_open(const char* path, int flags, ...) {
+    mode_t mode = 0;
+    if ((flags & (O_CREAT | O_TMPFILE)) != 0) {
+        va_list arguments;
+        va_start(arguments, flags);
+        mode = va_arg(arguments, mode_t);
+        va_end(arguments);
+    }
+    if (MayAllocate()) return __real_open(path, flags, mode);
+    errno = EMFILE;
+    return -1;
+}
+
+int __wrap_ftruncate(int file, off_t bytes) {
+    if (MayAllocate()) return __real_ftruncate(file, bytes);
+    errno = ENOSPC;
+    return -1;
 }
 
 int __wrap_shm_open(const char* name, int flags, mode_t mode) {
