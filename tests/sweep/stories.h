@@ -70,6 +70,8 @@ class Client {
     /// What the calls answered since Reset.
     std::size_t CountCalls() const { return callCount; }
     const Call& GetCall(std::size_t index) const { return calls[index]; }
+    /// A code that no frame ends with, of a frame or of its callback since Reset, or 0.
+    std::uint32_t GetStrangeFrameCode() const;
     const Zentara_Frame& GetGrabbed() const { return frames[0].record; }
 
   private:
@@ -101,6 +103,7 @@ class Client {
     std::uint32_t queued = 0;
     bool isPatient = true;
     std::atomic<std::uint32_t> served{0};
+    std::atomic<std::uint32_t> strangeCode{0};
 };
 
 /// Where a story begins and ends.
@@ -110,7 +113,8 @@ struct Story {
     std::string_view name;
     Stage begins;
     void (*run)(Client& client);
-    Stage ends;  ///< Without a failure.
+    Stage ends;           ///< Without a failure.
+    bool dependsOnModel;  ///< Goes another way with another model.
 };
 
 extern const Story Stories[8];

@@ -10,15 +10,22 @@
 
 namespace ZV::Test {
 
-/// A simulated camera of a sweep; all have a sensor of Client::Width by Client::Height.
+/// A simulated world of a sweep and its first camera, which the stories use; all sensors are of
+/// Client::Width by Client::Height.
 struct SweepCamera {
     std::string_view name;
     std::string_view base;      ///< Built-in scenario or model.
+    std::string_view sensor;    ///< Further keys of its sensor.
     std::string_view extra;     ///< Further keys of the camera.
     std::uint32_t imageFormat;  ///< In which the stories begin.
+    std::string_view others;    ///< Further cameras.
+    bool hasAllStories;         ///< Else those that go another way with this one.
 };
 
-extern const SweepCamera SweepCameras[10];
+extern const SweepCamera SweepCameras[14];
+
+/// Whether the story is run with the camera.
+bool HasStory(std::size_t camera, std::size_t story);
 
 enum class Failure {
     Fails,
