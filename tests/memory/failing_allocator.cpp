@@ -5,11 +5,16 @@
 #include <sys/mman.h>
 #include <sys/types.h>
 
+#include <array>
 #include <atomic>
 #include <cerrno>
 #include <cstdarg>
 #include <cstddef>
+#include <cstdlib>
+#include <mutex>
 #include <new>
+
+#include "support/rounds.h"
 
 // The linker's --wrap option sends the suite's references to an allocator here, those of the
 // library among them, and gives the allocator itself the name that begins with __real.
@@ -27,7 +32,67 @@ bool MayAllocate() {
     return allocationsLeft.fetch_sub(1) != 1;
 }
 
+/// The addresses of allocations, in a table of open addresses: it must not allocate.
+class LiveTable {
+  public:
+    void Insert(const void* address) {
+        const std::lock_guard hold(mutex);
+        if (count > slots.size() / 2) return;
+        std::size_t i = GetHome(address);
+        while (slots[i] != nullptr) i = (i + 1) % slots.size();
+        slots[i] = address;
+        ++count;
+    }
+    void Erase(const void* address) {
+        const std::lock_guard hold(mutex);
+        std::size_t i = GetHome(address);
+        while (slots[i] != nullptr && slots[i] != address) i = (i + 1) % slots.size();
+        if (slots[i] == nullptr) return;
+        --count;
+        CloseGap(i);
+    }
+    std::size_t GetCount() {
+        const std::lock_guard hold(mutex);
+        return count;
+    }
+
+  private:
+    std::size_t GetHome(const void* address) const {
+        return (reinterpret_cast<std::uintptr_t>(address) >> 4) * 0x9E3779B1U % slots.size();
+    }
+    /// What comes behind and would not be found any more moves up.
+    void CloseGap(std::size_t gap) {
+        for (std::size_t i = (gap + 1) % slots.size(); slots[i] != nullptr;
+             i = (i + 1) % slots.size()) {
+            const std::size_t fromHome = (i + slots.size() - GetHome(slots[i])) % slots.size();
+            if (fromHome < (i + slots.size() - gap) % slots.size()) continue;
+            slots[gap] = slots[i];
+            gap = i;
+        }
+        slots[gap] = nullptr;
+    }
+
+    std::mutex mutex;
+    std::array<const void*, std::size_t{1} << 16> slots{};
+    std::size_t count = 0;
+};
+constinit LiveTable liveTable;
+
+template <typename Memory>
+Memory* Note(Memory* memory) {
+    if (!IsSanitized && memory != nullptr && uncountedDepth == 0) liveTable.Insert(memory);
+    return memory;
+}
+
+void Forget(const void* memory) {
+    if (!IsSanitized && memory != nullptr) liveTable.Erase(memory);
+}
+
 }  // namespace
+
+std::size_t CountLiveAllocations() {
+    return liveTable.GetCount();
+}
 
 void BeginAllocations(std::int64_t failing) {
     allocationsLeft = failing;
@@ -57,7 +122,9 @@ UncountedAllocations::~UncountedAllocations() {
 
 }  // namespace ZV::Test
 
+using ZV::Test::Forget;
 using ZV::Test::MayAllocate;
+using ZV::Test::Note;
 
 // A sanitizer's runtime refers to the wrapped names too.
 #pragma GCC visibility push(default)
@@ -67,6 +134,7 @@ extern "C" {
 void* __real_malloc(std::size_t bytes);
 void* __real_calloc(std::size_t count, std::size_t bytes);
 void* __real_realloc(void* memory, std::size_t bytes);
+void __real_free(void* memory);
 void* __real__Znwm(std::size_t bytes);
 void* __real__ZnwmRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept;
 void* __real__Znam(std::size_t bytes);
@@ -82,33 +150,41 @@ void* __real_mmap(void* address, std::size_t bytes, int protection, int flags, i
                   off_t offset);
 
 void* __wrap_malloc(std::size_t bytes) {
-    return MayAllocate() ? __real_malloc(bytes) : nullptr;
+    return MayAllocate() ? Note(__real_malloc(bytes)) : nullptr;
 }
 
 void* __wrap_calloc(std::size_t count, std::size_t bytes) {
-    return MayAllocate() ? __real_calloc(count, bytes) : nullptr;
+    return MayAllocate() ? Note(__real_calloc(count, bytes)) : nullptr;
 }
 
 void* __wrap_realloc(void* memory, std::size_t bytes) {
-    return MayAllocate() ? __real_realloc(memory, bytes) : nullptr;
+    if (!MayAllocate()) return nullptr;
+    void* const moved = __real_realloc(memory, bytes);
+    if (moved != nullptr) Forget(memory);
+    return Note(moved);
+}
+
+void __wrap_free(void* memory) {
+    Forget(memory);
+    __real_free(memory);
 }
 
 void* __wrap__Znwm(std::size_t bytes) {
     if (!MayAllocate()) throw std::bad_alloc();
-    return __real__Znwm(bytes);
+    return Note(__real__Znwm(bytes));
 }
 
 void* __wrap__ZnwmRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept {
-    return MayAllocate() ? __real__ZnwmRKSt9nothrow_t(bytes, tag) : nullptr;
+    return MayAllocate() ? Note(__real__ZnwmRKSt9nothrow_t(bytes, tag)) : nullptr;
 }
 
 void* __wrap__Znam(std::size_t bytes) {
     if (!MayAllocate()) throw std::bad_alloc();
-    return __real__Znam(bytes);
+    return Note(__real__Znam(bytes));
 }
 
 void* __wrap__ZnamRKSt9nothrow_t(std::size_t bytes, const std::nothrow_t& tag) noexcept {
-    return MayAllocate() ? __real__ZnamRKSt9nothrow_t(bytes, tag) : nullptr;
+    return MayAllocate() ? Note(__real__ZnamRKSt9nothrow_t(bytes, tag)) : nullptr;
 }
 
 int __wrap_pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
@@ -155,5 +231,23 @@ void* __wrap_mmap(void* address, std::size_t bytes, int protection, int flags, i
 }
 
 }  // extern "C"
+
+// The standard library deletes here, too, what inline code of the suite has made. A sanitizer has
+// operators of its own.
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
+void operator delete(void* memory) noexcept {
+    Forget(memory);
+    __real_free(memory);
+}
+void operator delete[](void* memory) noexcept {
+    operator delete(memory);
+}
+void operator delete(void* memory, std::size_t) noexcept {
+    operator delete(memory);
+}
+void operator delete[](void* memory, std::size_t) noexcept {
+    operator delete(memory);
+}
+#endif
 
 #pragma GCC visibility pop

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 
 namespace ZV::Test {
@@ -18,6 +19,10 @@ bool HasRefusedAllocation();
 
 /// How many are left before the one that is to be refused, that one included.
 std::int64_t CountAllocationsLeft();
+
+/// Allocations of memory that are not given back yet, of those that count; 0 under a sanitizer,
+/// which looks at the end of the process.
+std::size_t CountLiveAllocations();
 
 /// While it lives, what its thread allocates is neither counted nor refused.
 class UncountedAllocations {

@@ -1,8 +1,9 @@
 #include "sweep/stories.h"
 
+#include <algorithm>
 #include <chrono>
 #include <condition_variable>
-#include <cstring>
+#include <cstdlib>
 #include <mutex>
 #include <thread>
 
@@ -120,7 +121,7 @@ Aborting::~Aborting() {
 
 Client::Client() {
     for (Frame& frame : frames) {
-        frame.pixels.resize(BufferBytes);
+        frame.pixels.assign(BufferBytes + GuardBytes, Guard);
         frame.record.pBuffer = frame.pixels.data();
         frame.record.bufferSize = BufferBytes;
     }
@@ -310,6 +311,33 @@ void Client::Expose() {
     (void)Note("Zentara_AutoExpose", Zentara_AutoExpose(&settings, 0, 0, Width, Height));
 }
 
+void Client::Finish() {
+    const Zentara_Frame& grabbed = frames[0].record;
+    const bool isDeep = Zentara_is16bit(grabbed.format) != 0;
+    SetWord(settings, zprmPostProcessImageFormat, isDeep ? zfmtRGB48 : zfmtRGB24);
+    SetWord(settings, zprmPostProcessBayerAlgorithm, zbayerBicubicFaster);
+    Zentara_Frame copied{};
+    (void)Note("Zentara_PostProcessSingleFrame",
+               Zentara_PostProcessSingleFrame(handle, &settings, &grabbed, &copied));
+    std::free(copied.pBuffer);
+    (void)Note("Zentara_PostProcessSingleFrame",
+               Zentara_PostProcessSingleFrame(handle, &settings, &grabbed, &frames[1].record));
+    frames[2].record.format = isDeep ? zfmtRGB48 : zfmtXRGB32;
+    (void)Note("Zentara_BayerToRgb",
+               Zentara_BayerToRgb(zbayerBicubicFaster, &grabbed, &frames[2].record));
+    frames[3].record.height = 2 * grabbed.height;
+    (void)Note("Zentara_BayerZoomVert",
+               Zentara_BayerZoomVert(zbayerFast, &grabbed, &frames[3].record));
+}
+
+bool Client::HasFramesInOrder() const {
+    return std::all_of(frames.begin(), frames.end(), [](const Frame& frame) {
+        const auto guards = frame.pixels.end() - static_cast<std::ptrdiff_t>(GuardBytes);
+        return frame.record.pBuffer == frame.pixels.data() && frame.record.size <= BufferBytes &&
+               std::all_of(guards, frame.pixels.end(), [](auto byte) { return byte == Guard; });
+    });
+}
+
 void Client::TakeEveryLock() {
     if (!IsOpen()) return;
     (void)Note("Zentara_QueueSettings", Zentara_QueueSettings(handle, nullptr, nullptr, 0, 0, 0));
@@ -317,7 +345,7 @@ void Client::TakeEveryLock() {
     (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 0));
 }
 
-const Story Stories[8] = {
+const Story Stories[9] = {
     {"list", Stage::Loaded,
      [](Client& client) {
          client.List();
@@ -330,6 +358,7 @@ const Story Stories[8] = {
      false},
     {"balance", Stage::Opened, [](Client& client) { client.Balance(); }, Stage::Opened, false},
     {"expose", Stage::Opened, [](Client& client) { client.Expose(); }, Stage::Opened, false},
+    {"finish", Stage::Grabbed, [](Client& client) { client.Finish(); }, Stage::Opened, true},
     {"close", Stage::Streaming, [](Client& client) { client.Close(); }, Stage::Loaded, false},
     {"release", Stage::Streaming, [](Client& client) { client.Release(); }, Stage::Unloaded, false},
 };

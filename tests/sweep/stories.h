@@ -60,6 +60,9 @@ class Client {
     void Balance();
     void Expose();
 
+    /// The calls that finish a single frame, on the one that was grabbed last.
+    void Finish();
+
     /// Calls for which locks must be free: they return. `deliveryLock`, `queueLock`, `streamLock`;
     /// an image through the same camera takes the rest.
     void TakeEveryLock();
@@ -72,12 +75,16 @@ class Client {
     const Call& GetCall(std::size_t index) const { return calls[index]; }
     /// A code that no frame ends with, of a frame or of its callback since Reset, or 0.
     std::uint32_t GetStrangeFrameCode() const;
+    /// Nothing was written behind any buffer, and no frame says that it is longer than its own.
+    bool HasFramesInOrder() const;
     const Zentara_Frame& GetGrabbed() const { return frames[0].record; }
 
   private:
     static constexpr std::size_t CallsMax = 256;
     /// Room for four words of two bytes a pixel.
     static constexpr std::uint32_t BufferBytes = Width * Height * 8;
+    static constexpr std::size_t GuardBytes = 64;
+    static constexpr std::uint8_t Guard = 0xA5;
     struct Frame {
         Zentara_Frame record{};
         std::vector<std::uint8_t> pixels;
@@ -107,7 +114,7 @@ class Client {
 };
 
 /// Where a story begins and ends.
-enum class Stage { Unloaded, Loaded, Opened, Streaming };
+enum class Stage { Unloaded, Loaded, Opened, Grabbed, Streaming };
 
 struct Story {
     std::string_view name;
@@ -117,7 +124,7 @@ struct Story {
     bool dependsOnModel;  ///< Goes another way with another model.
 };
 
-extern const Story Stories[8];
+extern const Story Stories[9];
 
 /// Ends calls that wait for an image that will not come: while it lives, a call that goes on for
 /// long after something has failed is aborted, as a client would.

@@ -270,6 +270,7 @@ bool Runner::Prepare() {
         client.Open();
         client.Begin(camera.imageFormat);
     }
+    if (story.begins == Stage::Grabbed) client.Grab();
     if (story.begins == Stage::Streaming) client.StartStream();
     firstCall = client.CountCalls();
     return HasGoodCalls(0, "before the story");
@@ -301,6 +302,7 @@ void Runner::CheckResults(const CountedStory* expected) {
         Complain(std::string(call.name) + " gives " + std::to_string(call.result) +
                  ", which no table has");
     }
+    if (!client.HasFramesInOrder()) Complain("a frame is not in order");
     if (client.GetStrangeFrameCode() != 0) {
         Complain("a frame has the code " + std::to_string(client.GetStrangeFrameCode()));
     }
@@ -533,6 +535,7 @@ CountedStory CountStory(std::size_t camera, std::size_t story) {
 RoundOutcome RunRound(const Round& round, const CountedStory& counted) {
     (void)StartHelpers();
     const Watchdog watchdog(round.GetText());
+    const std::size_t liveBefore = CountLiveAllocations();
     Runner runner(round.camera, round.story);
     RoundOutcome outcome;
     if (runner.Prepare()) {
@@ -549,6 +552,8 @@ RoundOutcome RunRound(const Round& round, const CountedStory& counted) {
     runner.CheckWhatIsLeft(&round);
     outcome.problems = runner.problems;
     CheckBelongings(&outcome.problems);
+    const std::size_t live = CountLiveAllocations();
+    if (outcome.problems.empty() && live > liveBefore) outcome.leaked = live - liveBefore;
     return outcome;
 }
 

@@ -61,6 +61,7 @@ struct CountedStory {
 CountedStory CountStory(std::size_t camera, std::size_t story);
 
 struct RoundOutcome {
+    std::size_t leaked = 0;  ///< Allocations that are left when all is released.
     bool hasFailed = false;  ///< Whether what was to fail came at all.
     std::uint32_t code = 0;  ///< Of the request that failed.
     /// What does not stand as it should; empty when all is well.

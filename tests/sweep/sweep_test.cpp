@@ -265,6 +265,10 @@ void Sweeper::Run(const Round& round) {
         outcome = RunOnce(round);
         if (!outcome.hasFailed) outcome.problems.emplace_back("what is to fail does not come");
     }
+    // What is made once and stays is no leak.
+    if (outcome.leaked != 0 && RunOnce(round).leaked != 0) {
+        outcome.problems.push_back(std::to_string(outcome.leaked) + " allocations are left");
+    }
     tally.Add(round, outcome);
     ++done;
     for (const std::string& problem : outcome.problems) {
