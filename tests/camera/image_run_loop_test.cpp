@@ -71,6 +71,7 @@ TEST_F(CameraWithARunLoop, DropsARefusedFrameInTheFreeMode) {
 
     ASSERT_TRUE(AwaitImages(1));
     EXPECT_EQ(FrameStatusGood, client.GetDeliveries()[0].status);
+    EXPECT_EQ(1U, camera->GetStreamCounters().bad.Get());
 }
 
 TEST_F(CameraWithARunLoop, DeliversARefusedFrameAsOutOfSyncInATriggeredMode) {
