@@ -89,5 +89,13 @@ TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
     EXPECT_GT(sums.damaged, 0U);
 }
 
+TEST(Soak, RefusesMoreCamerasThanAListingGives) {
+    const ProgramResult result =
+        RunTool({ZENTARA_BINARY_DIR "/tests/zentara-soak", "--cameras", "11"});
+
+    EXPECT_EQ(2, result.exitCode);
+    EXPECT_THAT(result.errors, testing::HasSubstr("--cameras 1-10"));
+}
+
 }  // namespace
 }  // namespace ZentaraTest
