@@ -1,6 +1,8 @@
 #pragma once
 
 #include <atomic>
+#include <chrono>
+#include <thread>
 
 namespace ZV {
 
@@ -14,14 +16,14 @@ class StaticMutex {
     StaticMutex& operator=(const StaticMutex&) = delete;
 
     void lock() {
+        // No std::atomic::wait: where the system cannot wait for a word, the standard library keeps
+        // condition variables for it and destroys them at the end of the process, which hangs when
+        // the system has killed a thread within one.
         while (isTaken.exchange(true, std::memory_order_acquire)) {
-            isTaken.wait(true, std::memory_order_relaxed);
+            std::this_thread::sleep_for(std::chrono::microseconds(100));
         }
     }
-    void unlock() {
-        isTaken.store(false, std::memory_order_release);
-        isTaken.notify_one();
-    }
+    void unlock() { isTaken.store(false, std::memory_order_release); }
 
   private:
     std::atomic<bool> isTaken{false};
