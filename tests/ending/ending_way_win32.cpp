@@ -51,7 +51,7 @@ void TellEnd() {
 }
 
 void RestForEver() {
-    for (;;) Sleep(INFINITE);
+    for (;;) WaitForSingleObject(GetCurrentProcess(), INFINITE);
 }
 
 }  // namespace ZV::Test
