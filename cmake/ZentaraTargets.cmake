@@ -16,7 +16,7 @@ endif()
 # Where sources are joined, what is private to one may meet the like of another.
 set(isJoined $<BOOL:$<TARGET_PROPERTY:UNITY_BUILD>>)
 target_compile_options(zentara_flags INTERFACE $<${isJoined}:-Wno-shadow>
-  $<$<AND:${isJoined},$<COMPILE_LANGUAGE:CXX>>:-Wno-subobject-linkage>)
+  $<$<AND:${isJoined},$<COMPILE_LANG_AND_ID:CXX,GNU>>:-Wno-subobject-linkage>)
 if(ZENTARA_SANITIZE)
   # A target that only tests others (ZENTARA_IS_SUITE) is watched for its memory and threads, not for its arithmetic,
   # whose checks double the time that its sources take to compile.
