@@ -193,12 +193,13 @@ std::uint32_t Device::ControlLocked(std::unique_lock<std::mutex>& lock, Call& ca
     const bool hasAddress = IsRegisterRequest(request);
     const std::vector<FaultDescription> matches =
         faults.MatchRequest(request.code, hasAddress, hasAddress ? GetAddress(request) : 0);
-    CarryOutEvents(matches);
+    CarryOutEvents(call.handle, matches);
     if (call.handle->isDead) return PlatformErrorDeviceNotConnected;
     return CarryOut(lock, call, matches);
 }
 
-void Device::CarryOutEvents(const std::vector<FaultDescription>& matches) {
+void Device::CarryOutEvents(const Handle& handle, const std::vector<FaultDescription>& matches) {
+    if (FindFault(matches, FaultKind::BusReset) != nullptr) ResetBus(handle);
     if (FindFault(matches, FaultKind::Unplug) != nullptr) UnplugLocked();
     if (FindFault(matches, FaultKind::Plug) != nullptr) PlugLocked();
 }
@@ -225,6 +226,11 @@ std::uint32_t Device::CarryOut(std::unique_lock<std::mutex>& lock, Call& call,
     }
     const bool isAtOnce = FindFault(matches, FaultKind::AnswerAtOnce) != nullptr ||
                           (request.code == FW_IOCTL_ASYNC_WRITE && !camera.areWritesPended);
+    // A reset finds what is on its way to the camera pended, and ends it.
+    if (FindFault(matches, FaultKind::BusReset) != nullptr && IsRegisterRequest(request)) {
+        if (!mayPend || isAtOnce) return PlatformErrorGeneralFailure;
+        pended.forcedError = PlatformErrorGeneralFailure;
+    }
     if (operation->kind == RequestKind::Transaction && mayPend && !isAtOnce) {
         return Pend(call.handle, pended, true);
     }

@@ -72,7 +72,7 @@ class Device {
 
     // device.cpp: handles and requests. `...Locked` members want `mutex` held.
     std::uint32_t ControlLocked(std::unique_lock<std::mutex>& lock, Call& call);
-    void CarryOutEvents(const std::vector<FaultDescription>& matches);
+    void CarryOutEvents(const Handle& handle, const std::vector<FaultDescription>& matches);
     std::uint32_t CarryOut(std::unique_lock<std::mutex>& lock, Call& call,
                            const std::vector<FaultDescription>& matches);
     std::uint32_t Pend(const Handle& handle, const PendedRequest& pended, bool isTransaction);

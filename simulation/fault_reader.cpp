@@ -28,7 +28,7 @@ constexpr KindRow Kinds[] = {
     {"missingTail", FaultKind::MissingTail, Meets::Packet},
     {"overwriteRequest", FaultKind::OverwriteRequest, Meets::Packet},
     {"frameStart", FaultKind::FrameStart, Meets::Packet},
-    {"busReset", FaultKind::BusReset, Meets::Packet},
+    {"busReset", FaultKind::BusReset, Meets::RequestOrPacket},
     {"unplug", FaultKind::Unplug, Meets::RequestOrPacket},
     {"wrongPsn", FaultKind::WrongPsn, Meets::Frame},
 };

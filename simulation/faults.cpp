@@ -11,6 +11,7 @@ bool IsRequestFault(const FaultDescription& fault) {
         case FaultKind::ShortAnswer:
         case FaultKind::Plug:
             return true;
+        case FaultKind::BusReset:
         case FaultKind::Unplug:
             return fault.request != 0 || fault.code != 0;
         default:

@@ -8,7 +8,7 @@
 namespace ZV::Simulation {
 
 /// What goes wrong. The first four and Plug meet a control request, WrongPsn a frame, the rest a
-/// packet. Unplug meets a control request when `request` or `code` is given.
+/// packet. BusReset and Unplug meet a control request when `request` or `code` is given.
 enum class FaultKind {
     FailRequest,    ///< Ends with `error`: at once, or on completion when `isPended`.
     AnswerAtOnce,   ///< Answered by the call itself instead of pended.

@@ -312,6 +312,23 @@ TEST(Faults, ABusResetCutsTheFrameAndFailsTheRequestUnderWay) {
     EXPECT_EQ(2u, stream.world.ReadFrames().front().frame);
 }
 
+TEST(Faults, ABusResetEndsTheRegisterRequestThatItMeetsAndLetsOthersPass) {
+    const World world(R"({"kind": "busReset", "request": 1, "count": 2})");
+    DriverClient client;
+    std::uint32_t word = 0;
+    TestRequest cut(FW_IOCTL_ASYNC_READ, MakeReadRecord(PrimaryIdentityAddress, 1), 4);
+    TestRequest whole(FW_IOCTL_ASYNC_READ, MakeReadRecord(PrimaryIdentityAddress, 1), 4);
+
+    EXPECT_EQ(0u, client.Call(FW_IOCTL_QUERY_BUSY, &word));
+    ASSERT_EQ(PlatformErrorIoPending, cut.Send(client.handle));
+    ASSERT_TRUE(cut.Wait());
+    ASSERT_EQ(PlatformErrorIoPending, whole.Send(client.handle));
+    ASSERT_TRUE(whole.Wait());
+
+    EXPECT_EQ(PlatformErrorGeneralFailure, cut.error);
+    EXPECT_EQ(0u, whole.error);
+}
+
 TEST(Faults, AFrameUnplugsTheDevice) {
     StreamFaults stream(R"({"kind": "unplug", "frame": 2, "packet": 1})");
 
