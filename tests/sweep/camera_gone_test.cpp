@@ -6,11 +6,13 @@
 
 #include <array>
 #include <memory>
+#include <set>
 #include <string>
 #include <thread>
 
 #include "hal/platform/clock.h"
 #include "support/flat_camera.h"
+#include "support/rounds.h"
 #include "support/settings_words.h"
 
 namespace ZV::Test {
@@ -20,6 +22,13 @@ constexpr std::uint32_t BufferBytes = 64 * 48 * 2;
 constexpr std::uint32_t SpeedIndexSlowest = 3;  ///< Its packets are the smallest.
 constexpr std::uint32_t TriggerSoftware = 5;
 constexpr std::uint32_t PacketsMax = 200;
+constexpr std::uint32_t RequestsMax = 400;
+/// What every close sends by itself.
+constexpr const char* CloseCodes[] = {
+    "FW_IOCTL_STOP",           "FW_IOCTL_DETACH_BUFFERS", "FW_IOCTL_ASYNC_WRITE",
+    "FW_IOCTL_FREE_RESOURCES", "FW_IOCTL_FREE_CHANNEL",   "FW_IOCTL_FREE_BANDWIDTH",
+    "FW_IOCTL_NOTIFY_DISABLE",
+};
 
 struct Sender {
     const char* name;
@@ -58,7 +67,7 @@ class Visitor {
     Visitor& operator=(const Visitor&) = delete;
 
     /// Lists, opens the camera and puts 16 bits in small packets in force.
-    void Open(std::uint32_t triggerMode = 0) {
+    void Open(std::uint32_t triggerMode = 0, std::uint64_t exposureNs = 2'000'000) {
         Zentara_CamListItem items[2] = {};
         std::uint32_t length = 2;
         ASSERT_ZERR(zerrNone, Zentara_ListCameras(items, &length));
@@ -69,7 +78,7 @@ class Visitor {
         SetWord(settings, zprmImageFormat, GetWord(settings, zprmImageFormat) | 1);
         SetWord(settings, zprmReadoutSpeed, SpeedIndexSlowest);
         SetWord(settings, zprmTriggerType, triggerMode);
-        SetWide(settings, zprm64Exposure, 2'000'000);
+        SetWide(settings, zprm64Exposure, exposureNs);
         ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(handle, &settings));
     }
     void QueueFrames(std::size_t count) {
@@ -105,17 +114,31 @@ class Visitor {
         EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle));
         EXPECT_EQ(0U, world.GetState().openHandles);
     }
-    bool HasGone() const {
+    bool HasGone() const { return HasEvent("unplug"); }
+    bool WasReset() const { return HasEvent("busReset"); }
+    /// No frame that the camera has not sent to its end counts as whole.
+    void ExpectOnlySentFramesWhole() const {
+        std::set<std::uint32_t> sent;
         for (const TraceRecord& record : world.ReadTrace()) {
-            if (record.type == "unplug") return true;
+            if (record.type == "frame") sent.insert(record.rollingFrameNumber);
         }
-        return false;
+        for (const auto& frame : frames) {
+            if ((*frame)->errorCode != zerrNone) continue;
+            EXPECT_EQ(1U, sent.count((*frame)->frameNumber)) << (*frame)->frameNumber;
+        }
     }
 
     SimulationWorld world;
     ZentaraHandle handle = 0;
     std::unique_ptr<CallbackLog> log;
     std::vector<std::unique_ptr<ClientFrame>> frames;
+
+  private:
+    bool HasEvent(const char* type) const {
+        const std::vector<TraceRecord> trace = world.ReadTrace();
+        return std::any_of(trace.begin(), trace.end(),
+                           [type](const TraceRecord& record) { return record.type == type; });
+    }
 };
 
 std::string MakePacketFault(const char* kind, std::uint32_t packet) {
@@ -159,24 +182,26 @@ TEST_P(VanishingCamera, GoesOnAfterABusResetAtAnyPacketOfAFrame) {
 
         EXPECT_ZERR(zerrNone, (*visitor.frames.back())->errorCode);
         EXPECT_ZERR(zerrNone, Zentara_SetStreaming(visitor.handle, 0));
+        visitor.ExpectOnlySentFramesWhole();
         EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
-        wasReset = false;
-        for (const TraceRecord& record : visitor.world.ReadTrace()) {
-            wasReset |= record.type == "busReset";
-        }
+        wasReset = visitor.WasReset();
     }
     EXPECT_FALSE(wasReset);
     EXPECT_GT(packet, 2U) << "a frame is of several packets";
 }
 
 TEST_P(VanishingCamera, IsUsedAgainAfterItHasGoneBetweenTwoFrames) {
-    // In real time most of a frame is its exposure.
-    Visitor visitor(MakeScenario(GetParam(), 10));
+    // In real time nearly all of a frame is its exposure.
+    Visitor visitor(MakeScenario(GetParam(), 1));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+    ASSERT_NO_FATAL_FAILURE(visitor.Open(/*triggerMode=*/0, /*exposureNs=*/500'000'000));
     ASSERT_NO_FATAL_FAILURE(visitor.StartStream(6));
     ASSERT_TRUE(visitor.log->WaitForCalls(2));
 
     ASSERT_TRUE(visitor.world.Unplug());
 
+    const ZentaraSimulationState state = visitor.world.GetState();
+    EXPECT_EQ(state.framesSent, state.framesExposed) << "a frame was on its way";
     visitor.ExpectReturn();
 }
 
@@ -222,8 +247,84 @@ TEST_P(VanishingCamera, IsUsedAgainAfterItHasGoneWhileAGrabWaitedForATrigger) {
 INSTANTIATE_TEST_SUITE_P(Senders, VanishingCamera, testing::ValuesIn(Senders),
                          [](const auto& test) { return std::string(test.param.name); });
 
+TEST_P(VanishingCamera, GoesOnAfterABusResetWhileAStreamWaitedForATrigger) {
+    Visitor visitor(MakeScenario(GetParam()));
+    ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+    ASSERT_NO_FATAL_FAILURE(visitor.Open(TriggerSoftware));
+    ASSERT_NO_FATAL_FAILURE(visitor.StartStream(2));
+    ASSERT_ZERR(zerrNone, Zentara_Trigger(visitor.handle));
+    ASSERT_TRUE(visitor.log->WaitForCalls(1));
+
+    // The trigger's write is pended and ends in an error; the camera waits on.
+    ASSERT_TRUE(visitor.world.AddFault(R"({"kind": "busReset", "code": "FW_IOCTL_ASYNC_WRITE"})"));
+    EXPECT_NE(zerrNone, Zentara_Trigger(visitor.handle));
+    EXPECT_TRUE(visitor.WasReset());
+    ASSERT_ZERR(zerrNone, Zentara_Trigger(visitor.handle));
+    ASSERT_TRUE(visitor.log->WaitForCalls(2));
+    EXPECT_ZERR(zerrNone, (*visitor.frames.back())->errorCode);
+    EXPECT_ZERR(zerrNone, Zentara_SetStreaming(visitor.handle, 0));
+    EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+}
+
+/// A bus that is reset at one request of a listing, an opening or a close.
+class ResetAtRequest : public testing::TestWithParam<Sender> {
+  protected:
+    static void ExpectUse(Visitor& visitor) {
+        ASSERT_NO_FATAL_FAILURE(visitor.Open());
+        ASSERT_NO_FATAL_FAILURE(visitor.ExpectStream());
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+        EXPECT_EQ(0U, visitor.world.GetState().openHandles);
+    }
+};
+
+TEST_P(ResetAtRequest, OfAListingItsFirstSetupOrAnOpeningIsOverWithTheNextListing) {
+    bool wasReset = true;
+    std::uint32_t request = 1;
+    constexpr std::uint32_t Step = IsSanitized ? 5 : 1;
+    for (; wasReset && request < RequestsMax && !HasFailure(); request += Step) {
+        SCOPED_TRACE(request);
+        Visitor visitor(MakeScenario(GetParam()));
+        ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+        ASSERT_TRUE(visitor.world.AddFault(R"({"kind": "busReset", "request": )" +
+                                           std::to_string(request) + "}"));
+
+        Zentara_CamListItem items[2] = {};
+        std::uint32_t length = 2;
+        (void)Zentara_ListCameras(items, &length);  // a read or a write of it may have failed
+        ZentaraHandle opened = 0;
+        if (length != 0 && Zentara_OpenCamera(0, &opened) == zerrNone) {
+            EXPECT_ZERR(zerrNone, Zentara_CloseCamera(opened));
+        }
+
+        wasReset = visitor.WasReset();
+        ASSERT_NO_FATAL_FAILURE(ExpectUse(visitor));
+    }
+    EXPECT_FALSE(wasReset);
+    EXPECT_GT(request, 50U) << "a listing sets the camera up";
+}
+
+TEST_P(ResetAtRequest, OfACloseIsOverWithTheNextListing) {
+    // By their codes: buffers are attached beside a close.
+    for (const char* code : CloseCodes) {
+        SCOPED_TRACE(code);
+        Visitor visitor(MakeScenario(GetParam()));
+        ASSERT_NO_FATAL_FAILURE(visitor.StartStream(2));
+        ASSERT_TRUE(visitor.log->WaitForCalls(2));
+        ASSERT_TRUE(visitor.world.AddFault(R"({"kind": "busReset", "code": ")" + std::string(code) +
+                                           R"("})"));
+
+        EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
+
+        EXPECT_TRUE(visitor.WasReset());
+        ASSERT_NO_FATAL_FAILURE(ExpectUse(visitor));
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Senders, ResetAtRequest, testing::ValuesIn(Senders),
+                         [](const auto& test) { return std::string(test.param.name); });
+
 /// A camera that goes at one request and is back at one of the next.
-class BriefAbsence : public testing::Test {
+class BriefAbsence : public testing::TestWithParam<Sender> {
   protected:
     static void Interrupt(Visitor& visitor, std::uint32_t request, std::uint32_t length) {
         const auto fault = [&](const char* kind, std::uint32_t number) {
@@ -241,15 +342,13 @@ class BriefAbsence : public testing::Test {
         EXPECT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
         EXPECT_EQ(0U, visitor.world.GetState().openHandles);
     }
-
-    static constexpr Sender Plain = Senders[1];
 };
 
-TEST_F(BriefAbsence, OfAnyLengthDuringAnOpeningIsOverWithTheNextListing) {
+TEST_P(BriefAbsence, OfAnyLengthDuringAnOpeningIsOverWithTheNextListing) {
     for (std::uint32_t request = 1; request <= 4 && !HasFailure(); ++request) {
         for (std::uint32_t length = 1; length <= 4 && !HasFailure(); ++length) {
             SCOPED_TRACE(request * 10 + length);
-            Visitor visitor(MakeScenario(Plain));
+            Visitor visitor(MakeScenario(GetParam()));
             ASSERT_ZERR(zerrNone, Zentara_CloseCamera(visitor.handle));
             ASSERT_NO_FATAL_FAILURE(Interrupt(visitor, request, length));
 
@@ -261,12 +360,12 @@ TEST_F(BriefAbsence, OfAnyLengthDuringAnOpeningIsOverWithTheNextListing) {
     }
 }
 
-TEST_F(BriefAbsence, OfAnyLengthDuringACloseIsOverWithTheNextListing) {
+TEST_P(BriefAbsence, OfAnyLengthDuringACloseIsOverWithTheNextListing) {
     std::size_t absences = 0;
     for (std::uint32_t request = 1; request <= 8 && !HasFailure(); ++request) {
         for (std::uint32_t length = 1; length <= 3 && !HasFailure(); ++length) {
             SCOPED_TRACE(request * 10 + length);
-            Visitor visitor(MakeScenario(Plain));
+            Visitor visitor(MakeScenario(GetParam()));
             ASSERT_NO_FATAL_FAILURE(visitor.StartStream(2));
             ASSERT_TRUE(visitor.log->WaitForCalls(2));
             ASSERT_NO_FATAL_FAILURE(Interrupt(visitor, request, length));
@@ -280,6 +379,9 @@ TEST_F(BriefAbsence, OfAnyLengthDuringACloseIsOverWithTheNextListing) {
     }
     EXPECT_GE(absences, 4U);
 }
+
+INSTANTIATE_TEST_SUITE_P(Senders, BriefAbsence, testing::ValuesIn(Senders),
+                         [](const auto& test) { return std::string(test.param.name); });
 
 }  // namespace
 }  // namespace ZV::Test
