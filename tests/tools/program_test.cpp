@@ -512,20 +512,26 @@ TEST(Program, AStreamNamesTheFramesThatAreMissingAndTheErrorsOfTheOthers) {
     EXPECT_EQ(12, report["frames"]);
 }
 
+// Of many frames with a wrong number some come, however many a slow machine drops.
 TEST(Program, AStreamTakesNoWrongNumberForAGap) {
+    std::string faults;
+    for (int frame = 5; frame < 100; frame += 5) {
+        faults += faults.empty() ? "" : ",";
+        faults += R"({"kind": "corruptPacket", "packet": 0, "offset": 8, "bytes": 2, "frame": )" +
+                  std::to_string(frame) + "}";
+    }
     const TracedScenario scenario(
-        R"({"sensor": {"width": 64, "height": 48}, "streamingVersion": 1,
-            "faults": [{"kind": "corruptPacket", "packet": 0, "offset": 8, "bytes": 2,
-                        "frame": 5}]})");
+        R"({"sensor": {"width": 64, "height": 48}, "streamingVersion": 1, "faults": [)" + faults +
+        "]}");
 
     const ProgramResult result =
-        RunProgram({"stream", "0", "--simulation", scenario.GetName(), "--count", "12", "--json"});
+        RunProgram({"stream", "0", "--simulation", scenario.GetName(), "--count", "90", "--json"});
     const json report = json::parse(result.output);
 
     EXPECT_EQ(6, result.exitCode) << result.errors;
-    EXPECT_EQ(1, report["misnumbered"]);
-    EXPECT_LT(report["lastNumber"], 1000) << report.dump();
-    EXPECT_LT(report["drops"], 1000);
+    EXPECT_LE(1, report["misnumbered"]) << report.dump();
+    EXPECT_LT(report["lastNumber"], 10000) << report.dump();
+    EXPECT_LT(report["drops"], 10000);
 }
 
 TEST(Program, TheTextsOfTheLibraryDoNotMixWithItsOwnOutput) {
