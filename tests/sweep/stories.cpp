@@ -311,7 +311,19 @@ void Client::Expose() {
     (void)Note("Zentara_AutoExpose", Zentara_AutoExpose(&settings, 0, 0, Width, Height));
 }
 
+void Client::ReadTables() {
+    constexpr std::uint32_t Keys[] = {zprmReadoutSpeed, zprmTriggerType, zprmImageFormat};
+    for (const std::uint32_t key : Keys) {
+        std::uint32_t table[64];
+        auto size = static_cast<std::int32_t>(std::size(table));
+        (void)Note("Zentara_GetParamSparseTable",
+                   Zentara_GetParamSparseTable(&settings, key, table, &size));
+    }
+    (void)Note("Zentara_PreflightSettings", Zentara_PreflightSettings(handle, &settings));
+}
+
 void Client::Finish() {
+    ReadTables();
     const Zentara_Frame& grabbed = frames[0].record;
     const bool isDeep = Zentara_is16bit(grabbed.format) != 0;
     SetWord(settings, zprmPostProcessImageFormat, isDeep ? zfmtRGB48 : zfmtRGB24);

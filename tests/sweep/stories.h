@@ -60,7 +60,9 @@ class Client {
     void Balance();
     void Expose();
 
-    /// The calls that finish a single frame, on the one that was grabbed last.
+    /// Lists of allowed values, and a block that is mended.
+    void ReadTables();
+    /// These, and the calls that finish a single frame, on the one that was grabbed last.
     void Finish();
 
     /// Calls for which locks must be free: they return. `deliveryLock`, `queueLock`, `streamLock`;
