@@ -16,6 +16,7 @@
 #include "memory/failing_allocator.h"
 #include "support/rounds.h"
 #include "support/settings_words.h"
+#include "support/stored_settings.h"
 #include "support/temporary_folder.h"
 #include "support/wait_until.h"
 
@@ -24,7 +25,7 @@ namespace ZV::Test {
 constexpr std::string_view OtherCamera =
     R"(, {"model": "Folary", "sensor": {"width": 64, "height": 48, "noise": false}})";
 
-const SweepCamera SweepCameras[14] = {
+const SweepCamera SweepCameras[15] = {
     {"mono", "mono", "", "", zfmtMono8, "", true},
     {"old", "old", "", "", zfmtMono8, "", true},
     {"rotated", "rotated", "", R"(, "idlePackets": false)", zfmtMono16, "", true},
@@ -43,6 +44,7 @@ const SweepCamera SweepCameras[14] = {
     // By its sensor it answers as another model.
     {"masked", "mono", R"(, "id": 46)", "", zfmtMono8, "", false},
     {"two", "mono", "", "", zfmtMono8, OtherCamera, false},
+    {"logged", "mono", "", "", zfmtMono8, "", false, true},
 };
 
 bool HasStory(std::size_t camera, std::size_t story) {
@@ -89,14 +91,26 @@ std::string MakeScenario(const SweepCamera& camera) {
            std::string(camera.extra) + "}" + std::string(camera.others) + "]}";
 }
 
+/// The switches of the log while the camera is the one, in the folder of the scenarios.
+void SelectLog(const TemporaryFolder& folder, bool isLogged) {
+    static const StoredSettings settings;
+    settings.Remove();
+    if (!isLogged) return;
+    settings.Write(
+        "outputEnabled = 1\noutputNestedCalls = 1\noutputSettings = 1\noutputGetInfo = 1\n"
+        "outputFrame = 1\noutputSparseTable = 1\noutputToFile = 1\noutputFilePath = " +
+        folder.GetPath("zentara.log") + "\n");
+}
+
 /// The scenario of a camera, in a file of its own; it stays for the next rounds.
 void SelectCamera(std::size_t camera) {
-    static TemporaryFolder* const folder = new TemporaryFolder;
+    static const TemporaryFolder folder;
     static std::size_t selected = std::size(SweepCameras);
     if (selected == camera) return;
-    const std::string path = folder->WriteFile(std::string(SweepCameras[camera].name) + ".json",
-                                               MakeScenario(SweepCameras[camera]));
+    const std::string path = folder.WriteFile(std::string(SweepCameras[camera].name) + ".json",
+                                              MakeScenario(SweepCameras[camera]));
     setenv("ZENTARA_SIMULATION", path.c_str(), 1);
+    SelectLog(folder, SweepCameras[camera].isLogged);
     selected = camera;
 }
 

@@ -20,9 +20,10 @@ struct SweepCamera {
     std::uint32_t imageFormat;  ///< In which the stories begin.
     std::string_view others;    ///< Further cameras.
     bool hasAllStories;         ///< Else those that go another way with this one.
+    bool isLogged = false;      ///< Everything that the debug log can tell goes to a file.
 };
 
-extern const SweepCamera SweepCameras[14];
+extern const SweepCamera SweepCameras[15];
 
 /// Whether the story is run with the camera.
 bool HasStory(std::size_t camera, std::size_t story);
