@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <mutex>
 #include <thread>
 
 #include "hal/platform/clock.h"
@@ -36,7 +37,11 @@ class GrabEnder {
     GrabEnder(const GrabEnder&) = delete;
     GrabEnder& operator=(const GrabEnder&) = delete;
 
-    void SetCamera(ZentaraHandle opened) { handle = opened; }
+    /// The camera whose grab is ended, or 0 for none; no call to the former one goes on then.
+    void SetCamera(ZentaraHandle opened) {
+        const std::lock_guard hold(mutex);
+        handle = opened;
+    }
     /// True when the grab went on for so long without reason that the test has failed.
     bool HasGivenUp() const { return hasGivenUp; }
 
@@ -53,13 +58,15 @@ class GrabEnder {
         // An abort before the grab waits does not count, so it is repeated.
         (void)WaitUntil(
             [&] {
+                const std::lock_guard hold(mutex);
                 if (!isOver() && handle != 0) (void)Zentara_Abort(handle);
                 return isOver();
             },
             std::chrono::seconds(30));
     }
 
-    std::atomic<ZentaraHandle> handle{0};
+    std::mutex mutex;
+    ZentaraHandle handle = 0;  // under `mutex`
     std::atomic<bool> isDone{false};
     std::atomic<bool> hasGivenUp{false};
     std::thread thread;
@@ -100,6 +107,7 @@ TEST_F(FailingAllocation, OfOpenGrabAndCloseGivesACodeAndTheNextRunIsClean) {
             if (opened == zerrNone) {
                 ender.SetCamera(handle);
                 grabbed = Zentara_GrabFrame(handle, frame.Get());
+                ender.SetCamera(0);
                 closed = Zentara_CloseCamera(handle);
             }
             hasRefused = EndAllocations();
