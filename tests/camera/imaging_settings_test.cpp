@@ -5,6 +5,7 @@
 
 #include "camera/bare_camera.h"
 #include "camera/test_camera.h"
+#include "support/wait_until.h"
 
 namespace ZV::Test {
 
@@ -353,7 +354,10 @@ TEST_F(FullReadyCamera, AbortsAWaitWhenTheSoftwareTriggerIsChosen) {
 
     EXPECT_EQ(CameraOk, camera->SetTriggerMode(5));
 
-    EXPECT_TRUE(camera->streaming.abortPending);
+    // A frame of the free run may still be on its way, which is the one that is refused.
+    EXPECT_TRUE(WaitUntil([&] {
+        return camera->streaming.abortPending || camera->GetStreamCounters().refused.Get() == 1;
+    }));
     EXPECT_TRUE(camera->IsCameraStreaming());
 }
 
