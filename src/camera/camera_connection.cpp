@@ -144,6 +144,9 @@ HALStatus MorvaneFWCamera::StartRunLoop() {
 void MorvaneFWCamera::StartExposeDoneThread() {
     (void)HAL_ThreadCleanup(streaming.exposeDoneThread, ThreadEndMs);  // as above
     streaming.exposeDoneThread = nullptr;
+    // A close whose callback lasted has left its signal: it would pass for an exposure's end, or
+    // take one with it when the new thread resets the condition.
+    (void)HAL_ConditionReset(streaming.exposeDoneCondition);  // cannot fail
     streaming.exposeThreadsMade.fetch_add(1);
     streaming.exposeDoneActive = true;
     streaming.exposeThreadsAlive.fetch_add(1);

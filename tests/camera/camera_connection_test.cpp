@@ -190,6 +190,19 @@ TEST_F(OneSlowClient, ACameraOpenedAgainHasOneExposeThreadWhenTheOldCallbackRetu
     EXPECT_FALSE(camera->HasLivingThreads());
 }
 
+TEST_F(OneSlowClient, ACameraOpenedAgainTellsOfNoExposureThatOnlyItsCloseHasSignalled) {
+    camera->streaming.callbacks.Set({nullptr, SlowClient::ExposeDone, &client});
+
+    ASSERT_EQ(CameraOk, camera->OpenCamera());
+
+    const auto isTold = [&] { return client.begun > 1; };
+    EXPECT_FALSE(WaitUntil(isTold, std::chrono::milliseconds(100)));
+    EndExposure();
+    EXPECT_TRUE(WaitUntil(isTold));
+    client.mayLeave = true;
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
+}
+
 TEST_F(OneSlowClient, ACameraDeletedUnderAnExposureCallbackWaitsForIt) {
     ASSERT_EQ(CameraOk, camera->OpenCamera());
     std::atomic<bool> isDeleted{false};
