@@ -1,5 +1,6 @@
 #include "memory/failing_allocator.h"
 
+#include <dlfcn.h>
 #include <fcntl.h>
 #include <pthread.h>
 #include <sys/mman.h>
@@ -10,6 +11,7 @@
 #include <cerrno>
 #include <cstdarg>
 #include <cstddef>
+#include <cstdio>
 #include <cstdlib>
 #include <mutex>
 #include <new>
@@ -144,6 +146,8 @@ int __real_pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
                           void* (*entry)(void*), void* argument);
 int __real_pthread_mutex_init(pthread_mutex_t* mutex, const pthread_mutexattr_t* attributes);
 int __real_open(const char* path, int flags, ...);
+std::FILE* __real_fopen(const char* path, const char* mode);
+void* __real_dlopen(const char* path, int mode);
 int __real_ftruncate(int file, off_t bytes);
 int __real_shm_open(const char* name, int flags, mode_t mode);
 void* __real_mmap(void* address, std::size_t bytes, int protection, int flags, int file,
@@ -209,6 +213,16 @@ int __wrap_open(const char* path, int flags, ...) {
     if (MayAllocate()) return __real_open(path, flags, mode);
     errno = EMFILE;
     return -1;
+}
+
+std::FILE* __wrap_fopen(const char* path, const char* mode) {
+    if (MayAllocate()) return __real_fopen(path, mode);
+    errno = EMFILE;
+    return nullptr;
+}
+
+void* __wrap_dlopen(const char* path, int mode) {
+    return MayAllocate() ? __real_dlopen(path, mode) : nullptr;
 }
 
 int __wrap_ftruncate(int file, off_t bytes) {

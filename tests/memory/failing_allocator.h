@@ -6,9 +6,9 @@
 namespace ZV::Test {
 
 /// From here on counts what the library and the test allocate, on all threads, and refuses number
-/// `failing`, counted from 1. Threads, mutexes of the system, opened and grown files, shared memory
-/// and its mappings count as allocations. Memory
-/// that the standard library's own code or the simulation takes is not counted.
+/// `failing`, counted from 1. Threads, mutexes of the system, opened and grown files, loaded
+/// modules, shared memory and its mappings count as allocations. Memory that the standard library's
+/// own code or the simulation takes is not counted.
 void BeginAllocations(std::int64_t failing);
 
 /// Ends the counting. True when the allocation came that was to be refused.

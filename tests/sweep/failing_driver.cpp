@@ -1,5 +1,8 @@
 #include "sweep/failing_driver.h"
 
+#include <dlfcn.h>
+#include <link.h>
+
 #include <array>
 #include <atomic>
 #include <chrono>
@@ -21,6 +24,10 @@
 
 const ZV::KernelDriver* RealLoadSimulationDriver() __asm__("__real__ZN2ZV20LoadSimulationDriverEv");
 const ZV::KernelDriver* WrapLoadSimulationDriver() __asm__("__wrap__ZN2ZV20LoadSimulationDriverEv");
+
+extern "C" int __real_dladdr1(const void* address, Dl_info* info, void** extra, int flags);
+extern "C" [[gnu::visibility("default")]] int __wrap_dladdr1(const void* address, Dl_info* info,
+                                                             void** extra, int flags);
 
 namespace ZV::Test {
 namespace {
@@ -59,6 +66,8 @@ struct DriverState {
     std::uint32_t reclaimed = 0;
     bool hasEnded = false;
     ZentaraSimulationState stateAtEnd{};
+    ModuleLoads moduleLoads;
+    std::atomic<bool> isImageNameRelative{false};
     HeldRequest held;
     std::thread lateThread;
 };
@@ -294,6 +303,13 @@ const KernelDriver* GetFailingDriver() {
     return &table;
 }
 
+void NoteModuleLoad(bool isLoaded) {
+    ModuleLoads& loads = GetState().moduleLoads;
+    const std::lock_guard hold(GetState().mutex);
+    if (isLoaded) loads.allocationsLeft = CountAllocationsLeft();
+    if (!isLoaded) ++loads.failed;
+}
+
 }  // namespace
 
 void BeginRequests(RequestFailure failure, RequestSeries series, std::uint64_t number) {
@@ -341,6 +357,16 @@ void ForgetEnd() {
     state.hasEnded = false;
 }
 
+ModuleLoads GetModuleLoads() {
+    DriverState& state = GetState();
+    const std::lock_guard hold(state.mutex);
+    return state.moduleLoads;
+}
+
+void NameImageRelatively() {
+    GetState().isImageNameRelative = true;
+}
+
 bool HasEnded(ZentaraSimulationState* held) {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
@@ -351,6 +377,18 @@ bool HasEnded(ZentaraSimulationState* held) {
 }  // namespace ZV::Test
 
 const ZV::KernelDriver* WrapLoadSimulationDriver() {
+    const bool isLoaded = RealLoadSimulationDriver() != nullptr;
     const ZV::Test::UncountedAllocations uncounted;
-    return ZV::Test::GetFailingDriver();
+    ZV::Test::NoteModuleLoad(isLoaded);
+    return isLoaded ? ZV::Test::GetFailingDriver() : nullptr;
+}
+
+int __wrap_dladdr1(const void* address, Dl_info* info, void** extra, int flags) {
+    static link_map relative{};
+    static char name[] = "lib/libzentara.so";
+    const int isFound = __real_dladdr1(address, info, extra, flags);
+    if (isFound == 0 || !ZV::Test::GetState().isImageNameRelative) return isFound;
+    relative.l_name = name;
+    *extra = &relative;
+    return isFound;
 }

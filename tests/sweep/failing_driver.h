@@ -42,6 +42,17 @@ std::uint32_t GetFailedCode();
 /// What was counted since BeginRequests, in order.
 std::vector<CountedRequest> GetCounted(RequestSeries series);
 
+/// What the library has found when it loaded the simulation's module, which stays loaded.
+struct ModuleLoads {
+    std::uint32_t failed = 0;
+    /// CountAllocationsLeft at the load that was good; 0 before.
+    std::int64_t allocationsLeft = 0;
+};
+ModuleLoads GetModuleLoads();
+/// From here on the system names the library's image by a relative path, as it does for one that
+/// was found by such a path.
+void NameImageRelatively();
+
 /// Handles that are open at the driver.
 std::uint32_t CountOpenDevices();
 /// Reservations that the driver had to take back so far, since a handle was closed with them.

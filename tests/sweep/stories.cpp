@@ -357,7 +357,8 @@ void Client::TakeEveryLock() {
     (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 0));
 }
 
-const Story Stories[9] = {
+const Story Stories[10] = {
+    {"load", Stage::Unloaded, [](Client& client) { client.Load(); }, Stage::Loaded, true},
     {"list", Stage::Loaded,
      [](Client& client) {
          client.List();

@@ -126,7 +126,7 @@ struct Story {
     bool dependsOnModel;  ///< Goes another way with another model.
 };
 
-extern const Story Stories[9];
+extern const Story Stories[10];
 
 /// Ends calls that wait for an image that will not come: while it lives, a call that goes on for
 /// long after something has failed is aborted, as a client would.

@@ -16,37 +16,9 @@
 #include "hal/platform/clock.h"
 #include "memory/failing_allocator.h"
 #include "support/rounds.h"
-#include "support/settings_words.h"
-#include "support/stored_settings.h"
-#include "support/temporary_folder.h"
 #include "support/wait_until.h"
 
 namespace ZV::Test {
-
-constexpr std::string_view OtherCamera =
-    R"(, {"model": "Folary", "sensor": {"width": 64, "height": 48, "noise": false}})";
-
-const SweepCamera SweepCameras[15] = {
-    {"mono", "mono", "", "", zfmtMono8, "", true},
-    {"old", "old", "", "", zfmtMono8, "", true},
-    {"rotated", "rotated", "", R"(, "idlePackets": false)", zfmtMono16, "", true},
-    {"folary", "folary", "", "", zfmtBayer8, "", true},
-    {"metrona", "metrona", "", R"(, "idlePackets": false)", zfmtMono16, "", true},
-    {"intensified", "intensified", "", R"(, "writes": "atOnce")", zfmtMono8, "", true},
-    {"colour", "colour", "", R"(, "versions": {"status": "1.1", "command": "1.1"})", zfmtBayer8, "",
-     true},
-    {"wheel", "model:SolvaneG2", "", R"(, "versions": {"control": "2.3", "configuration": "2.7"})",
-     zfmtRGBPlane8, "", true},
-    {"s400", "model:SolvaneF1", "", R"(, "speed": 400, "streamingVersion": 0)", zfmtMono16, "",
-     true},
-    {"tirel", "model:TirelM1", "", R"(, "streamingVersion": 2)", zfmtMono8, "", true},
-    {"dithered", "model:PellanB1", "", "", zfmtMono16, "", false},
-    {"multiplied", "model:SolvaneJ1", "", "", zfmtMono8, "", false},
-    // By its sensor it answers as another model.
-    {"masked", "mono", R"(, "id": 46)", "", zfmtMono8, "", false},
-    {"two", "mono", "", "", zfmtMono8, OtherCamera, false},
-    {"logged", "mono", "", "", zfmtMono8, "", false, true},
-};
 
 bool HasStory(std::size_t camera, std::size_t story) {
     return SweepCameras[camera].hasAllStories || Stories[story].dependsOnModel;
@@ -83,36 +55,6 @@ bool IsKnownResult(ZentaraResult result) {
 Client& GetClient() {
     static Client* const client = new Client;
     return *client;
-}
-
-std::string MakeScenario(const SweepCamera& camera) {
-    return R"({"base": ")" + std::string(camera.base) +
-           R"(", "timeScale": 0, "cameras": [{"sensor": {"width": 64, "height": 48, "noise": false)" +
-           std::string(camera.sensor) + R"(}, "scene": {"kind": "chart", "brightness": 400000})" +
-           std::string(camera.extra) + "}" + std::string(camera.others) + "]}";
-}
-
-/// The switches of the log while the camera is the one, in the folder of the scenarios.
-void SelectLog(const TemporaryFolder& folder, bool isLogged) {
-    static const StoredSettings settings;
-    settings.Remove();
-    if (!isLogged) return;
-    settings.Write(
-        "outputEnabled = 1\noutputNestedCalls = 1\noutputSettings = 1\noutputGetInfo = 1\n"
-        "outputFrame = 1\noutputSparseTable = 1\noutputToFile = 1\noutputFilePath = " +
-        folder.GetPath("zentara.log") + "\n");
-}
-
-/// The scenario of a camera, in a file of its own; it stays for the next rounds.
-void SelectCamera(std::size_t camera) {
-    static const TemporaryFolder folder;
-    static std::size_t selected = std::size(SweepCameras);
-    if (selected == camera) return;
-    const std::string path = folder.WriteFile(std::string(SweepCameras[camera].name) + ".json",
-                                              MakeScenario(SweepCameras[camera]));
-    setenv("ZENTARA_SIMULATION", path.c_str(), 1);
-    SelectLog(folder, SweepCameras[camera].isLogged);
-    selected = camera;
 }
 
 std::size_t CountEntries(const char* folder) {
@@ -264,6 +206,7 @@ class Runner {
     bool HasGoodCalls(std::size_t from, const char* where);
     void CloseForGood(const Round* round);
     void TakeEveryLock();
+    void LoadStill();
     void UseStill(const Round* round);
     void UseAgain(const char* where);
     void CheckRelease();
@@ -279,8 +222,8 @@ class Runner {
 bool Runner::Prepare() {
     client.Reset();
     ForgetEnd();
-    client.Load();
-    if (story.begins != Stage::Loaded) {
+    if (story.begins != Stage::Unloaded) client.Load();
+    if (story.begins > Stage::Loaded) {
         client.List();
         client.Open();
         client.Begin(camera.imageFormat);
@@ -431,7 +374,17 @@ void Runner::CheckRelease() {
     }
 }
 
+/// A load that failed is none; the next one is good.
+void Runner::LoadStill() {
+    if (story.begins != Stage::Unloaded) return;
+    const std::size_t last = client.CountCalls() - 1;
+    if (client.GetCall(last).result == zerrNone) return;
+    client.Load();
+    (void)HasGoodCalls(last + 1, "loaded once more");
+}
+
 void Runner::CheckWhatIsLeft(const Round* round) {
+    LoadStill();
     if (story.ends != Stage::Unloaded) {
         TakeEveryLock();
         if (CountOpenDevices() != 0) UseStill(round);
@@ -462,8 +415,7 @@ const Belongings& GetOwnBelongings() {
     return own;
 }
 
-void CheckBelongings(std::vector<std::string>* problems) {
-    const Belongings& own = GetOwnBelongings();
+void CheckBelongings(const Belongings& own, std::vector<std::string>* problems) {
     Belongings now;
     const bool isBack = WaitUntil([&] {
         now = Belongings{};
@@ -474,12 +426,18 @@ void CheckBelongings(std::vector<std::string>* problems) {
                         " threads and " + std::to_string(now.files - own.files) + " files");
 }
 
+std::size_t FindStory(std::string_view name) {
+    const auto* const found = std::find_if(std::begin(Stories), std::end(Stories),
+                                           [&](const Story& story) { return story.name == name; });
+    return static_cast<std::size_t>(found - std::begin(Stories));
+}
+
 /// A first round with a late request. Returns what it found to be wrong.
 std::vector<std::string> RunFirst() {
     // The first thread of a process brings one of the thread sanitizer's own with it.
     std::thread([] {}).join();
     const Belongings before;
-    Runner runner(0, 2);
+    Runner runner(0, FindStory("grab"));
     (void)runner.Prepare();
     BeginRequests(RequestFailure::CompletesLate, RequestSeries::Calls, 1);
     runner.Run(true);
@@ -509,6 +467,25 @@ constexpr RequestFailure ConvertFailure(Failure failure) {
                                         RequestFailure::DeviceGone,
                                         RequestFailure::None};
     return Table[static_cast<std::size_t>(failure)];
+}
+
+RoundOutcome RunStory(const Round& round, const CountedStory& counted) {
+    Runner runner(round.camera, round.story);
+    RoundOutcome outcome;
+    if (runner.Prepare()) {
+        const bool isRequest = round.failure != Failure::NoMemory;
+        BeginRequests(ConvertFailure(round.failure), round.series, isRequest ? round.number : 0);
+        BeginAllocations(isRequest ? NoAllocation : static_cast<std::int64_t>(round.number));
+        runner.Run(IsHarmless(round));
+        outcome.hasFailed = EndAllocations() || GetFailedCode() != 0;
+        EndRequests();
+        outcome.code = GetFailedCode();
+        runner.CheckResults(IsHarmless(round) ? &counted : nullptr);
+        if (outcome.hasFailed) runner.CheckIsTold(round, counted);
+    }
+    runner.CheckWhatIsLeft(&round);
+    outcome.problems = runner.problems;
+    return outcome;
 }
 
 }  // namespace
@@ -545,30 +522,26 @@ CountedStory CountStory(std::size_t camera, std::size_t story) {
     runner.CheckWhatIsLeft(nullptr);
     counted.problems = runner.problems;
     counted.problems.insert(counted.problems.end(), problems.begin(), problems.end());
-    CheckBelongings(&counted.problems);
+    CheckBelongings(GetOwnBelongings(), &counted.problems);
     return counted;
+}
+
+RoundOutcome RunFirstRound(const Round& round) {
+    const Watchdog watchdog("the first, " + round.GetText());
+    std::thread([] {}).join();  // with it the thread sanitizer's own thread
+    Belongings own;
+    own.threads += HelperThreads;
+    RoundOutcome outcome = RunStory(round, {});
+    CheckBelongings(own, &outcome.problems);
+    return outcome;
 }
 
 RoundOutcome RunRound(const Round& round, const CountedStory& counted) {
     (void)StartHelpers();
     const Watchdog watchdog(round.GetText());
     const std::size_t liveBefore = CountLiveAllocations();
-    Runner runner(round.camera, round.story);
-    RoundOutcome outcome;
-    if (runner.Prepare()) {
-        const bool isRequest = round.failure != Failure::NoMemory;
-        BeginRequests(ConvertFailure(round.failure), round.series, isRequest ? round.number : 0);
-        BeginAllocations(isRequest ? NoAllocation : static_cast<std::int64_t>(round.number));
-        runner.Run(IsHarmless(round));
-        outcome.hasFailed = EndAllocations() || GetFailedCode() != 0;
-        EndRequests();
-        outcome.code = GetFailedCode();
-        runner.CheckResults(IsHarmless(round) ? &counted : nullptr);
-        if (outcome.hasFailed) runner.CheckIsTold(round, counted);
-    }
-    runner.CheckWhatIsLeft(&round);
-    outcome.problems = runner.problems;
-    CheckBelongings(&outcome.problems);
+    RoundOutcome outcome = RunStory(round, counted);
+    CheckBelongings(GetOwnBelongings(), &outcome.problems);
     const std::size_t live = CountLiveAllocations();
     if (outcome.problems.empty() && live > liveBefore) outcome.leaked = live - liveBefore;
     return outcome;

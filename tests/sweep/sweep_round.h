@@ -7,23 +7,9 @@
 
 #include "sweep/failing_driver.h"
 #include "sweep/stories.h"
+#include "sweep/sweep_worlds.h"
 
 namespace ZV::Test {
-
-/// A simulated world of a sweep and its first camera, which the stories use; all sensors are of
-/// Client::Width by Client::Height.
-struct SweepCamera {
-    std::string_view name;
-    std::string_view base;      ///< Built-in scenario or model.
-    std::string_view sensor;    ///< Further keys of its sensor.
-    std::string_view extra;     ///< Further keys of the camera.
-    std::uint32_t imageFormat;  ///< In which the stories begin.
-    std::string_view others;    ///< Further cameras.
-    bool hasAllStories;         ///< Else those that go another way with this one.
-    bool isLogged = false;      ///< Everything that the debug log can tell goes to a file.
-};
-
-extern const SweepCamera SweepCameras[15];
 
 /// Whether the story is run with the camera.
 bool HasStory(std::size_t camera, std::size_t story);
@@ -34,7 +20,7 @@ enum class Failure {
     CompletesInError,
     CompletesLate,
     DeviceGone,
-    NoMemory,  ///< An allocation, thread, shared memory or mapping is refused.
+    NoMemory,  ///< An allocation, thread, file, module, shared memory or mapping is refused.
 };
 inline constexpr std::string_view FailureNames[] = {"fails",     "at-once",     "ends-in-error",
                                                     "ends-late", "device-gone", "no-memory"};
@@ -68,6 +54,11 @@ struct RoundOutcome {
     /// What does not stand as it should; empty when all is well.
     std::vector<std::string> problems;
 };
+
+/// Runs a story in which an allocation is refused as the first use of the library in the process,
+/// which loads the simulation's module, and looks at what it leaves as RunRound does. What is left
+/// of the process's first calls is no leak.
+RoundOutcome RunFirstRound(const Round& round);
 
 /// Runs a story with a failure and looks at what it leaves: result codes, locks, close and release,
 /// the same camera used again, threads, files, and what the driver holds. A round that hangs ends
