@@ -20,15 +20,8 @@ constexpr std::array ErrorRows{
     ErrorRow{zerrUnplugged, "unplugged"},
 };
 
-/// More of the 65536 numbers are taken for a step back.
-constexpr std::uint32_t ForwardMax = 32767;
-
 std::uint32_t GetStep(std::uint64_t from, std::uint16_t to) {
     return static_cast<std::uint16_t>(to - from);
-}
-
-bool IsForward(std::uint32_t step) {
-    return step > 0 && step <= ForwardMax;
 }
 
 }  // namespace
@@ -62,13 +55,17 @@ void StreamSums::CountNumber(std::uint16_t number) {
     }
 }
 
-/// A jump is believed as soon as the next frame goes on from it; one back, which could as well be a
-/// jump ahead by most of the numbers, only if that frame does not go on from the one before it.
+bool StreamSums::IsClose(std::uint32_t step) const {
+    return step > 0 && step <= CloseFrames * numbersPerFrame;
+}
+
+/// A short step is believed unless the next frame belongs before it; a long one, ahead or back,
+/// only when the next frame carries on behind it and not behind the frame before it.
 void StreamSums::Judge(std::uint16_t number, std::uint16_t next) {
     const std::uint32_t jump = GetStep(lastNumber, number);
-    const bool goesOn = IsForward(GetStep(number, next));
-    const bool goesOnFromLast = IsForward(GetStep(lastNumber, next));
-    const bool isWrong = IsForward(jump) ? !goesOn && goesOnFromLast : !goesOn || goesOnFromLast;
+    const bool goesOn = IsClose(GetStep(number, next));
+    const bool goesOnFromLast = IsClose(GetStep(lastNumber, next));
+    const bool isWrong = IsClose(jump) ? !goesOn && goesOnFromLast : !goesOn || goesOnFromLast;
     if (isWrong) {
         ++misnumbered;
     } else {
@@ -95,7 +92,7 @@ void StreamSums::Settle() {
     const auto suspect = std::exchange(doubted, std::nullopt);
     if (!suspect) return;
     const std::uint32_t jump = GetStep(lastNumber, *suspect);
-    if (IsForward(jump)) {
+    if (IsClose(jump)) {
         Advance(jump);
     } else {
         ++misnumbered;

@@ -22,13 +22,17 @@ struct MissingFrames {
 /// The camera numbers its frames in 16 bits; here they go on counting beyond 65535. A loss shows
 /// between two frames that came: what was lost before the first and behind the last is unknown, and
 /// so are whole rounds of the number. A number that jumps is doubted until the next frame, or
-/// `Settle`: one that the next frame does not go on from was wrong, as a damaged header makes it.
-/// Its frame then counts as `misnumbered`, and as missing the number that none came under. Only a
-/// first number that is wrong shows as a gap.
+/// `Settle`. A step of more than `CloseFrames` frames is believed when the next number lies close
+/// behind it, and only then: whatever follows, a wrong number, as a damaged header makes it, moves
+/// nothing. Its frame counts as `misnumbered`, and as missing the number that none came under. So
+/// does a frame between two losses of more than that, and a last one behind such a loss. A first
+/// number that is wrong shows as a gap, and so does a wrong one that happens to lie close ahead.
 class StreamSums {
   public:
     /// Runs of missing frames that are kept; of further ones the count alone.
     static constexpr std::size_t MissingMax = 1000;
+    /// So many frames may be lost behind a jump that is believed.
+    static constexpr std::uint32_t CloseFrames = 64;
 
     /// A frame of `numbersPerFrame` exposures uses up as many numbers.
     explicit StreamSums(std::uint32_t numbersPerFrame);
@@ -58,6 +62,7 @@ class StreamSums {
 
   private:
     void CountNumber(std::uint16_t number);
+    [[nodiscard]] bool IsClose(std::uint32_t step) const;
     void Judge(std::uint16_t number, std::uint16_t next);
     void Advance(std::uint32_t step);
 

@@ -45,12 +45,12 @@ TEST(StreamSumsTest, EachGapNamesItsFrames) {
 
 TEST(StreamSumsTest, TheNumberGoesOnBeyondItsSixteenBits) {
     const StreamSums whole = CountNumbers({65534, 65535, 0, 1});
-    const StreamSums broken = CountNumbers({65533, 1, 32768, 65535, 3});
+    const StreamSums broken = CountNumbers({65533, 1, 32768, 32769, 65535, 3});
 
     EXPECT_EQ(0U, whole.gaps);
     EXPECT_EQ(65537U, whole.GetLastNumber());
-    EXPECT_EQ(3U + 32766U + 32766U + 3U, broken.drops);
-    EXPECT_EQ("65534-65536, 65538-98303, 98305-131070, 131072-131074", broken.DescribeMissing());
+    EXPECT_EQ(3U + 32766U + 32765U + 3U, broken.drops);
+    EXPECT_EQ("65534-65536, 65538-98303, 98306-131070, 131072-131074", broken.DescribeMissing());
 }
 
 TEST(StreamSumsTest, AWrongNumberIsNoGapButItsOwnNumberIsMissing) {
@@ -63,6 +63,28 @@ TEST(StreamSumsTest, AWrongNumberIsNoGapButItsOwnNumberIsMissing) {
         EXPECT_EQ("5", sums.DescribeMissing());
         EXPECT_EQ(7U, sums.GetLastNumber());
     }
+}
+
+TEST(StreamSumsTest, WrongNumbersInARowAreNoGapsAndNoRoundsOfTheNumber) {
+    const StreamSums two = CountNumbers({4, 900, 30000, 7, 8});
+    const StreamSums three = CountNumbers({4, 900, 30000, 20000, 8, 9});
+    const StreamSums back = CountNumbers({4, 65000, 900, 7, 8});
+
+    for (const StreamSums& sums : {two, back}) {
+        EXPECT_EQ(2U, sums.misnumbered);
+        EXPECT_EQ("5-6", sums.DescribeMissing());
+        EXPECT_EQ(8U, sums.GetLastNumber());
+    }
+    EXPECT_EQ(3U, three.misnumbered);
+    EXPECT_EQ("5-7", three.DescribeMissing());
+    EXPECT_EQ(9U, three.GetLastNumber());
+}
+
+TEST(StreamSumsTest, AFrameBetweenTwoLongLossesIsMissingUnderItsNumber) {
+    const StreamSums sums = CountNumbers({4, 200, 400, 401});
+
+    EXPECT_EQ(1U, sums.misnumbered);
+    EXPECT_EQ("5-399", sums.DescribeMissing());
 }
 
 TEST(StreamSumsTest, AWrongNumberBesideALossHidesNothing) {
@@ -88,13 +110,16 @@ TEST(StreamSumsTest, AGapOfMostOfTheNumbersIsBelievedOnceTheStreamGoesOnBehindIt
     EXPECT_EQ("5-49999", sums.DescribeMissing());
 }
 
-TEST(StreamSumsTest, TheLastNumberIsBelievedAheadAndNotBack) {
+TEST(StreamSumsTest, TheLastNumberIsBelievedCloseAheadAndNowhereElse) {
     const StreamSums ahead = CountNumbers({4, 7});
+    const StreamSums farAhead = CountNumbers({4, 900});
     const StreamSums back = CountNumbers({4, 2});
 
     EXPECT_EQ("5-6", ahead.DescribeMissing());
-    EXPECT_EQ(0U, back.gaps);
-    EXPECT_EQ(1U, back.misnumbered);
+    for (const StreamSums& sums : {farAhead, back}) {
+        EXPECT_EQ(0U, sums.gaps);
+        EXPECT_EQ(1U, sums.misnumbered);
+    }
 }
 
 TEST(StreamSumsTest, ADoubtOutlivesTheForgettingOfTheCounts) {
