@@ -289,6 +289,7 @@ void ReportAsJson(const StreamSums& sums, std::uint64_t surplus) {
                              {"errors", errors},
                              {"lastNumber", sums.GetLastNumber()},
                              {"missing", missing},
+                             {"gapsNotNamed", sums.CountUnnamedGaps()},
                              {"surplus", surplus},
                              {"files", sums.files}});
 }

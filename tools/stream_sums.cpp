@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <span>
 #include <utility>
 
 namespace ZentaraProgram {
@@ -114,13 +115,14 @@ double StreamSums::GetMegabytesPerSecond() const {
 }
 
 std::string StreamSums::DescribeMissing() const {
+    const std::size_t described = std::min(missing.size(), DescribedMax);
     std::string text;
-    for (const MissingFrames& run : missing) {
+    for (const MissingFrames& run : std::span(missing).first(described)) {
         if (!text.empty()) text += ", ";
         text += run.first == run.last ? fmt::format("{}", run.first)
                                       : fmt::format("{}-{}", run.first, run.last);
     }
-    if (gaps > missing.size()) text += fmt::format(" and {} more gaps", gaps - missing.size());
+    if (gaps > described) text += fmt::format(" and {} more gaps", gaps - described);
     return text;
 }
 

@@ -30,7 +30,9 @@ struct MissingFrames {
 class StreamSums {
   public:
     /// Runs of missing frames that are kept; of further ones the count alone.
-    static constexpr std::size_t MissingMax = 1000;
+    static constexpr std::size_t MissingMax = 100000;
+    /// Of those, as many as a text names.
+    static constexpr std::size_t DescribedMax = 1000;
     /// So many frames may be lost behind a jump that is believed.
     static constexpr std::uint32_t CloseFrames = 64;
 
@@ -50,9 +52,11 @@ class StreamSums {
     /// Of the last frame but those whose number is doubted or wrong; 0 before the first.
     [[nodiscard]] std::uint64_t GetLastNumber() const { return lastNumber; }
     [[nodiscard]] const std::vector<MissingFrames>& GetMissing() const { return missing; }
+    /// Gaps whose frames are not among the missing ones that are kept.
+    [[nodiscard]] std::uint64_t CountUnnamedGaps() const { return gaps - missing.size(); }
     /// Delivered frames of each error code but 0.
     [[nodiscard]] const std::map<std::uint32_t, std::uint64_t>& GetErrors() const { return errors; }
-    /// As "3-5, 9", with what was not kept at its end; empty when no frame is missing.
+    /// As "3-5, 9", at its end how many gaps it does not name; empty when no frame is missing.
     [[nodiscard]] std::string DescribeMissing() const;
 
     std::uint64_t frames = 0, bytes = 0, damaged = 0, gaps = 0, drops = 0, files = 0;

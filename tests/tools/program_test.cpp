@@ -509,6 +509,7 @@ TEST(Program, AStreamNamesTheFramesThatAreMissingAndTheErrorsOfTheOthers) {
     }
     EXPECT_TRUE(isThirdMissing) << report.dump();
     EXPECT_EQ(report["drops"], missing);
+    EXPECT_EQ(0, report["gapsNotNamed"]);
     EXPECT_EQ(12, report["frames"]);
 }
 

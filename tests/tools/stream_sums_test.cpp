@@ -173,14 +173,29 @@ TEST(StreamSumsTest, DamagedFramesAreCountedByTheirCode) {
     EXPECT_EQ("code77", ZentaraProgram::GetFrameErrorName(77));
 }
 
-TEST(StreamSumsTest, AStreamFullOfGapsKeepsALimitedList) {
+StreamSums CountGaps(std::size_t gaps) {
     StreamSums sums(1);
-    for (std::uint32_t i = 0; i <= StreamSums::MissingMax + 5; ++i) sums.Count(MakeFrame(2 * i));
+    for (std::size_t i = 0; i <= gaps; ++i) {
+        sums.Count(MakeFrame(static_cast<std::uint32_t>(2 * i)));
+    }
     sums.Settle();
+    return sums;
+}
+
+TEST(StreamSumsTest, AStreamFullOfGapsKeepsALimitedList) {
+    const StreamSums sums = CountGaps(StreamSums::MissingMax + 5);
 
     EXPECT_EQ(StreamSums::MissingMax, sums.GetMissing().size());
     EXPECT_EQ(StreamSums::MissingMax + 5, sums.gaps);
-    EXPECT_THAT(sums.DescribeMissing(), testing::EndsWith(" and 5 more gaps"));
+    EXPECT_EQ(5U, sums.CountUnnamedGaps());
+}
+
+TEST(StreamSumsTest, ATextOfManyGapsTellsHowManyItDoesNotName) {
+    const StreamSums sums = CountGaps(StreamSums::DescribedMax + 5);
+
+    EXPECT_EQ(StreamSums::DescribedMax + 5, sums.GetMissing().size());
+    EXPECT_EQ(0U, sums.CountUnnamedGaps());
+    EXPECT_THAT(sums.DescribeMissing(), testing::EndsWith(", 1999 and 5 more gaps"));
 }
 
 }  // namespace
