@@ -220,6 +220,7 @@ std::uint32_t Device::CarryOut(std::unique_lock<std::mutex>& lock, Call& call,
                                          : Block(lock, call.handle);
     }
     if (const FaultDescription* fault = FindFault(matches, FaultKind::FailRequest)) {
+        ++requestsFailed;
         if (!fault->isPended || !mayPend) return fault->error;
         pended.forcedError = fault->error;
         return Pend(call.handle, pended, true);
@@ -434,6 +435,7 @@ void Device::AddState(ZentaraSimulationState* state) const {
         state->attachedBuffers += static_cast<std::uint32_t>(handle->attached.size());
     }
     state->requestsServed += requestsServed;
+    state->requestsFailed += requestsFailed;
     state->framesExposed += framesExposed;
     state->framesSent += framesSent;
     state->isStreaming |= sender.isOn;

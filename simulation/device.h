@@ -196,7 +196,7 @@ class Device {
     std::uint64_t openings = 0;
     bool isPlugged = true;
     bool isEnding = false;
-    std::uint32_t requestsServed = 0;
+    std::uint32_t requestsServed = 0, requestsFailed = 0;
     std::uint64_t framesExposed = 0, framesSent = 0, framesBegun = 0;
     std::uint32_t wheelStep = 0;
     std::uint64_t cycles = 0;

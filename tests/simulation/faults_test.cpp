@@ -38,6 +38,7 @@ TEST(Faults, ARequestFailsAtItsNumber) {
     EXPECT_EQ(0u, client.Write(ControlAddress + 4, 0));
     EXPECT_EQ(PlatformErrorBusy, client.Read(ControlAddress, &value));
     EXPECT_EQ(0u, client.Read(ControlAddress, &value));
+    EXPECT_EQ(1u, world.GetState().requestsFailed);
 }
 
 TEST(Faults, ARequestFailsOnItsCompletionWhenThatIsAskedFor) {
