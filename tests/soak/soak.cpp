@@ -1,3 +1,4 @@
+#include <fmt/format.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -16,6 +17,7 @@
 #include <thread>
 #include <vector>
 
+#include "simulation/zentara_simulation.h"
 #include "soak/process_usage.h"
 #include "soak/soaked_camera.h"
 #include "support/wait_until.h"
@@ -46,7 +48,8 @@ void PartOutputs() {
 struct Options {
     std::uint64_t seconds = 60, minuteSeconds = 60;
     std::uint32_t cameras = 10;
-    double faults = 0.001;
+    double faults = 0.001, requestFaults = 0.001;
+    std::string fault;  ///< Of every camera, besides.
     std::string state;
 };
 
@@ -65,6 +68,9 @@ constexpr OptionRow OptionRows[] = {
          o->cameras = static_cast<std::uint32_t>(std::strtoul(text, nullptr, 10));
      }},
     {"--faults", [](const char* text, Options* o) { o->faults = std::strtod(text, nullptr); }},
+    {"--request-faults",
+     [](const char* text, Options* o) { o->requestFaults = std::strtod(text, nullptr); }},
+    {"--fault", [](const char* text, Options* o) { o->fault = text; }},
     {"--state", [](const char* text, Options* o) { o->state = text; }},
 };
 
@@ -90,6 +96,30 @@ std::string MakeFaults(double rate) {
         faults += std::string(R"({"kind": ")") + kind + R"(", "probability": )" +
                   std::to_string(rate / Kinds.size()) + "}";
     }
+    return faults;
+}
+
+/// Control requests that fail at the rate, by the call itself or when they end. A buffer that
+/// cannot be attached ends a stream's loop, and there is one for each request of a stream: they
+/// fail less often.
+std::vector<std::string> MakeRequestFaults(double rate) {
+    constexpr double AttachShare = 0.01;
+    std::vector<std::string> faults;
+    const auto add = [&](const char* code, double share) {
+        for (const char* isPended : {"false", "true"}) {
+            faults.push_back(fmt::format(
+                R"({{"kind": "failRequest", "code": "FW_IOCTL_{}", "pended": {}, "probability": {}}})",
+                code, isPended, rate * share / 2));
+        }
+    };
+    if (rate <= 0) return faults;
+    for (const char* code : {"ALLOC_BANDWIDTH", "ALLOC_CHANNEL", "ALLOC_RESOURCES", "ASYNC_READ",
+                             "ASYNC_WRITE", "DETACH_BUFFERS", "FREE_BANDWIDTH", "FREE_CHANNEL",
+                             "FREE_RESOURCES", "LISTEN", "NOTIFY_DISABLE", "NOTIFY_ENABLE",
+                             "NOTIFY_WAIT", "QUERY_BUSY", "STOP", "STREAM_ENTER", "STREAM_LEAVE"}) {
+        add(code, 1);
+    }
+    add("ATTACH_BUFFER", AttachShare);
     return faults;
 }
 
@@ -144,6 +174,7 @@ class Soak {
         for (std::uint32_t i = 0; i < length; ++i) {
             cameras.push_back(std::make_unique<SoakedCamera>(i, items[i].uniqueId, listMutex));
         }
+        if (!AddFaults()) return false;
         for (const auto& camera : cameras) {
             threads.emplace_back([this, &camera] { camera->Run(isOver); });
         }
@@ -187,6 +218,17 @@ class Soak {
     }
 
   private:
+    /// Once all cameras are listed: they fail those that use them.
+    bool AddFaults() const {
+        std::vector<std::string> faults = MakeRequestFaults(options.requestFaults);
+        if (!options.fault.empty()) faults.push_back(options.fault);
+        for (std::uint32_t i = 0; i < options.cameras; ++i) {
+            for (const std::string& fault : faults) {
+                if (ZentaraSimulation_AddFault(i, fault.c_str(), nullptr, 0) != 0) return false;
+            }
+        }
+        return true;
+    }
     bool DoAllStream() const {
         return std::all_of(cameras.begin(), cameras.end(),
                            [](const auto& camera) { return camera->GetSums().frames > 0; });
@@ -226,8 +268,8 @@ int Run(int count, char** arguments) {
     Options options;
     if (!ReadOptions(count, arguments, &options)) {
         std::fputs(
-            "zentara-soak [--seconds N] [--cameras 1-10] [--faults RATE] [--state FILE] "
-            "[--minute SECONDS]\n",
+            "zentara-soak [--seconds N] [--cameras 1-10] [--faults RATE] [--request-faults RATE] "
+            "[--fault JSON] [--state FILE] [--minute SECONDS]\n",
             stderr);
         return 2;
     }

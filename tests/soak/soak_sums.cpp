@@ -25,12 +25,28 @@ constexpr std::array Rows{
     SumRow{"waiting", &SoakSums::waiting},   SumRow{"unaccounted", &SoakSums::unaccounted},
     SumRow{"changes", &SoakSums::changes},   SumRow{"changesDropped", &SoakSums::changesDropped},
     SumRow{"restarts", &SoakSums::restarts}, SumRow{"reopens", &SoakSums::reopens},
-    SumRow{"unplugs", &SoakSums::unplugs},   SumRow{"failures", &SoakSums::failures},
+    SumRow{"unplugs", &SoakSums::unplugs},   SumRow{"requestsFailed", &SoakSums::requestsFailed},
+    SumRow{"stalls", &SoakSums::stalls},     SumRow{"failures", &SoakSums::failures},
 };
 
-const SumRow* FindRow(const std::string& name) {
+/// Calls `visit` with the name and the value of each sum; of those by code, the ones that are not
+/// 0.
+template <typename Sums, typename Visit>
+void ForEachSum(Sums& sums, const Visit& visit) {
+    for (const SumRow& row : Rows) visit(std::string(row.name), sums.*row.sum);
+    for (std::size_t code = 0; code < SoakSums::CodeCount; ++code) {
+        if (sums.failedWith[code] == 0) continue;
+        visit("failedWith" + std::to_string(code), sums.failedWith[code]);
+    }
+}
+
+/// The sum of this name, or null.
+std::uint64_t* FindSum(SoakSums& sums, const std::string& name) {
     for (const SumRow& row : Rows) {
-        if (row.name == name) return &row;
+        if (row.name == name) return &(sums.*row.sum);
+    }
+    for (std::size_t code = 0; code < SoakSums::CodeCount; ++code) {
+        if (name == "failedWith" + std::to_string(code)) return &sums.failedWith[code];
     }
     return nullptr;
 }
@@ -39,14 +55,15 @@ const SumRow* FindRow(const std::string& name) {
 
 SoakSums& SoakSums::operator+=(const SoakSums& other) {
     for (const SumRow& row : Rows) this->*row.sum += other.*row.sum;
+    for (std::size_t code = 0; code < CodeCount; ++code) failedWith[code] += other.failedWith[code];
     return *this;
 }
 
 std::string Describe(const SoakSums& sums) {
     std::ostringstream text;
-    for (const SumRow& row : Rows) {
-        text << (&row == Rows.data() ? "" : ", ") << row.name << " " << sums.*row.sum;
-    }
+    ForEachSum(sums, [&](const std::string& name, std::uint64_t sum) {
+        text << (text.tellp() == 0 ? "" : ", ") << name << " " << sum;
+    });
     return text.str();
 }
 
@@ -57,9 +74,9 @@ bool ReadState(const std::string& path, SoakSums* sums) {
     std::string name;
     std::uint64_t value = 0;
     while (file >> name >> value) {
-        const SumRow* row = FindRow(name);
-        if (row == nullptr) return false;
-        sums->*row->sum = value;
+        std::uint64_t* const sum = FindSum(*sums, name);
+        if (sum == nullptr) return false;
+        *sum = value;
     }
     return file.eof();
 }
@@ -68,7 +85,9 @@ bool WriteState(const std::string& path, const SoakSums& sums) {
     const std::string unfinished = path + ".new";
     {
         std::ofstream file(unfinished);
-        for (const SumRow& row : Rows) file << row.name << " " << sums.*row.sum << "\n";
+        ForEachSum(sums, [&](const std::string& name, std::uint64_t sum) {
+            file << name << " " << sum << "\n";
+        });
         file.close();
         if (!file) return false;
     }

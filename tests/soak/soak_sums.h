@@ -1,5 +1,7 @@
 #pragma once
 
+#include <array>
+#include <cstddef>
 #include <cstdint>
 #include <string>
 
@@ -7,6 +9,8 @@ namespace ZV::Soak {
 
 /// What a soak adds up, over all of its runs.
 struct SoakSums {
+    static constexpr std::size_t CodeCount = 33;  ///< Of the flat interface, 0 to 32.
+
     std::uint64_t seconds = 0;
     std::uint64_t frames = 0, bytes = 0, gaps = 0, missing = 0, damaged = 0, repeats = 0;
     std::uint64_t misnumbered = 0;
@@ -18,7 +22,11 @@ struct SoakSums {
     std::uint64_t changes = 0;  ///< Queued settings that were sent.
     std::uint64_t changesDropped = 0;  ///< Queued and never sent, as a last entry is.
     std::uint64_t restarts = 0, reopens = 0, unplugs = 0;
-    std::uint64_t failures = 0;  ///< Calls that failed with no fault to explain it.
+    std::uint64_t requestsFailed = 0;  ///< By a fault.
+    std::uint64_t stalls = 0;          ///< Streams without frames after a request had failed.
+    std::uint64_t failures = 0;        ///< Calls that failed with no fault to explain it.
+    /// Calls that failed with a code of the table after a request had failed.
+    std::array<std::uint64_t, CodeCount> failedWith{};
 
     SoakSums& operator+=(const SoakSums& other);
 };

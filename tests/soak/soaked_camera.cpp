@@ -20,7 +20,41 @@ constexpr std::uint64_t FramesPerRestart = 400;
 constexpr std::uint64_t FramesPerReopen = 1500;
 constexpr std::uint64_t FramesPerUnplug = 4000;
 constexpr auto FrameLimit = 30s;
+/// For a frame once a request of the camera has failed: its loop may have left, or its registers
+/// may not be what the library takes them for.
+constexpr auto FrameLimitAfterFailure = 2s;
+constexpr auto LookInterval = 100ms;
 constexpr auto ListLimit = 10s;
+constexpr int ClosesMax = 3;
+constexpr std::uint32_t AllCameras = 0xFFFFFFFF;
+
+std::uint32_t CountFailed(std::uint32_t camera) {
+    ZentaraSimulationState state{};
+    (void)ZentaraSimulation_GetState(camera, &state);  // zeros without a bus
+    return state.requestsFailed;
+}
+
+/// Cameras that are unplugged or plugged in.
+std::atomic<std::uint64_t> switchesBegun{0}, switchesDone{0};
+
+void Switch(std::uint32_t (*unplugOrPlug)(std::uint32_t camera), std::uint32_t camera) {
+    ++switchesBegun;
+    (void)unplugOrPlug(camera);
+    ++switchesDone;
+}
+
+/// Why a listing may fail, from its begin on: a request of any camera failed, or one came or went.
+class ListingReasons {
+  public:
+    bool AreThere() const {
+        return CountFailed(AllCameras) != failedBefore || switchesBegun != switchesBefore;
+    }
+
+  private:
+    const std::uint64_t switchesBefore = switchesDone;
+    const std::uint32_t failedBefore = CountFailed(AllCameras);
+};
+
 /// Frames that wait for the run loop.
 struct WaitingFrames : MorvaneFWCamera {
     static std::uint64_t Count(const ZCamera& camera) {
@@ -47,64 +81,101 @@ SoakSums SoakedCamera::GetSums() const {
     return sums;
 }
 
-void SoakedCamera::Expect(ZentaraResult result) {
-    if (result == zerrNone) return;
-    std::fprintf(stderr, "camera %u: a call failed with %u\n", position, result);
+void SoakedCamera::Count(std::uint64_t SoakSums::*sum) {
     const std::lock_guard hold(sumsMutex);
-    ++sums.failures;
+    ++(sums.*sum);
+}
+
+std::uint32_t SoakedCamera::CountFailedRequests() const {
+    return CountFailed(position);
+}
+
+/// A call may fail, with a code of the table, when there is a reason. True for none that has
+/// failed.
+bool SoakedCamera::Tell(const char* call, ZentaraResult result, bool isExcused) {
+    if (result == zerrNone) return true;
+    if (isExcused && result < SoakSums::CodeCount) {
+        const std::lock_guard hold(sumsMutex);
+        ++sums.failedWith[result];
+        return false;
+    }
+    std::fprintf(stderr, "camera %u: %s failed with %u\n", position, call, result);
+    Count(&SoakSums::failures);
+    return false;
+}
+
+/// The reason is a request of the camera that has failed since there were `failedBefore`.
+bool SoakedCamera::Judge(const char* call, ZentaraResult result, std::uint32_t failedBefore) {
+    return Tell(call, result, CountFailedRequests() != failedBefore);
+}
+
+/// For a call that sends no request, or none that may fail.
+void SoakedCamera::Expect(const char* call, ZentaraResult result) {
+    (void)Tell(call, result, false);
 }
 
 void SoakedCamera::Run(const std::atomic<bool>& isOver) {
-    if (!Open()) return;
-    QueueAll();
-    BeginStream();
+    if (!Start()) return;
     while (!isOver) {
         if (!TakeTurn()) return;
     }
-    EndStream(false);
-    Expect(Zentara_Abort(handle));  // no callback any more: what has come is counted
+    (void)EndStream();
+    Expect("Zentara_Abort",
+           Zentara_Abort(handle));  // no callback any more: what has come is counted
     Close();
 }
 
 /// False when the camera is lost to the soak.
 bool SoakedCamera::TakeTurn() {
     Slot* slot = Take();
-    if (slot == nullptr) {
-        std::fprintf(stderr, "camera %u: no frame came\n", position);
-        Expect(zerrUnplugged);
-        return Reopen();
-    }
+    if (slot == nullptr) return GoOnWithoutFrames();
     Serve(*slot);
     ++served;
     if (served % FramesPerChange == 0) QueueChange();
-    if (served % FramesPerUnplug == 0) {
-        isPlugged = false;
-        (void)ZentaraSimulation_Unplug(position);
-        {
-            const std::lock_guard hold(sumsMutex);
-            ++sums.unplugs;
-        }
-        return Reopen();
-    }
+    if (served % FramesPerUnplug == 0) return ReopenUnplugged();
     if (served % FramesPerReopen == 0) {
-        {
-            const std::lock_guard hold(sumsMutex);
-            ++sums.reopens;
-        }
+        Count(&SoakSums::reopens);
         return Reopen();
     }
-    if (served % FramesPerRestart == 0) {
-        EndStream(false);
-        BeginStream();
-        const std::lock_guard hold(sumsMutex);
-        ++sums.restarts;
+    return served % FramesPerRestart != 0 || Restart();
+}
+
+bool SoakedCamera::GoOnWithoutFrames() {
+    if (CountFailedRequests() != failedAtOpening) {
+        Count(&SoakSums::stalls);
+        return Reopen();
     }
+    std::fprintf(stderr, "camera %u: no frame came\n", position);
+    Count(&SoakSums::failures);
+    return Reopen();
+}
+
+bool SoakedCamera::ReopenUnplugged() {
+    isPlugged = false;
+    Switch(ZentaraSimulation_Unplug, position);
+    Count(&SoakSums::unplugs);
+    return Reopen();
+}
+
+/// A stream that could not be stopped or started goes on with a new opening.
+bool SoakedCamera::Restart() {
+    if (!EndStream() || !BeginStream()) return Reopen();
+    Count(&SoakSums::restarts);
     return true;
+}
+
+bool SoakedCamera::IsStalled(std::chrono::steady_clock::time_point begin) const {
+    const bool hasFailed = CountFailedRequests() != failedAtOpening;
+    return std::chrono::steady_clock::now() - begin >
+           (hasFailed ? FrameLimitAfterFailure : FrameLimit);
 }
 
 SoakedCamera::Slot* SoakedCamera::Take() {
     std::unique_lock lock(doneMutex);
-    if (!arrived.wait_for(lock, FrameLimit, [this] { return !done.empty(); })) return nullptr;
+    const auto begin = std::chrono::steady_clock::now();
+    while (!arrived.wait_for(lock, LookInterval, [this] { return !done.empty(); })) {
+        if (IsStalled(begin)) return nullptr;
+    }
     Slot* slot = done.front();
     done.pop_front();
     return slot;
@@ -137,19 +208,19 @@ void SoakedCamera::Receive(std::uint64_t userPrivate, std::uint32_t, std::uint32
     slot.camera->arrived.notify_one();
 }
 
-/// The sending of a change fails when the camera is gone.
+/// The sending of a change fails when the camera is gone, or a request since it was queued has.
 void SoakedCamera::ReceiveChange(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
                                  std::uint32_t) {
     const auto& change = *reinterpret_cast<Change*>(static_cast<std::uintptr_t>(userPrivate));
     SoakedCamera& camera = *change.camera;
     if (change.opening != camera.opening) return;
     ++camera.changesMade;
-    if (camera.isPlugged) camera.Expect(errorCode);
+    if (camera.isPlugged) (void)camera.Judge("a change", errorCode, change.failedBefore);
 }
 
 void SoakedCamera::Queue(Slot& slot) {
-    Expect(Zentara_QueueFrame(handle, &slot.frame, Receive, zcbFrameDone,
-                              reinterpret_cast<std::uintptr_t>(&slot), 0));
+    Expect("Zentara_QueueFrame", Zentara_QueueFrame(handle, &slot.frame, Receive, zcbFrameDone,
+                                                    reinterpret_cast<std::uintptr_t>(&slot), 0));
 }
 
 void SoakedCamera::QueueAll() {
@@ -157,49 +228,62 @@ void SoakedCamera::QueueAll() {
 }
 
 void SoakedCamera::QueueChange() {
-    Change& change = changes.emplace_back(Change{this, opening, settings});
+    Change& change = changes.emplace_back(Change{this, opening, CountFailedRequests(), settings});
     Test::SetWide(change.settings, zprm64Exposure, 100000 * (1 + random() % 20));
-    Expect(Zentara_QueueSettings(handle, &change.settings, ReceiveChange, zcbFrameDone,
+    Expect("Zentara_QueueSettings",
+           Zentara_QueueSettings(handle, &change.settings, ReceiveChange, zcbFrameDone,
                                  reinterpret_cast<std::uintptr_t>(&change), 0));
 }
 
+/// False when the camera does not come back in time. What a request has failed is tried again.
 bool SoakedCamera::Open() {
     const std::lock_guard listing(listMutex);
     const auto end = std::chrono::steady_clock::now() + ListLimit;
     while (std::chrono::steady_clock::now() < end) {
+        const ListingReasons reasons;
+        failedAtOpening = CountFailedRequests();
         std::array<Zentara_CamListItem, ListLength> items{};
         std::uint32_t length = ListLength;
-        if (Zentara_ListCameras(items.data(), &length) != zerrNone) continue;
+        const ZentaraResult listed = Zentara_ListCameras(items.data(), &length);
+        if (!Tell("Zentara_ListCameras", listed, reasons.AreThere())) continue;
         auto* const last = items.data() + std::min(length, ListLength);
         auto* const found = std::find_if(
             items.data(), last, [this](const auto& item) { return item.uniqueId == uniqueId; });
-        if (found == last) continue;
-        const ZentaraResult opened = Zentara_OpenCamera(found->cameraId, &handle);
-        if (opened != zerrNone) {
-            handle = {};
-            Expect(opened);
-            return false;
-        }
-        Expect(Zentara_ReadSettingsFromCam(handle, &settings));
-        const auto bytes = reinterpret_cast<ZCamera*>(handle)->GetImageSize();
-        for (Slot& slot : slots) {
-            slot.pixels.assign(bytes, 0);
-            slot.frame = {};
-            slot.frame.pBuffer = slot.pixels.data();
-            slot.frame.bufferSize = bytes;
-        }
-        return true;
+        if (found != last && OpenListed(found->cameraId, failedAtOpening)) return true;
     }
     std::fprintf(stderr, "camera %u: it is not listed\n", position);
-    Expect(zerrBadCameraId);
+    Count(&SoakSums::failures);
     return false;
 }
 
+bool SoakedCamera::OpenListed(std::uint32_t cameraId, std::uint32_t failedBefore) {
+    if (!Judge("Zentara_OpenCamera", Zentara_OpenCamera(cameraId, &handle), failedBefore)) {
+        handle = {};
+        return false;
+    }
+    Prepare();
+    return true;
+}
+
+void SoakedCamera::Prepare() {
+    Expect("Zentara_ReadSettingsFromCam", Zentara_ReadSettingsFromCam(handle, &settings));
+    const auto bytes = reinterpret_cast<ZCamera*>(handle)->GetImageSize();
+    for (Slot& slot : slots) {
+        slot.pixels.assign(bytes, 0);
+        slot.frame = {};
+        slot.frame.pBuffer = slot.pixels.data();
+        slot.frame.bufferSize = bytes;
+    }
+}
+
+/// A close that fails leaves the camera open, and is made once more.
 void SoakedCamera::Close() {
     CountEngine();
     CountChanges();
     const std::lock_guard listing(listMutex);
-    Expect(Zentara_CloseCamera(handle));
+    for (int closes = 0; closes < ClosesMax; ++closes) {
+        if (Judge("Zentara_CloseCamera", Zentara_CloseCamera(handle), failedAtStream)) break;
+    }
     handle = {};
 }
 
@@ -212,7 +296,10 @@ void SoakedCamera::CountEngine() {
         return counters.begun.Get() == SumFates(counters) + WaitingFrames::Count(camera) &&
                counters.delivered.GetSum() == counters.withoutTaker.GetSum() + received;
     });
+    const std::uint32_t failed = CountFailedRequests();
     const std::lock_guard hold(sumsMutex);
+    sums.requestsFailed += failed - failedCounted;
+    failedCounted = failed;
     sums.begun += counters.begun.Get();
     sums.dropped += counters.dropped.Get();
     sums.refused += counters.refused.Get();
@@ -230,37 +317,47 @@ void SoakedCamera::CountChanges() {
     sums.changesDropped += changes.size() - changesMade;
 }
 
-void SoakedCamera::BeginStream() {
+bool SoakedCamera::BeginStream() {
     stream = ZentaraProgram::StreamSums(1);
-    Expect(Zentara_SetStreaming(handle, 1));
+    failedAtStream = CountFailedRequests();
+    return Judge("Zentara_SetStreaming", Zentara_SetStreaming(handle, 1), failedAtStream);
 }
 
 /// The stream of a camera that is gone cannot be stopped in good order.
-void SoakedCamera::EndStream(bool isExpectedToFail) {
+bool SoakedCamera::EndStream() {
     const ZentaraResult stopped = Zentara_SetStreaming(handle, 0);
-    if (!isExpectedToFail) Expect(stopped);
     stream.Settle();
     CountStream();
+    return !isPlugged || Judge("the stop", stopped, failedAtStream);
 }
 
-/// Also of a camera that was unplugged: it is plugged in again before it is listed.
-bool SoakedCamera::Reopen() {
-    EndStream(true);
-    (void)Zentara_Abort(handle);  // what is queued is ours again
-    Close();
-    {
-        const std::lock_guard hold(doneMutex);
-        done.clear();
-    }
-    ++opening;
-    formerChanges.swap(changes);
-    changes.clear();
-    changesMade = received = 0;
-    (void)ZentaraSimulation_Plug(position);
-    isPlugged = true;
+/// False when the camera is lost to the soak.
+bool SoakedCamera::Start() {
     if (!Open()) return false;
     QueueAll();
-    BeginStream();
+    return BeginStream() || Reopen();
+}
+
+/// Until its stream begins, also of a camera that was unplugged: it is plugged in again before it
+/// is listed.
+bool SoakedCamera::Reopen() {
+    do {
+        (void)EndStream();
+        (void)Zentara_Abort(handle);  // what is queued is ours again
+        Close();
+        {
+            const std::lock_guard hold(doneMutex);
+            done.clear();
+        }
+        ++opening;
+        formerChanges.swap(changes);
+        changes.clear();
+        changesMade = received = 0;
+        Switch(ZentaraSimulation_Plug, position);
+        isPlugged = true;
+        if (!Open()) return false;
+        QueueAll();
+    } while (!BeginStream());
     return true;
 }
 

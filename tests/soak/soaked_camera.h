@@ -2,6 +2,7 @@
 
 #include <array>
 #include <atomic>
+#include <chrono>
 #include <condition_variable>
 #include <cstdint>
 #include <deque>
@@ -18,8 +19,9 @@ namespace ZV::Soak {
 
 /// One camera that streams for as long as the soak lasts, on a thread of its own. Its frames
 /// circulate; now and then its settings change, its stream is switched off and on, it is closed and
-/// opened again, and it is unplugged and plugged in. What goes wrong is counted, never repaired in
-/// silence.
+/// opened again, and it is unplugged and plugged in. Calls may fail when a fault has failed a
+/// request of theirs: they are counted by their codes, and the camera is opened anew where it
+/// cannot go on. What else goes wrong is counted apart, never repaired in silence.
 class SoakedCamera {
   public:
     /// `position` in the scenario. `listMutex` is for all cameras: one lists, opens or closes.
@@ -46,6 +48,7 @@ class SoakedCamera {
     struct Change {
         SoakedCamera* camera = nullptr;
         std::uint32_t opening = 0;
+        std::uint32_t failedBefore = 0;  ///< Requests, when it was queued.
         Zentara_Settings settings{};
     };
 
@@ -54,20 +57,31 @@ class SoakedCamera {
     static void ReceiveChange(std::uint64_t userPrivate, std::uint32_t userData,
                               std::uint32_t errorCode, std::uint32_t flags);
     bool Open();
+    bool OpenListed(std::uint32_t cameraId, std::uint32_t failedBefore);
+    void Prepare();
+    bool Start();
     void Close();
     bool Reopen();
-    void BeginStream();
-    void EndStream(bool isExpectedToFail);
+    bool Restart();
+    bool ReopenUnplugged();
+    bool GoOnWithoutFrames();
+    bool BeginStream();
+    bool EndStream();
     void QueueAll();
     void Queue(Slot& slot);
     void QueueChange();
     void Serve(Slot& slot);
     bool TakeTurn();
     Slot* Take();
+    bool IsStalled(std::chrono::steady_clock::time_point begin) const;
     void CountEngine();
     void CountStream();
     void CountChanges();
-    void Expect(ZentaraResult result);
+    [[nodiscard]] std::uint32_t CountFailedRequests() const;
+    bool Tell(const char* call, ZentaraResult result, bool isExcused);
+    bool Judge(const char* call, ZentaraResult result, std::uint32_t failedBefore);
+    void Expect(const char* call, ZentaraResult result);
+    void Count(std::uint64_t SoakSums::*sum);
 
     const std::uint32_t position, uniqueId;
     std::mutex& listMutex;
@@ -81,6 +95,9 @@ class SoakedCamera {
     std::atomic<std::uint64_t> received{0};     ///< Frames of this opening.
     std::atomic<std::uint32_t> opening{0};
     std::atomic<bool> isPlugged{true};
+    /// Requests that faults had failed when this opening was listed, when its stream began, and
+    /// when they were last taken over into the sums.
+    std::uint32_t failedAtOpening = 0, failedAtStream = 0, failedCounted = 0;
     std::uint64_t served = 0;
     ZentaraProgram::StreamSums stream{1};
 

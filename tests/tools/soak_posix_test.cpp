@@ -3,6 +3,7 @@
 
 #include "soak/process_usage.h"
 #include "soak/soak_sums.h"
+#include "support/scoped_variable.h"
 #include "tools/program.h"
 
 // What the soak concludes from what it measures, and what it takes over into its next run.
@@ -12,6 +13,14 @@ namespace {
 using ZV::Soak::GrowthJudge;
 using ZV::Soak::ProcessUsage;
 using ZV::Soak::SoakSums;
+
+/// A soak as scripts/soak runs it, with the waits of a camera that has gone short.
+ProgramResult RunSoak(const std::vector<std::string>& options) {
+    const ZV::Test::ScopedVariable divisor("ZENTARA_WAIT_DIVISOR", "50");
+    std::vector<std::string> words{ZENTARA_BINARY_DIR "/tests/zentara-soak"};
+    words.insert(words.end(), options.begin(), options.end());
+    return RunTool(words);
+}
 
 ProcessUsage MakeUsage(std::uint64_t megabytes, std::uint64_t handles) {
     return {megabytes << 20, megabytes << 20, 20, handles};
@@ -53,6 +62,7 @@ TEST(SoakState, GoesOnWhereTheFormerRunEnded) {
     SoakSums sums;
     sums.frames = 7;
     sums.unaccounted = 1;
+    sums.failedWith[16] = 3;
     ASSERT_TRUE(ZV::Soak::WriteState(folder.GetPath("state"), sums));
 
     SoakSums read;
@@ -61,6 +71,8 @@ TEST(SoakState, GoesOnWhereTheFormerRunEnded) {
 
     EXPECT_EQ(14U, read.frames);
     EXPECT_EQ(2U, read.unaccounted);
+    EXPECT_EQ(6U, read.failedWith[16]);
+    EXPECT_THAT(ZV::Soak::Describe(read), testing::EndsWith(", failedWith16 6"));
     EXPECT_THAT(folder.ListFiles(), testing::ElementsAre("state"));
 }
 
@@ -72,14 +84,15 @@ TEST(SoakState, BeginsAtZeroWithoutAFileAndRefusesAnother) {
     EXPECT_EQ(0U, sums.frames);
     EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("other", "frames many\n"), &sums));
     EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("third", "apples 3\n"), &sums));
+    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("fourth", "failedWith33 3\n"), &sums));
 }
 
 TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
     const TemporaryFolder folder;
 
     const ProgramResult result =
-        RunTool({ZENTARA_BINARY_DIR "/tests/zentara-soak", "--seconds", "3", "--cameras", "3",
-                 "--faults", "0.01", "--state", folder.GetPath("state")});
+        RunSoak({"--seconds", "3", "--cameras", "3", "--faults", "0.01", "--request-faults",
+                 "0.005", "--state", folder.GetPath("state")});
 
     EXPECT_EQ(0, result.exitCode) << result.output << result.errors;
     EXPECT_THAT(result.output, testing::HasSubstr("unaccounted 0"));
@@ -87,11 +100,28 @@ TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
     EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &sums));
     EXPECT_GT(sums.frames, 0U);
     EXPECT_GT(sums.damaged, 0U);
+    EXPECT_GT(sums.requestsFailed, 0U);
+}
+
+// Cameras go away by themselves, and no fault has failed a request.
+TEST(Soak, FailsWhenACallFailsWithoutARequestThatAFaultHasFailed) {
+    const ProgramResult result =
+        RunSoak({"--seconds", "3", "--cameras", "2", "--request-faults", "0", "--fault",
+                 R"({"kind": "unplug", "code": "FW_IOCTL_LISTEN", "probability": 0.2})"});
+
+    EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
+    EXPECT_THAT(result.output, testing::HasSubstr("requestsFailed 0,"));
+    EXPECT_THAT(result.output, testing::HasSubstr("calls have failed"));
+}
+
+TEST(Soak, RefusesAFaultThatIsNone) {
+    const ProgramResult result = RunSoak({"--cameras", "1", "--fault", "none"});
+
+    EXPECT_EQ(2, result.exitCode);
 }
 
 TEST(Soak, RefusesMoreCamerasThanAListingGives) {
-    const ProgramResult result =
-        RunTool({ZENTARA_BINARY_DIR "/tests/zentara-soak", "--cameras", "11"});
+    const ProgramResult result = RunSoak({"--cameras", "11"});
 
     EXPECT_EQ(2, result.exitCode);
     EXPECT_THAT(result.errors, testing::HasSubstr("--cameras 1-10"));
