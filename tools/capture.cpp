@@ -58,13 +58,6 @@ std::size_t GetImageBytes(const Camera& camera, const SettingsBlock& settings) {
 
 }  // namespace
 
-void FrameBuffer::Prepare(std::size_t bytes) {
-    pixels.assign(bytes, 0);
-    frame = Zentara_Frame{};
-    frame.pBuffer = pixels.data();
-    frame.bufferSize = static_cast<std::uint32_t>(bytes);
-}
-
 CaptureFacts GetCaptureFacts(const Camera& camera, const SettingsBlock& settings) {
     const auto read = [&](ParameterFamily family, std::uint32_t key) {
         return settings.Get(GetSetting(family, key)).value_or(0);

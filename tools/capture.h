@@ -17,7 +17,12 @@ struct FrameBuffer {
     Zentara_Frame frame{};
 
     /// Room for `bytes`; the record is made anew.
-    void Prepare(std::size_t bytes);
+    void Prepare(std::size_t bytes) {
+        pixels.assign(bytes, 0);
+        frame = Zentara_Frame{};
+        frame.pBuffer = pixels.data();
+        frame.bufferSize = static_cast<std::uint32_t>(bytes);
+    }
 };
 
 /// What all images of one capture share.
