@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <span>
 
 #include "zentara/zentara.h"
 
@@ -22,11 +23,11 @@ struct EndingWay {
     EndPlace place = EndPlace::Elsewhere;
 };
 
-/// The way of this name, or null.
-const EndingWay* FindEndingWay(const char* name);
+/// The system's.
+std::span<const EndingWay> GetEndingWays();
 
-/// Tells, once, that the end comes now.
-void TellEnd();
+/// Writes one byte to standard output, or ends the process with 3.
+void WriteMark();
 
 /// Lets a thread rest for good: the end comes from elsewhere.
 [[noreturn]] void RestForEver();

@@ -1,8 +1,6 @@
 #include <windows.h>
 
-#include <atomic>
 #include <cstdlib>
-#include <cstring>
 
 #include "ending/ending_way.h"
 
@@ -36,16 +34,11 @@ constexpr EndingWay Ways[] = {{"return", ReturnFromMain},
 
 }  // namespace
 
-const EndingWay* FindEndingWay(const char* name) {
-    for (const EndingWay& way : Ways) {
-        if (std::strcmp(way.name, name) == 0) return &way;
-    }
-    return nullptr;
+std::span<const EndingWay> GetEndingWays() {
+    return Ways;
 }
 
-void TellEnd() {
-    static std::atomic<bool> isTold{false};
-    if (isTold.exchange(true)) return;
+void WriteMark() {
     DWORD written = 0;
     if (WriteFile(GetStdHandle(STD_OUTPUT_HANDLE), "E", 1, &written, nullptr) == 0) ExitProcess(3);
 }
