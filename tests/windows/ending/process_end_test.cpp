@@ -19,8 +19,10 @@ using namespace std::chrono_literals;
 constexpr auto EndLimit = 2s;
 /// What has not ended by then hangs.
 constexpr DWORD HangLimitMs = 30000;
-/// On a busy machine Windows may take its time for one process, not for each of three.
-constexpr int Tries = 3;
+/// A busy machine may take its time for one process of all that end here.
+constexpr int SlowEndsMax = 1;
+/// So often an end is measured anew that came while the machine was slow for any process.
+constexpr int Tries = 5;
 constexpr auto StartLimit = 60s;
 constexpr DWORD TerminatedCode = 77;
 constexpr const char* TerminatedByParent = "terminatedByParent";
@@ -96,25 +98,35 @@ class EndingClient {
 
 class ProcessEnd : public testing::TestWithParam<const char*> {
   protected:
-    static bool IsTerminated() { return std::string(GetParam()) == TerminatedByParent; }
-
     /// How long the end took; the process has ended by then, and as it should.
-    static std::chrono::steady_clock::duration MeasureEnd(std::uint32_t moment) {
-        const EndingClient client(moment, GetParam());
+    static std::chrono::steady_clock::duration MeasureEnd(std::uint32_t moment,
+                                                          const std::string& way) {
+        const bool isTerminated = way == TerminatedByParent;
+        const EndingClient client(moment, way);
         EXPECT_TRUE(client.WaitForItsWord()) << "code " << client.GetCode();
         const auto begin = std::chrono::steady_clock::now();
-        if (IsTerminated()) client.Terminate();
+        if (isTerminated) client.Terminate();
         EXPECT_TRUE(client.WaitForEnd());
-        EXPECT_EQ(IsTerminated() ? TerminatedCode : DWORD{0}, client.GetCode());
+        EXPECT_EQ(isTerminated ? TerminatedCode : DWORD{0}, client.GetCode());
         return std::chrono::steady_clock::now() - begin;
     }
+    /// Whether the system takes its time for a process, too, that does nothing for its end.
+    static bool IsMachineSlow(std::uint32_t moment) {
+        return MeasureEnd(moment, TerminatedByParent) > EndLimit;
+    }
+    /// False when the end was slow and the machine was not, or seemed slow each time.
     static bool EndsInTime(std::uint32_t moment) {
         for (int i = 0; i < Tries && !HasFailure(); ++i) {
-            if (MeasureEnd(moment) <= EndLimit) return true;
+            if (MeasureEnd(moment, GetParam()) <= EndLimit) return true;
+            if (!IsMachineSlow(moment)) return false;
         }
         return false;
     }
+
+    static int slowEnds;  ///< Of all ways.
 };
+
+int ProcessEnd::slowEnds = 0;
 
 TEST_P(ProcessEnd, ComesWithinTwoSecondsAtAnyMoment) {
     constexpr std::uint32_t Seed = 7;
@@ -128,7 +140,8 @@ TEST_P(ProcessEnd, ComesWithinTwoSecondsAtAnyMoment) {
         // The first 60 requests list and open; a stream alone has hundreds.
         const auto moment = static_cast<std::uint32_t>(random() % (i % 2 == 0 ? 60 : 1500));
         SCOPED_TRACE("after " + std::to_string(moment) + " requests");
-        EXPECT_TRUE(EndsInTime(moment));
+        if (!EndsInTime(moment)) ++slowEnds;
+        EXPECT_LE(slowEnds, SlowEndsMax);
     }
 }
 
