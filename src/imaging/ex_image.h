@@ -52,6 +52,7 @@ class ZENTARA_API ZExImage : public ZObject {
     /// Bytes that the buffer really holds, whatever `SetImageSize` has said.
     std::uint32_t GetBufferBytes() const { return bufferBytes; }
 
+    void SetErrorCode(std::uint16_t newErrorCode) { errorCode = newErrorCode; }
     void SetImageFormat(std::uint32_t newFormat);
     void SetImageSize(std::uint32_t newSize);
     void SetCameraImageFormat(ZCameraImageFormatEnum newFormat);

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "camera/camera_result.h"
 #include "imaging/ex_image.h"
 #include "imaging/kernels/kernel_selection.h"
 
@@ -132,6 +133,10 @@ FilterResult ZImagePipeline::ProcessImage(ZExImage* image, bool* complete) {
         result = ProcessImage(&in, &out, complete);
     }
     image->SetImageSize(oldSize);
+    const bool lacksMemory = imageBufferBytes < needed || intermediate.GetBytes() < needed;
+    if (result == FilterFailed && lacksMemory && image->GetErrorCode() == FrameStatusGood) {
+        image->SetErrorCode(FrameStatusBufferTooSmall);
+    }
     if (result == FilterDone) {
         image->SetImageFormat(out.imageFormat);
         image->SetImageSize(out.imageSize);
