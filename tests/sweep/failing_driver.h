@@ -31,6 +31,8 @@ struct CountedRequest {
     std::uint32_t code = 0;
     bool mayPend = false;
     std::uint32_t address = 0;  ///< Of the register that is written.
+
+    bool operator==(const CountedRequest&) const = default;
 };
 
 /// From here on requests are counted; number `number` of `series`, from 1, meets `failure`.

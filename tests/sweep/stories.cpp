@@ -10,6 +10,7 @@
 #include "memory/failing_allocator.h"
 #include "support/rounds.h"
 #include "support/settings_words.h"
+#include "support/simulation_world.h"
 #include "support/wait_until.h"
 #include "sweep/failing_driver.h"
 
@@ -24,6 +25,8 @@ constexpr milliseconds ShortPatience(IsSanitized ? 400 : 60);
 /// Far more than any story takes.
 constexpr milliseconds LongPatience(IsSanitized ? 60'000 : 20'000);
 constexpr std::uint64_t ShortExposureNs = 2'000'000;
+/// Behind them stands the camera's handle, another with each opening.
+constexpr std::size_t SettingsBytesBeforeHandle = 244;
 constexpr std::uint32_t TweakOfSubstrate = 0x20000123;
 
 struct WordChoice {
@@ -129,6 +132,7 @@ Client::Client() {
 
 void Client::Reset() {
     callCount = 0;
+    answers = 0;
     listedCount = 0;
     handle = 0;
     queued = 0;
@@ -146,6 +150,18 @@ ZentaraResult Client::Note(const char* name, ZentaraResult result) {
     return result;
 }
 
+void Client::NoteAnswer(const void* bytes, std::size_t count) {
+    const std::uint64_t both[] = {answers, CalculateChecksum(bytes, count)};
+    answers = CalculateChecksum(both, sizeof both);
+}
+
+void Client::NoteFrame(const Zentara_Frame& frame) {
+    const std::uint32_t told[] = {frame.format, frame.width,        frame.height,   frame.size,
+                                  frame.bits,   frame.bayerPattern, frame.errorCode};
+    NoteAnswer(told, sizeof told);
+    if (frame.pBuffer != nullptr) NoteAnswer(frame.pBuffer, std::min(frame.size, BufferBytes));
+}
+
 void Client::Load() {
     (void)Note("Zentara_LoadDriver", Zentara_LoadDriver());
 }
@@ -157,6 +173,7 @@ void Client::List() {
     // A listing that failed may have left the length as it was; a first camera is tried all the
     // same.
     if (result != zerrNone) items[0].cameraId = 0;
+    if (result == zerrNone) NoteAnswer(items, listedCount * sizeof items[0]);
 }
 
 void Client::Open() {
@@ -190,6 +207,7 @@ void Client::Begin(std::uint32_t imageFormat) {
 
 void Client::ReadSettings() {
     (void)Note("Zentara_ReadSettingsFromCam", Zentara_ReadSettingsFromCam(handle, &settings));
+    NoteAnswer(&settings, SettingsBytesBeforeHandle);
 }
 
 void Client::Send() {
@@ -237,6 +255,7 @@ void Client::SendOthers() {
 void Client::Grab() {
     const Aborting aborting(*this);
     (void)Note("Zentara_GrabFrame", Zentara_GrabFrame(handle, &frames[0].record));
+    NoteFrame(frames[0].record);
 }
 
 void Client::Serve(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
@@ -318,8 +337,11 @@ void Client::ReadTables() {
         auto size = static_cast<std::int32_t>(std::size(table));
         (void)Note("Zentara_GetParamSparseTable",
                    Zentara_GetParamSparseTable(&settings, key, table, &size));
+        const auto told = std::min(static_cast<std::size_t>(size), std::size(table));
+        NoteAnswer(table, told * sizeof table[0]);
     }
     (void)Note("Zentara_PreflightSettings", Zentara_PreflightSettings(handle, &settings));
+    NoteAnswer(&settings, SettingsBytesBeforeHandle);
 }
 
 void Client::Finish() {
@@ -331,6 +353,7 @@ void Client::Finish() {
     Zentara_Frame copied{};
     (void)Note("Zentara_PostProcessSingleFrame",
                Zentara_PostProcessSingleFrame(handle, &settings, &grabbed, &copied));
+    NoteFrame(copied);
     std::free(copied.pBuffer);
     (void)Note("Zentara_PostProcessSingleFrame",
                Zentara_PostProcessSingleFrame(handle, &settings, &grabbed, &frames[1].record));
@@ -340,6 +363,12 @@ void Client::Finish() {
     frames[3].record.height = 2 * grabbed.height;
     (void)Note("Zentara_BayerZoomVert",
                Zentara_BayerZoomVert(zbayerFast, &grabbed, &frames[3].record));
+    for (std::size_t i = 1; i <= 3; ++i) NoteFrame(frames[i].record);
+}
+
+bool Client::HasFrameWithError() const {
+    return std::any_of(frames.begin(), frames.end(),
+                       [](const Frame& frame) { return frame.record.errorCode != zerrNone; });
 }
 
 bool Client::HasFramesInOrder() const {

@@ -80,6 +80,10 @@ class Client {
     /// Nothing was written behind any buffer, and no frame says that it is longer than its own.
     bool HasFramesInOrder() const;
     const Zentara_Frame& GetGrabbed() const { return frames[0].record; }
+    bool HasFrameWithError() const;
+    /// A checksum of what the calls have handed out since Reset beside their results: lists,
+    /// settings, tables and images, without the numbers of the frames.
+    std::uint64_t GetAnswers() const { return answers; }
 
   private:
     static constexpr std::size_t CallsMax = 256;
@@ -95,6 +99,8 @@ class Client {
     void ChooseOthers(Zentara_Settings* block) const;
     std::uint32_t ChooseOtherWord(Zentara_Settings* block, std::uint32_t key) const;
     ZentaraResult Note(const char* name, ZentaraResult result);
+    void NoteAnswer(const void* bytes, std::size_t count);
+    void NoteFrame(const Zentara_Frame& frame);
     static void Serve(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
                       std::uint32_t flags);
     void QueueAll();
@@ -102,6 +108,7 @@ class Client {
 
     std::array<Call, CallsMax> calls{};
     std::size_t callCount = 0;
+    std::uint64_t answers = 0;
     Zentara_CamListItem items[4] = {};
     std::uint32_t listedCount = 0;
     ZentaraHandle handle = 0;

@@ -17,6 +17,8 @@
 #include "memory/failing_allocator.h"
 #include "support/rounds.h"
 #include "support/wait_until.h"
+#include "sweep/counted_waits.h"
+#include "sweep/told_failures.h"
 
 namespace ZV::Test {
 
@@ -33,6 +35,8 @@ constexpr std::uint32_t WaitDivisor = 1000;
 constexpr unsigned RoundSecondsMax = IsSanitized ? 240 : 60;
 /// A call that ends is allowed so long, on a machine with other work.
 constexpr milliseconds CallLimit(IsSanitized ? 20'000 : 5'000);
+/// So long may it wait, on the wait clock, for what does not come: a few times five seconds.
+constexpr std::uint64_t WaitedLimitMs = 30'000;
 /// The client that aborts, and the driver's thread that ends late requests.
 constexpr std::size_t HelperThreads = 2;
 constexpr std::int64_t NoAllocation = std::int64_t{1} << 40;
@@ -92,6 +96,7 @@ bool IsHarmless(const Round& round) {
 
 /// The driver takes back what a camera has reserved that can never be freed.
 bool LeavesReservations(const Round& round, const Story& story) {
+    if (IsHarmless(round)) return false;
     // Kept: an unplugged device answers no freeing; the driver has taken all back by then.
     if (round.failure == Failure::DeviceGone) return true;
     // Kept: an opening that failed leaves what it has reserved; its device is closed with it.
@@ -100,7 +105,12 @@ bool LeavesReservations(const Round& round, const Story& story) {
         return true;
     }
     // Kept: a stop or a freeing that fails ends the camera's close, and a release tries once.
-    return story.ends == Stage::Unloaded;
+    constexpr std::uint32_t Codes[] = {FW_IOCTL_ASYNC_WRITE,    FW_IOCTL_STOP,
+                                       FW_IOCTL_DETACH_BUFFERS, FW_IOCTL_FREE_RESOURCES,
+                                       FW_IOCTL_FREE_CHANNEL,   FW_IOCTL_FREE_BANDWIDTH};
+    if (story.ends != Stage::Unloaded) return false;
+    if (round.failure == Failure::NoMemory) return true;  // all that it takes is for that write
+    return std::find(std::begin(Codes), std::end(Codes), round.code) != std::end(Codes);
 }
 
 /// Whether the camera must go on without being listed and opened anew.
@@ -111,66 +121,6 @@ bool LeavesAWorkingCamera(const Round& round, const Story& story) {
     if (round.failure == Failure::AnsweredAtOnce) return round.code != FW_IOCTL_ASYNC_READ;
     // Kept: a thread that cannot be made is not noticed, and a camera without it has no images.
     return round.failure != Failure::NoMemory;
-}
-
-/// Registers of the control block, whose writes may fail without a word.
-struct UntoldWrite {
-    std::string_view story, camera;  ///< No camera: any.
-    std::uint32_t first, last;       ///< Quadlets.
-};
-/// Kept: their results are dropped. Of the first setup: the order of bytes, the region that a
-/// change of the binning brings along, the analogue registers. Of a start: the parameter set
-/// number. Of a send: bit depth, that region, real-time video, the wheel and the tweaked register.
-constexpr UntoldWrite UntoldWrites[] = {
-    {"stream", "", 1, 1},      {"list", "", 1, 1},   {"list", "", 3, 4},
-    {"list", "tirel", 34, 40}, {"send", "", 1, 1},   {"send", "", 3, 4},
-    {"send", "folary", 2, 2},  {"send", "", 12, 12}, {"send", "tirel", 35, 35},
-};
-constexpr std::uint32_t ControlAddress = 0xD0002000;
-constexpr std::uint32_t TakeOverAddress = 0xD0003004;
-
-bool IsUntoldWrite(const Story& story, const SweepCamera& camera, const CountedRequest& request) {
-    if (request.code != FW_IOCTL_ASYNC_WRITE) return false;
-    // Kept: a send drops the result of the taking over.
-    if (request.address == TakeOverAddress) return story.name == "send";
-    const std::uint32_t quadlet = (request.address - ControlAddress) / 4;
-    return std::any_of(std::begin(UntoldWrites), std::end(UntoldWrites), [&](const auto& untold) {
-        return untold.story == story.name && quadlet >= untold.first && quadlet <= untold.last &&
-               (untold.camera.empty() || untold.camera == camera.name);
-    });
-}
-
-/// Kept: the resources are asked for at the slower speed then, and a notification is not needed.
-bool IsUntold(const Story& story, const SweepCamera& camera, const CountedRequest& request) {
-    return request.code == FW_IOCTL_ALLOC_RESOURCES || request.code == FW_IOCTL_NOTIFY_DISABLE ||
-           IsUntoldWrite(story, camera, request);
-}
-
-/// Whether some call of the story answers with a code when this request has failed.
-bool MustBeTold(const Round& round, const CountedStory& counted) {
-    const Story& story = Stories[round.story];
-    const SweepCamera& camera = SweepCameras[round.camera];
-    constexpr std::string_view TellingStories[] = {"list", "send", "grab", "stream"};
-    const bool isFailure = round.failure == Failure::Fails ||
-                           round.failure == Failure::CompletesInError ||
-                           round.failure == Failure::DeviceGone;
-    if (!isFailure || round.series != RequestSeries::Calls) return false;
-    if (std::find(std::begin(TellingStories), std::end(TellingStories), story.name) ==
-        std::end(TellingStories)) {
-        return false;
-    }
-    const auto& requests = counted.requests[static_cast<std::size_t>(round.series)];
-    const auto isTold = [&](const auto& request) { return !IsUntold(story, camera, request); };
-    const auto failed = requests.begin() + static_cast<std::ptrdiff_t>(round.number - 1);
-    if (story.name == "stream") {
-        // Kept: a change that stops the stream starts it again without a word.
-        const auto listen = std::find_if(requests.begin(), requests.end(), [](const auto& request) {
-            return request.code == FW_IOCTL_LISTEN;
-        });
-        if (failed > listen) return false;
-    }
-    if (round.failure != Failure::DeviceGone) return isTold(*failed);
-    return std::any_of(failed, requests.end(), isTold);
 }
 
 /// One round, from load to release.
@@ -187,15 +137,14 @@ class Runner {
 
     /// False when the camera could not be brought there.
     bool Prepare();
-    void Run(bool isPatient) {
-        client.SetPatient(isPatient);
-        story.run(client);
-        client.SetPatient(true);
-    }
+    void Run(bool isPatient);
     void CheckResults(const CountedStory* expected);
     void CheckIsTold(const Round& round, const CountedStory& counted);
+    void CheckIsToldOrDone(const CountedStory& counted);
     void CheckWhatIsLeft(const Round* round);
     std::vector<ZentaraResult> GetResults() const;
+    /// Of the story alone.
+    std::uint64_t GetAnswers() const { return client.GetAnswers(); }
 
     std::vector<std::string> problems;
 
@@ -232,6 +181,15 @@ bool Runner::Prepare() {
     if (story.begins == Stage::Streaming) client.StartStream();
     firstCall = client.CountCalls();
     return HasGoodCalls(0, "before the story");
+}
+
+void Runner::Run(bool isPatient) {
+    client.SetPatient(isPatient);
+    const auto run = [this] { story.run(client); };
+    // Where images are waited for the client ends the call itself.
+    if (story.ends == Stage::Opened) run();
+    if (story.ends != Stage::Opened) RunBounded("the story", run);
+    client.SetPatient(true);
 }
 
 bool Runner::HasGoodCalls(std::size_t from, const char* where) {
@@ -283,13 +241,42 @@ void Runner::CheckIsTold(const Round& round, const CountedStory& counted) {
     Complain(text);
 }
 
+/// What has missed its memory says so, or goes on as if it had not.
+void Runner::CheckIsToldOrDone(const CountedStory& counted) {
+    const std::vector<ZentaraResult> results = GetResults();
+    if (counted.results.empty()) return;  // not counted: a process's first story
+    const bool isTold =
+        std::any_of(results.begin(), results.end(), [](auto result) { return result != 0; });
+    if (isTold || !client.HasCamera() || client.HasFrameWithError()) return;
+    if (results != counted.results) Complain("memory is missing: calls are left out");
+    if (client.GetAnswers() != counted.answers) {
+        Complain("memory is missing: no call tells of it, and an answer is another");
+    }
+    if (story.name == "grab") return;  // how many it sends depends on its frames
+    for (const CountedRequest& request : ListLeftOut(counted)) {
+        if (IsUntold(story, camera, request)) continue;
+        char text[120];
+        std::snprintf(text, sizeof text,
+                      "memory is missing: no call tells of it, and request 0x%X, register 0x%X, is "
+                      "left out",
+                      request.code, request.address);
+        Complain(text);
+    }
+}
+
 template <typename Work>
 void Runner::RunBounded(const char* what, Work work) {
     const auto start = Clock::now();
+    const std::uint64_t waitedBefore = GetBegunWaitsMs();
     work();
     const auto taken = std::chrono::duration_cast<milliseconds>(Clock::now() - start);
-    if (taken <= CallLimit) return;
-    Complain(std::string(what) + " took " + std::to_string(taken.count()) + " ms");
+    const std::uint64_t waitedMs = GetBegunWaitsMs() - waitedBefore;
+    if (taken > CallLimit) {
+        Complain(std::string(what) + " took " + std::to_string(taken.count()) + " ms");
+    }
+    if (waitedMs > WaitedLimitMs) {
+        Complain(std::string(what) + " waited up to " + std::to_string(waitedMs) + " ms");
+    }
 }
 
 /// A close that failed leaves the camera open; the next one ends it.
@@ -299,7 +286,8 @@ void Runner::CloseForGood(const Round* round) {
     }
     if (CountOpenDevices() == 0 || !client.IsOpen()) return;
     // Kept: a camera that a listing has failed to read or to close stays open at the driver.
-    if (round != nullptr && story.begins == Stage::Loaded) return;
+    const bool isListing = story.begins == Stage::Loaded;
+    if (round != nullptr && isListing && !IsHarmless(*round)) return;
     // Kept: a device that has gone answers the freeing of its resources with an error, which ends
     // the close. The next listing or the release gives it up.
     if (round == nullptr || round->failure != Failure::DeviceGone) {
@@ -482,6 +470,10 @@ RoundOutcome RunStory(const Round& round, const CountedStory& counted) {
         outcome.code = GetFailedCode();
         runner.CheckResults(IsHarmless(round) ? &counted : nullptr);
         if (outcome.hasFailed) runner.CheckIsTold(round, counted);
+        const bool missesMemory = outcome.hasFailed && !isRequest;
+        if (missesMemory && TellsOfMissingMemory(Stories[round.story])) {
+            runner.CheckIsToldOrDone(counted);
+        }
     }
     runner.CheckWhatIsLeft(&round);
     outcome.problems = runner.problems;
@@ -517,6 +509,7 @@ CountedStory CountStory(std::size_t camera, std::size_t story) {
             counted.requests[static_cast<std::size_t>(series)] = GetCounted(series);
         }
         counted.results = runner.GetResults();
+        counted.answers = runner.GetAnswers();
     }
     runner.CheckResults(nullptr);
     runner.CheckWhatIsLeft(nullptr);

@@ -40,6 +40,7 @@ struct Round {
 /// What a story does without a failure.
 struct CountedStory {
     std::vector<ZentaraResult> results;
+    std::uint64_t answers = 0;  ///< Client::GetAnswers of it.
     std::vector<CountedRequest> requests[std::size(AllSeries)];
     std::int64_t allocations = 0;
     std::vector<std::string> problems;
