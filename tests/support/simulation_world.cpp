@@ -1,7 +1,9 @@
 #include "support/simulation_world.h"
 
+#include <algorithm>
 #include <cstring>
 #include <fstream>
+#include <iterator>
 #include <nlohmann/json.hpp>
 
 #include "hal/control_records.h"
@@ -105,25 +107,39 @@ const KernelDriver& GetKernelDriver() {
     return *ZentaraSimulation_GetKernelDriver(KernelDriverVersion);
 }
 
-/// The records whose line contains `part`. A stream goes on writing: what stands in the file at the
-/// call is read, so that a reader never runs after the writer.
-std::vector<TraceRecord> ReadRecords(const std::filesystem::path& path, std::string_view part) {
+/// What stands in a file at the call: a stream may go on writing, and a reader that took what comes
+/// meanwhile could run after the writer for ever.
+std::string ReadText(const std::string& path) {
     std::error_code failure;
     const std::uintmax_t bytes = std::filesystem::file_size(path, failure);
-    std::vector<TraceRecord> records;
-    std::ifstream file(path);
-    std::uintmax_t read = 0;
-    for (std::string line; !failure && read < bytes && std::getline(file, line);) {
-        read += line.size() + 1;
-        if (line.find(part) == std::string::npos) continue;
-        const Json parsed = Json::parse(line, nullptr, false);
-        // The last line may be half written.
-        if (parsed.is_object()) records.push_back(ParseRecord(parsed));
-    }
-    return records;
+    std::string text(failure ? 0 : bytes, '\0');
+    std::ifstream file(path, std::ios::binary);
+    file.read(text.data(), static_cast<std::streamsize>(text.size()));
+    text.resize(static_cast<std::size_t>(file.gcount()));
+    return text;
 }
 
 }  // namespace
+
+std::vector<TraceRecord> TraceReader::Read(
+    const std::string& path, const std::function<bool(const TraceRecord&)>& isWanted) {
+    const std::lock_guard hold(mutex);
+    const std::string text = ReadText(path);
+    if (!text.starts_with(known)) {  // another run's
+        known.clear();
+        records.clear();
+    }
+    // The last line may be half written.
+    for (std::size_t end; (end = text.find('\n', known.size())) != std::string::npos;) {
+        const std::string_view line(text.data() + known.size(), end - known.size());
+        const Json parsed = Json::parse(line, nullptr, false);
+        if (parsed.is_object()) records.push_back(ParseRecord(parsed));
+        known.append(line).push_back('\n');
+    }
+    std::vector<TraceRecord> wanted;
+    std::copy_if(records.begin(), records.end(), std::back_inserter(wanted), isWanted);
+    return wanted;
+}
 
 std::uint64_t CalculateChecksum(const void* bytes, std::size_t count) {
     std::uint64_t sum = 0xCBF29CE484222325;
@@ -155,16 +171,14 @@ void SimulationWorld::End() {
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadTrace() const {
-    return ReadRecords(folder.GetPath(TraceFile), "");
+    return trace.Read(folder.GetPath(TraceFile), [](const TraceRecord&) { return true; });
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadTrace(std::string_view type,
                                                     std::uint32_t camera) const {
-    std::vector<TraceRecord> records = ReadTrace();
-    std::erase_if(records, [&](const TraceRecord& record) {
-        return record.type != type || record.camera != camera;
+    return trace.Read(folder.GetPath(TraceFile), [&](const TraceRecord& record) {
+        return record.type == type && record.camera == camera;
     });
-    return records;
 }
 
 std::vector<TraceRecord> SimulationWorld::ReadRequests(std::uint32_t camera) const {
@@ -176,12 +190,13 @@ std::vector<TraceRecord> SimulationWorld::ReadFrames(std::uint32_t camera) const
 }
 
 std::vector<RegisterWrite> SimulationWorld::ReadRegisterWrites(std::uint32_t camera) const {
+    const std::vector<TraceRecord> records =
+        trace.Read(folder.GetPath(TraceFile), [&](const TraceRecord& record) {
+            return record.name == "FW_IOCTL_ASYNC_WRITE" && record.type == "request" &&
+                   record.camera == camera;
+        });
     std::vector<RegisterWrite> writes;
-    for (const TraceRecord& record :
-         ReadRecords(folder.GetPath(TraceFile), "FW_IOCTL_ASYNC_WRITE")) {
-        if (record.type == "request" && record.camera == camera)
-            writes.push_back(ParseWrite(record));
-    }
+    for (const TraceRecord& record : records) writes.push_back(ParseWrite(record));
     return writes;
 }
 

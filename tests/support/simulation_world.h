@@ -2,6 +2,8 @@
 
 #include <cstdint>
 #include <filesystem>
+#include <functional>
+#include <mutex>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -48,6 +50,18 @@ std::uint64_t CalculateChecksum(const void* bytes, std::size_t count);
 /// and `ZENTARA_SIMULATION` naming it. The bus starts when the library lists its devices, or with
 /// Start; the destructor ends it, clears the variable and removes the folder.
 ///
+/// Reads a trace that grows: what it has parsed once it does not parse again. Of several threads.
+class TraceReader {
+  public:
+    std::vector<TraceRecord> Read(const std::string& path,
+                                  const std::function<bool(const TraceRecord&)>& isWanted);
+
+  private:
+    std::mutex mutex;
+    std::string known;  ///< The whole lines of `records`.
+    std::vector<TraceRecord> records;
+};
+
 /// The scenario is the name of a built-in one, or a JSON object (docs/simulation.md). Unless it
 /// says otherwise, time scale is 0 and each camera's images have no noise.
 class SimulationWorld {
@@ -85,6 +99,7 @@ class SimulationWorld {
     std::vector<TraceRecord> ReadTrace(std::string_view type, std::uint32_t camera) const;
 
     TemporaryFolder folder;
+    mutable TraceReader trace;
 };
 
 }  // namespace ZV::Test
