@@ -323,8 +323,8 @@ TEST_P(RealTimeVideo, KeptEveryPatternThatIsNoMosaicsIsCorrectedAsRGGB) {
     const auto [video, bitDepth] = GetParam();
     camera.sensorWidth = video.sensorWidth;
     const Samples samples = MakeRandom(std::size_t{60} * 8, bitDepth == 8 ? 1 : 2, 6);
-    const auto correct = [&](std::uint32_t pattern) {
-        Give(samples, 60, 8, bitDepth);
+    const auto correct = [&, depth = bitDepth](std::uint32_t pattern) {
+        Give(samples, 60, 8, depth);
         in.isRTV = true;
         in.colourPattern = pattern;
         EXPECT_EQ(FilterDone, Process());

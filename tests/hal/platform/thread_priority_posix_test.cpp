@@ -23,7 +23,7 @@ Scheduling ReadOwnScheduling() {
 }
 
 TEST(ThreadPriority, IsRoundRobinOneForARealDeviceOrLeftAloneWhereTheSystemRefuses) {
-    Scheduling before, after, ofProbe;
+    Scheduling before, after;
     bool isAllowed = false;
     {
         const TestThread probe([&] {
