@@ -138,7 +138,10 @@ void Client::Reset() {
     queued = 0;
     served = 0;
     strangeCode = 0;
-    for (Frame& frame : frames) frame.record.errorCode = zerrNone;
+    for (Frame& frame : frames) {
+        frame.record = {.pBuffer = frame.pixels.data(), .bufferSize = BufferBytes};
+        std::fill_n(frame.pixels.begin(), BufferBytes, std::uint8_t{0});
+    }
 }
 
 milliseconds Client::GetPatience() const {
