@@ -14,8 +14,10 @@ struct SoakSums {
     std::uint64_t seconds = 0;
     std::uint64_t frames = 0, bytes = 0, gaps = 0, missing = 0, damaged = 0, repeats = 0;
     std::uint64_t misnumbered = 0;
-    /// Of the engine: what became of the frames that no client saw.
-    std::uint64_t begun = 0, dropped = 0, refused = 0, bad = 0, cleared = 0, withoutTaker = 0;
+    /// Of the engine: what became of the frames that began. Those delivered came to the client, but
+    /// for the ones without a taker.
+    std::uint64_t begun = 0, delivered = 0, heldBack = 0, dropped = 0, refused = 0, bad = 0,
+                  cleared = 0, withoutTaker = 0;
     std::uint64_t waiting = 0;  ///< In the engine's queue when the camera was closed.
     std::uint64_t unaccounted =
         0;                      ///< Begun, or delivered to the client, without a count: a fault.

@@ -159,7 +159,9 @@ bool SoakedCamera::ReopenUnplugged() {
 
 /// A stream that could not be stopped or started goes on with a new opening.
 bool SoakedCamera::Restart() {
-    if (!EndStream() || !BeginStream()) return Reopen();
+    if (!EndStream()) return Reopen();
+    SettleStream();
+    if (!BeginStream()) return Reopen();
     Count(&SoakSums::restarts);
     return true;
 }
@@ -182,6 +184,7 @@ SoakedCamera::Slot* SoakedCamera::Take() {
 }
 
 void SoakedCamera::Serve(Slot& slot) {
+    ++taken;
     stream.Count(slot.frame);
     Queue(slot);
     if (stream.frames % FramesPerChange == 0) CountStream();
@@ -200,11 +203,29 @@ void SoakedCamera::CountStream() {
     stream.ForgetCounts();
 }
 
+void SoakedCamera::SettleStream() {
+    stream.Settle();
+    CountStream();
+}
+
+/// What has come and was not served by the time of a close. False when the client was called with
+/// more frames than it has taken.
+bool SoakedCamera::CountRest() {
+    {
+        const std::lock_guard hold(doneMutex);
+        for (const Slot* slot : done) stream.Count(slot->frame);
+        taken += done.size();
+        done.clear();
+    }
+    SettleStream();
+    return taken == received;
+}
+
 void SoakedCamera::Receive(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t) {
     auto& slot = *reinterpret_cast<Slot*>(static_cast<std::uintptr_t>(userPrivate));
-    ++slot.camera->received;
     const std::lock_guard hold(slot.camera->doneMutex);
     slot.camera->done.push_back(&slot);
+    ++slot.camera->received;
     slot.camera->arrived.notify_one();
 }
 
@@ -278,7 +299,9 @@ void SoakedCamera::Prepare() {
 
 /// A close that fails leaves the camera open, and is made once more.
 void SoakedCamera::Close() {
-    CountEngine();
+    const bool isAccounted = CountEngine();
+    const bool hasTakenAll = CountRest();
+    if (!isAccounted || !hasTakenAll) Count(&SoakSums::unaccounted);
     CountChanges();
     const std::lock_guard listing(listMutex);
     for (int closes = 0; closes < ClosesMax; ++closes) {
@@ -288,8 +311,9 @@ void SoakedCamera::Close() {
 }
 
 /// Every frame that began is delivered or counted, or waits in the queue, and the client was called
-/// for each that found a taker. A frame that is at work has a moment to come to its count.
-void SoakedCamera::CountEngine() {
+/// for each that found a taker; else false. A frame that is at work has a moment to come to its
+/// count.
+bool SoakedCamera::CountEngine() {
     ZCamera& camera = *reinterpret_cast<ZCamera*>(handle);
     const StreamCounters& counters = camera.GetStreamCounters();
     const bool isAccounted = Test::WaitUntil([&] {
@@ -301,13 +325,15 @@ void SoakedCamera::CountEngine() {
     sums.requestsFailed += failed - failedCounted;
     failedCounted = failed;
     sums.begun += counters.begun.Get();
+    sums.delivered += counters.delivered.GetSum();
+    sums.heldBack += counters.heldBack.Get();
     sums.dropped += counters.dropped.Get();
     sums.refused += counters.refused.Get();
     sums.bad += counters.bad.Get();
     sums.cleared += counters.cleared.Get();
     sums.withoutTaker += counters.withoutTaker.GetSum();
     sums.waiting += WaitingFrames::Count(camera);
-    if (!isAccounted) ++sums.unaccounted;
+    return isAccounted;
 }
 
 /// Behind an abort: what has not been told by now never will be.
@@ -326,8 +352,6 @@ bool SoakedCamera::BeginStream() {
 /// The stream of a camera that is gone cannot be stopped in good order.
 bool SoakedCamera::EndStream() {
     const ZentaraResult stopped = Zentara_SetStreaming(handle, 0);
-    stream.Settle();
-    CountStream();
     return !isPlugged || Judge("the stop", stopped, failedAtStream);
 }
 
@@ -345,14 +369,11 @@ bool SoakedCamera::Reopen() {
         (void)EndStream();
         (void)Zentara_Abort(handle);  // what is queued is ours again
         Close();
-        {
-            const std::lock_guard hold(doneMutex);
-            done.clear();
-        }
         ++opening;
         formerChanges.swap(changes);
         changes.clear();
         changesMade = received = 0;
+        taken = 0;
         Switch(ZentaraSimulation_Plug, position);
         isPlugged = true;
         if (!Open()) return false;

@@ -74,8 +74,10 @@ class SoakedCamera {
     bool TakeTurn();
     Slot* Take();
     bool IsStalled(std::chrono::steady_clock::time_point begin) const;
-    void CountEngine();
+    bool CountEngine();
     void CountStream();
+    void SettleStream();
+    bool CountRest();
     void CountChanges();
     [[nodiscard]] std::uint32_t CountFailedRequests() const;
     bool Tell(const char* call, ZentaraResult result, bool isExcused);
@@ -92,7 +94,9 @@ class SoakedCamera {
     /// Of this opening and of the one before, which a callback may outlive.
     std::deque<Change> changes, formerChanges;
     std::atomic<std::uint64_t> changesMade{0};  ///< Of this opening.
-    std::atomic<std::uint64_t> received{0};     ///< Frames of this opening.
+    /// Frames of this opening, with which the client was called; and those that `stream` knows.
+    std::atomic<std::uint64_t> received{0};
+    std::uint64_t taken = 0;
     std::atomic<std::uint32_t> opening{0};
     std::atomic<bool> isPlugged{true};
     /// Requests that faults had failed when this opening was listed, when its stream began, and

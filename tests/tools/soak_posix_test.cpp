@@ -103,6 +103,9 @@ TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
     EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &sums));
     EXPECT_GT(sums.frames, 0U);
     EXPECT_GT(sums.damaged, 0U);
+    EXPECT_EQ(sums.delivered, sums.frames + sums.withoutTaker);
+    EXPECT_EQ(sums.begun, sums.delivered + sums.heldBack + sums.dropped + sums.bad + sums.cleared +
+                              sums.waiting);
     EXPECT_GE(sums.requestsFailed, 3U) << "the first start of each camera";
     EXPECT_GE(std::accumulate(sums.failedWith.begin(), sums.failedWith.end(), std::uint64_t{0}),
               3U);
