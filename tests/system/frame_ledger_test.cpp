@@ -326,6 +326,7 @@ void ExpectFaultShows(const LedgerCase& testCase, const CountingClient& client,
         EXPECT_TRUE(seen < Triggers ||
                     counters.delivered.Get(FrameStatusGood) < counters.delivered.GetSum());
     }
+    EXPECT_EQ(0U, counters.refused.Get());
     if (fault.leavesOneUnfinished) {
         EXPECT_LT(0U, counters.cleared.Get());
     }
@@ -389,12 +390,13 @@ class FreeRunLedger : public testing::TestWithParam<std::uint32_t> {};
 // What lies in the ring when a camera goes is never parsed: it is the tail that no number follows.
 TEST_P(FreeRunLedger, EveryFrameUntilTheCameraGoesIsDeliveredOrCounted) {
     constexpr std::uint64_t LastFrame = 60;
-    CameraSession session(MakeScenario(R"({"kind": "losePacket", "packet": 1, "frame": 11},
+    CameraSession session(
+        MakeScenario(R"({"kind": "losePacket", "packet": 1, "frame": 11, "count": 8},
         {"kind": "losePacket", "packet": 0, "frame": 21},
-        {"kind": "wrongPsn", "frame": 31, "count": 3},
+        {"kind": "wrongPsn", "frame": 31, "count": 8},
         {"kind": "frameStart", "packet": 2, "frame": 41},
         {"kind": "unplug", "packet": 2, "frame": 60})",
-                                       GetParam()));
+                     GetParam()));
     ASSERT_TRUE(session.IsOpen());
     CountingClient client(session);
     client.DawdleUntilOneIsDropped();
@@ -417,6 +419,8 @@ TEST_P(FreeRunLedger, EveryFrameUntilTheCameraGoesIsDeliveredOrCounted) {
         return counters.begun.Get() - SumFates(counters) <= 2 &&
                counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
     }));
+    EXPECT_LT(0U, counters.delivered.Get(FrameStatusMissingData));
+    EXPECT_LT(0U, counters.bad.Get()) << "of another parameter set";
     ExpectClientGotWhatWasDelivered(client, counters);
     ExpectWholeFramesWereSent(client, session.world);
 }
@@ -455,20 +459,32 @@ TEST(FrameLedgerTest, ImagesThatNobodyWaitsForAreCountedAsSuch) {
 
 TEST(FrameLedgerTest, TheExposuresOfAWheelAreHeldBackUntilTheyAreAnImage) {
     CameraSession session(
-        R"({"base": "wheel", "cameras": [{"sensor": {"width": 60, "height": 40}}]})");
+        R"({"base": "wheel", "timeScale": 0.02, "cameras": [{"sensor": {"width": 60, "height": 40}}]})");
     ASSERT_TRUE(session.IsOpen());
     Zentara_Settings settings{};
     ASSERT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(session.GetHandle(), &settings));
     ASSERT_ZERR(zerrNone, Zentara_SetParam(&settings, zprmImageFormat, zfmtRGBPlane8));
     ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(session.GetHandle(), &settings));
+    ASSERT_EQ(CameraOk, session.GetCamera().SetTriggerMode(TriggerModeSoftware));
+    ASSERT_EQ(CameraOk, session.GetCamera().UpdateSettingsOnCamera());
     CountingClient client(session);
     client.Queue(4, 3 * session.GetCamera().GetImageSize());
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
 
-    ASSERT_TRUE(WaitUntil([&] { return client.CountAll() == 4; }));
+    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
+    constexpr std::uint64_t Exposures = 12;
+    for (std::uint64_t i = 1; i <= Exposures; ++i) {
+        ASSERT_ZERR(zerrNone, Zentara_Trigger(session.GetHandle()));
+        ASSERT_TRUE(WaitUntil([&] { return session.world.GetState().framesSent == i; }));
+        ASSERT_TRUE(WaitUntil([&] { return SumFates(counters) == i; }));
+    }
     ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
 
-    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
+    EXPECT_EQ(Exposures, session.world.GetState().framesExposed);
+    EXPECT_EQ(Exposures, counters.begun.Get());
+    EXPECT_EQ(0U, counters.refused.Get());
+    EXPECT_EQ(Exposures, counters.heldBack.Get() + counters.delivered.GetSum());
+    EXPECT_LT(0U, counters.delivered.GetSum());
     ASSERT_TRUE(WaitUntil([&] {
         return counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
     }));
