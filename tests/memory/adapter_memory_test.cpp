@@ -62,6 +62,7 @@ TEST(AdapterMemory, EachFailureOfASecondKindCamerasLifeGivesACodeAndTheNextLifeI
     std::int64_t failing = 1;
     for (; hasRefused && failing < AdapterAllocationsMax && !HasFailure(); ++failing) {
         SCOPED_TRACE(failing);
+        const std::size_t mappings = CountLiveMappings();
         AdapterLife life;
         BeginAllocations(failing);
         life.Run();
@@ -69,6 +70,7 @@ TEST(AdapterMemory, EachFailureOfASecondKindCamerasLifeGivesACodeAndTheNextLifeI
 
         EXPECT_EQ(life.hasContext ? HALOk : HALDeviceNotOpen, life.connected);
         EXPECT_TRUE(life.started == HALOk || life.started == HALAdapterThreadNotStarted);
+        EXPECT_EQ(mappings, CountLiveMappings());
         EXPECT_FALSE(AdapterLife::HasEntry());
         if (!hasRefused) {
             EXPECT_EQ(HALOk, life.started);
@@ -105,15 +107,18 @@ TEST(AdapterMemory, SharedMemoryThatCannotBeMadeIsNoneAndLeavesNothing) {
     std::int64_t failing = 1;
     for (; hasRefused && failing < AdapterAllocationsMax && !HasFailure(); ++failing) {
         SCOPED_TRACE(failing);
+        const std::size_t mappings = CountLiveMappings();
         BeginAllocations(failing);
         SharedMemory* const memory = OpenSharedMemory(Name, BlockBytes);
         hasRefused = EndAllocations();
 
         EXPECT_EQ(hasRefused, memory == nullptr);
+        EXPECT_EQ(mappings + (hasRefused ? 0 : 1), CountLiveMappings());
         if (memory != nullptr) {
             EXPECT_EQ(0, *static_cast<std::uint8_t*>(GetSharedMemoryAddress(memory)));
         }
         CloseSharedMemory(memory);
+        EXPECT_EQ(mappings, CountLiveMappings());
     }
     EXPECT_FALSE(hasRefused);
     EXPECT_GE(failing, 4) << "the record, the file, its length, the mapping";

@@ -34,12 +34,16 @@ bool MayAllocate() {
     return allocationsLeft.fetch_sub(1) != 1;
 }
 
-/// The addresses of allocations, in a table of open addresses: it must not allocate.
+/// Addresses of what is there, in a table of open addresses: it must not allocate. It ends the
+/// process before one is forgotten.
 class LiveTable {
   public:
     void Insert(const void* address) {
         const std::lock_guard hold(mutex);
-        if (count > slots.size() / 2) return;
+        if (count > slots.size() / 2) {
+            (void)std::fputs("too many live allocations to look for lost ones\n", stderr);
+            std::abort();
+        }
         std::size_t i = GetHome(address);
         while (slots[i] != nullptr) i = (i + 1) % slots.size();
         slots[i] = address;
@@ -79,6 +83,7 @@ class LiveTable {
     std::size_t count = 0;
 };
 constinit LiveTable liveTable;
+constinit LiveTable liveMappings;  // of files
 
 template <typename Memory>
 Memory* Note(Memory* memory) {
@@ -94,6 +99,10 @@ void Forget(const void* memory) {
 
 std::size_t CountLiveAllocations() {
     return liveTable.GetCount();
+}
+
+std::size_t CountLiveMappings() {
+    return liveMappings.GetCount();
 }
 
 void BeginAllocations(std::int64_t failing) {
@@ -125,6 +134,7 @@ UncountedAllocations::~UncountedAllocations() {
 }  // namespace ZV::Test
 
 using ZV::Test::Forget;
+using ZV::Test::liveMappings;
 using ZV::Test::MayAllocate;
 using ZV::Test::Note;
 
@@ -152,6 +162,7 @@ int __real_ftruncate(int file, off_t bytes);
 int __real_shm_open(const char* name, int flags, mode_t mode);
 void* __real_mmap(void* address, std::size_t bytes, int protection, int flags, int file,
                   off_t offset);
+int __real_munmap(void* address, std::size_t bytes);
 
 void* __wrap_malloc(std::size_t bytes) {
     return MayAllocate() ? Note(__real_malloc(bytes)) : nullptr;
@@ -204,7 +215,8 @@ int __wrap_pthread_mutex_init(pthread_mutex_t* mutex, const pthread_mutexattr_t*
 
 int __wrap_open(const char* path, int flags, ...) {
     mode_t mode = 0;
-    if ((flags & (O_CREAT | O_TMPFILE)) != 0) {
+    // O_TMPFILE is of two bits, of which O_DIRECTORY is one.
+    if ((flags & O_CREAT) != 0 || (flags & O_TMPFILE) == O_TMPFILE) {
         va_list arguments;
         va_start(arguments, flags);
         mode = va_arg(arguments, mode_t);
@@ -239,9 +251,18 @@ int __wrap_shm_open(const char* name, int flags, mode_t mode) {
 
 void* __wrap_mmap(void* address, std::size_t bytes, int protection, int flags, int file,
                   off_t offset) {
-    if (MayAllocate()) return __real_mmap(address, bytes, protection, flags, file, offset);
-    errno = ENOMEM;
-    return MAP_FAILED;
+    if (!MayAllocate()) {
+        errno = ENOMEM;
+        return MAP_FAILED;
+    }
+    void* const mapped = __real_mmap(address, bytes, protection, flags, file, offset);
+    if (file >= 0 && mapped != MAP_FAILED) liveMappings.Insert(mapped);
+    return mapped;
+}
+
+int __wrap_munmap(void* address, std::size_t bytes) {
+    liveMappings.Erase(address);
+    return __real_munmap(address, bytes);
 }
 
 }  // extern "C"

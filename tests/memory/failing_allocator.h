@@ -24,6 +24,9 @@ std::int64_t CountAllocationsLeft();
 /// which looks at the end of the process.
 std::size_t CountLiveAllocations();
 
+/// Mappings of files that are not unmapped yet.
+std::size_t CountLiveMappings();
+
 /// While it lives, what its thread allocates is neither counted nor refused.
 class UncountedAllocations {
   public:
