@@ -78,6 +78,7 @@ TEST(AdapterMemory, EachFailureOfASecondKindCamerasLifeGivesACodeAndTheNextLifeI
         }
     }
     EXPECT_FALSE(hasRefused);
+    PrintRefusals();
     EXPECT_GT(failing, 15) << "a ring of ten, a context, a table, a thread";
     SetLastCameraFlag(false);
 }
@@ -99,6 +100,7 @@ TEST(AdapterMemory, ACameraWithoutItsMutexOrItsEventDoesNotStart) {
         EXPECT_EQ(HALOk, HAL_CameraRelease(&camera));
     }
     SetLastCameraFlag(false);
+    PrintRefusals();
 }
 
 TEST(AdapterMemory, SharedMemoryThatCannotBeMadeIsNoneAndLeavesNothing) {
@@ -121,6 +123,7 @@ TEST(AdapterMemory, SharedMemoryThatCannotBeMadeIsNoneAndLeavesNothing) {
         EXPECT_EQ(mappings, CountLiveMappings());
     }
     EXPECT_FALSE(hasRefused);
+    PrintRefusals();
     EXPECT_GE(failing, 4) << "the record, the file, its length, the mapping";
 }
 

@@ -127,6 +127,7 @@ TEST_F(FailingAllocation, OfOpenGrabAndCloseGivesACodeAndTheNextRunIsClean) {
         if (HasFailure()) break;
     }
     EXPECT_FALSE(hasRefused);
+    PrintRefusals();
 }
 
 TEST_F(FailingAllocation, OfLoadListAndReleaseGivesACodeAndTheNextRunIsClean) {
@@ -152,6 +153,7 @@ TEST_F(FailingAllocation, OfLoadListAndReleaseGivesACodeAndTheNextRunIsClean) {
         if (HasFailure()) break;
     }
     EXPECT_FALSE(hasRefused);
+    PrintRefusals();
 }
 
 TEST_F(FailingAllocation, OfAListingLeavesNoCameraWhoseCallsHang) {
@@ -182,6 +184,7 @@ TEST_F(FailingAllocation, OfAListingLeavesNoCameraWhoseCallsHang) {
         if (HasFailure()) break;
     }
     EXPECT_FALSE(hasRefused);
+    PrintRefusals();
 }
 
 TEST(FailingListing, OfTwoCamerasLeavesNoneThatOpensAndIsNoHandle) {
@@ -209,6 +212,7 @@ TEST(FailingListing, OfTwoCamerasLeavesNoneThatOpensAndIsNoHandle) {
         if (testing::Test::HasFailure()) break;
     }
     EXPECT_FALSE(hasRefused);
+    PrintRefusals();
     SetWaitClockDivisor(1);
 }
 

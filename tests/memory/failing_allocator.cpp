@@ -26,6 +26,7 @@ namespace {
 
 std::atomic<bool> isCounting{false};
 std::atomic<std::int64_t> allocationsLeft{0};  // 0 from the refused one on
+std::atomic<std::int64_t> refusals{0};
 
 thread_local int uncountedDepth = 0;
 
@@ -112,7 +113,12 @@ void BeginAllocations(std::int64_t failing) {
 
 bool EndAllocations() {
     isCounting = false;
+    if (HasRefusedAllocation()) ++refusals;
     return HasRefusedAllocation();
+}
+
+void PrintRefusals() {
+    std::printf("%lld refusals\n", static_cast<long long>(refusals.exchange(0)));
 }
 
 bool HasRefusedAllocation() {

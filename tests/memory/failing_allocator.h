@@ -17,6 +17,9 @@ bool EndAllocations();
 /// The same without ending the counting.
 bool HasRefusedAllocation();
 
+/// Prints how many countings have ended with a refusal, since it was last called.
+void PrintRefusals();
+
 /// How many are left before the one that is to be refused, that one included.
 std::int64_t CountAllocationsLeft();
 

@@ -23,6 +23,7 @@ std::int64_t ExpectNoMemoryForEachAllocation(const Call& call) {
         const KernelStatus status = call();
         if (!EndAllocations()) {
             EXPECT_EQ(status, KernelOk);
+            Test::PrintRefusals();
             return failing - 1;
         }
         EXPECT_EQ(status, KernelNoMemory) << failing;
