@@ -58,6 +58,11 @@ ProcessUsage MeasureUsage() {
     return usage;
 }
 
+void GrowthJudge::GoOnFrom(const ProcessUsage& firstMinute) {
+    most = firstMinute;
+    isFirst = false;
+}
+
 void GrowthJudge::Add(const ProcessUsage& usage) {
     for (const auto& [field, slack] : Fields) {
         if (isFirst) most.*field = std::max(most.*field, usage.*field);
@@ -71,6 +76,10 @@ void GrowthJudge::EndMinute() {
     isFirst = false;
     lastLeast = least;
     isNewMinute = true;
+}
+
+const ProcessUsage* GrowthJudge::GetFirstMinute() const {
+    return isFirst ? nullptr : &most;
 }
 
 bool GrowthJudge::IsSteady() const {

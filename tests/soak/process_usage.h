@@ -17,10 +17,16 @@ ProcessUsage MeasureUsage();
 /// first. What comes and goes in between is no growth.
 class GrowthJudge {
   public:
+    /// Judges against the first minute of a former run instead of the first that is added.
+    void GoOnFrom(const ProcessUsage& firstMinute);
     void Add(const ProcessUsage& usage);
     /// A minute has ended.
     void EndMinute();
-    /// True without a second minute.
+    /// The most of the first minute, or null before its end.
+    [[nodiscard]] const ProcessUsage* GetFirstMinute() const;
+    /// False before the end of a minute behind the first.
+    [[nodiscard]] bool HasJudged() const { return hasLast; }
+    /// True while nothing is judged.
     [[nodiscard]] bool IsSteady() const;
 
   private:

@@ -162,8 +162,10 @@ class ScenarioFile {
 
 class Soak {
   public:
-    Soak(const Options& soakOptions, const SoakSums& formerSums)
-        : options(soakOptions), former(formerSums) {}
+    Soak(const Options& soakOptions, const SoakState& formerState)
+        : options(soakOptions), former(formerState) {
+        if (former.cameras == options.cameras) judge.GoOnFrom(former.firstMinute);
+    }
 
     bool Begin() {
         if (Zentara_LoadDriver() != zerrNone) return false;
@@ -209,6 +211,9 @@ class Soak {
         Zentara_ReleaseDriver();
         Tell();
         const SoakSums sums = AddUp();
+        if (!judge.HasJudged()) {
+            (void)std::fputs("growth was not judged: it takes a minute behind the first\n", output);
+        }
         if (!judge.IsSteady()) (void)std::fputs("memory, threads or handles have grown\n", output);
         if (sums.unaccounted != 0) (void)std::fputs("frames are missing without a count\n", output);
         if (!haveAllStreamed) (void)std::fputs("a camera has not begun to stream\n", output);
@@ -234,11 +239,16 @@ class Soak {
                            [](const auto& camera) { return camera->GetSums().frames > 0; });
     }
     SoakSums AddUp() const {
-        SoakSums sums = former;
+        SoakSums sums = former.sums;
         for (const auto& camera : cameras) sums += camera->GetSums();
         sums.seconds += static_cast<std::uint64_t>(
             std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin).count());
         return sums;
+    }
+    SoakState MakeState(const SoakSums& sums) const {
+        const ProcessUsage* const first = judge.GetFirstMinute();
+        if (first == nullptr) return {sums, former.cameras, former.firstMinute};
+        return {sums, options.cameras, *first};
     }
     void Tell() const {
         const SoakSums sums = AddUp();
@@ -249,12 +259,12 @@ class Soak {
                      static_cast<unsigned long long>(usage.threads),
                      static_cast<unsigned long long>(usage.handles));
         (void)std::fflush(output);  // a picture of progress
-        if (options.state.empty() || WriteState(options.state, sums)) return;
+        if (options.state.empty() || WriteState(options.state, MakeState(sums))) return;
         std::fprintf(output, "%s cannot be written\n", options.state.c_str());
     }
 
     const Options& options;
-    const SoakSums former;
+    const SoakState former;
     std::mutex listMutex;
     std::atomic<bool> isOver{false};
     std::vector<std::unique_ptr<SoakedCamera>> cameras;
@@ -273,7 +283,7 @@ int Run(int count, char** arguments) {
             stderr);
         return 2;
     }
-    SoakSums former;
+    SoakState former;
     if (!options.state.empty() && !ReadState(options.state, &former)) {
         std::fprintf(output, "%s holds no sums of a soak\n", options.state.c_str());
         return 2;

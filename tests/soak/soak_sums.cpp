@@ -30,6 +30,18 @@ constexpr std::array Rows{
     SumRow{"stalls", &SoakSums::stalls},     SumRow{"failures", &SoakSums::failures},
 };
 
+struct UsageRow {
+    const char* name;
+    std::uint64_t ProcessUsage::*field;
+};
+
+constexpr std::array UsageRows{
+    UsageRow{"firstResidentBytes", &ProcessUsage::residentBytes},
+    UsageRow{"firstHeapBytes", &ProcessUsage::heapBytes},
+    UsageRow{"firstThreads", &ProcessUsage::threads},
+    UsageRow{"firstHandles", &ProcessUsage::handles},
+};
+
 /// Calls `visit` with the name and the value of each sum; of those by code, the ones that are not
 /// 0.
 template <typename Sums, typename Visit>
@@ -41,13 +53,25 @@ void ForEachSum(Sums& sums, const Visit& visit) {
     }
 }
 
-/// The sum of this name, or null.
-std::uint64_t* FindSum(SoakSums& sums, const std::string& name) {
+template <typename State, typename Visit>
+void ForEachValue(State& state, const Visit& visit) {
+    ForEachSum(state.sums, visit);
+    if (state.cameras == 0) return;
+    visit("cameras", state.cameras);
+    for (const UsageRow& row : UsageRows) visit(row.name, state.firstMinute.*row.field);
+}
+
+/// The value of this name, or null.
+std::uint64_t* FindValue(SoakState& state, const std::string& name) {
+    if (name == "cameras") return &state.cameras;
     for (const SumRow& row : Rows) {
-        if (row.name == name) return &(sums.*row.sum);
+        if (row.name == name) return &(state.sums.*row.sum);
+    }
+    for (const UsageRow& row : UsageRows) {
+        if (row.name == name) return &(state.firstMinute.*row.field);
     }
     for (std::size_t code = 0; code < SoakSums::CodeCount; ++code) {
-        if (name == "failedWith" + std::to_string(code)) return &sums.failedWith[code];
+        if (name == "failedWith" + std::to_string(code)) return &state.sums.failedWith[code];
     }
     return nullptr;
 }
@@ -68,26 +92,26 @@ std::string Describe(const SoakSums& sums) {
     return text.str();
 }
 
-bool ReadState(const std::string& path, SoakSums* sums) {
-    *sums = {};
+bool ReadState(const std::string& path, SoakState* state) {
+    *state = {};
     std::ifstream file(path);
     if (!file) return !std::filesystem::exists(path);
     std::string name;
     std::uint64_t value = 0;
     while (file >> name >> value) {
-        std::uint64_t* const sum = FindSum(*sums, name);
-        if (sum == nullptr) return false;
-        *sum = value;
+        std::uint64_t* const found = FindValue(*state, name);
+        if (found == nullptr) return false;
+        *found = value;
     }
     return file.eof();
 }
 
-bool WriteState(const std::string& path, const SoakSums& sums) {
+bool WriteState(const std::string& path, const SoakState& state) {
     const std::string unfinished = path + ".new";
     {
         std::ofstream file(unfinished);
-        ForEachSum(sums, [&](const std::string& name, std::uint64_t sum) {
-            file << name << " " << sum << "\n";
+        ForEachValue(state, [&](const std::string& name, std::uint64_t value) {
+            file << name << " " << value << "\n";
         });
         file.close();
         if (!file) return false;

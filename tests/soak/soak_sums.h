@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <string>
 
+#include "soak/process_usage.h"
+
 namespace ZV::Soak {
 
 /// What a soak adds up, over all of its runs.
@@ -36,9 +38,16 @@ struct SoakSums {
 /// One line, without an end.
 std::string Describe(const SoakSums& sums);
 
-/// Sums of the former runs; zeros for a file that is not there. False for a file that is none.
-bool ReadState(const std::string& path, SoakSums* sums);
+/// What a run leaves to the next.
+struct SoakState {
+    SoakSums sums;
+    std::uint64_t cameras = 0;  ///< Of the run with the first minute; 0 while there is none.
+    ProcessUsage firstMinute;   ///< The most that it held.
+};
+
+/// State of the former runs; zeros for a file that is not there. False for a file that is none.
+bool ReadState(const std::string& path, SoakState* state);
 /// Takes the file's place in one step. False when it cannot be written.
-bool WriteState(const std::string& path, const SoakSums& sums);
+bool WriteState(const std::string& path, const SoakState& state);
 
 }  // namespace ZV::Soak

@@ -14,6 +14,7 @@ namespace {
 
 using ZV::Soak::GrowthJudge;
 using ZV::Soak::ProcessUsage;
+using ZV::Soak::SoakState;
 using ZV::Soak::SoakSums;
 
 /// A soak as scripts/soak runs it, with the waits of a camera that has gone short.
@@ -59,18 +60,48 @@ TEST(GrowthJudgeTest, FindsOneHandleTooMany) {
     EXPECT_FALSE(judge.IsSteady());
 }
 
-TEST(SoakState, GoesOnWhereTheFormerRunEnded) {
+TEST(GrowthJudgeTest, JudgesNothingBeforeTheSecondMinuteEnds) {
+    GrowthJudge judge;
+    EXPECT_EQ(nullptr, judge.GetFirstMinute());
+    AddMinute(judge, {MakeUsage(50, 10), MakeUsage(40, 12)});
+
+    EXPECT_FALSE(judge.HasJudged());
+    ASSERT_NE(nullptr, judge.GetFirstMinute());
+    EXPECT_EQ(std::uint64_t{50} << 20, judge.GetFirstMinute()->heapBytes);
+    EXPECT_EQ(12U, judge.GetFirstMinute()->handles);
+
+    AddMinute(judge, {MakeUsage(50, 10)});
+
+    EXPECT_TRUE(judge.HasJudged());
+}
+
+TEST(GrowthJudgeTest, JudgesTheFirstMinuteOfARunThatGoesOnAgainstTheFirstOfAll) {
+    GrowthJudge judge;
+    judge.GoOnFrom(MakeUsage(50, 10));
+
+    AddMinute(judge, {MakeUsage(80, 10)});
+
+    EXPECT_TRUE(judge.HasJudged());
+    EXPECT_FALSE(judge.IsSteady());
+}
+
+TEST(SoakStateTest, GoesOnWhereTheFormerRunEnded) {
     const TemporaryFolder folder;
     SoakSums sums;
     sums.frames = 7;
     sums.unaccounted = 1;
     sums.failedWith[16] = 3;
-    ASSERT_TRUE(ZV::Soak::WriteState(folder.GetPath("state"), sums));
+    ASSERT_TRUE(ZV::Soak::WriteState(folder.GetPath("state"), {sums, 3, MakeUsage(50, 10)}));
 
-    SoakSums read;
-    ASSERT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &read));
+    SoakState state;
+    ASSERT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &state));
+    SoakSums& read = state.sums;
     read += sums;
 
+    EXPECT_EQ(3U, state.cameras);
+    EXPECT_EQ(std::uint64_t{50} << 20, state.firstMinute.heapBytes);
+    EXPECT_EQ(20U, state.firstMinute.threads);
+    EXPECT_EQ(10U, state.firstMinute.handles);
     EXPECT_EQ(14U, read.frames);
     EXPECT_EQ(2U, read.unaccounted);
     EXPECT_EQ(6U, read.failedWith[16]);
@@ -78,15 +109,16 @@ TEST(SoakState, GoesOnWhereTheFormerRunEnded) {
     EXPECT_THAT(folder.ListFiles(), testing::ElementsAre("state"));
 }
 
-TEST(SoakState, BeginsAtZeroWithoutAFileAndRefusesAnother) {
+TEST(SoakStateTest, BeginsAtZeroWithoutAFileAndRefusesAnother) {
     const TemporaryFolder folder;
-    SoakSums sums;
+    SoakState state;
 
-    EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("none"), &sums));
-    EXPECT_EQ(0U, sums.frames);
-    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("other", "frames many\n"), &sums));
-    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("third", "apples 3\n"), &sums));
-    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("fourth", "failedWith33 3\n"), &sums));
+    EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("none"), &state));
+    EXPECT_EQ(0U, state.sums.frames);
+    EXPECT_EQ(0U, state.cameras);
+    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("other", "frames many\n"), &state));
+    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("third", "apples 3\n"), &state));
+    EXPECT_FALSE(ZV::Soak::ReadState(folder.WriteFile("fourth", "failedWith33 3\n"), &state));
 }
 
 TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
@@ -99,8 +131,11 @@ TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
 
     EXPECT_EQ(0, result.exitCode) << result.output << result.errors;
     EXPECT_THAT(result.output, testing::HasSubstr("unaccounted 0"));
-    SoakSums sums;
-    EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &sums));
+    EXPECT_THAT(result.output, testing::HasSubstr("growth was not judged"));
+    SoakState state;
+    EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &state));
+    const SoakSums& sums = state.sums;
+    EXPECT_EQ(0U, state.cameras) << "three seconds have no first minute";
     EXPECT_GT(sums.frames, 0U);
     EXPECT_GT(sums.damaged, 0U);
     EXPECT_EQ(sums.delivered, sums.frames + sums.withoutTaker);
