@@ -229,6 +229,7 @@ std::uint32_t Device::CarryOut(std::unique_lock<std::mutex>& lock, Call& call,
                           (request.code == FW_IOCTL_ASYNC_WRITE && !camera.areWritesPended);
     // A reset finds what is on its way to the camera pended, and ends it.
     if (FindFault(matches, FaultKind::BusReset) != nullptr && IsRegisterRequest(request)) {
+        ++requestsFailed;
         if (!mayPend || isAtOnce) return PlatformErrorGeneralFailure;
         pended.forcedError = PlatformErrorGeneralFailure;
     }

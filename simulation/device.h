@@ -109,7 +109,8 @@ class Device {
     std::uint32_t DetachBuffers(Call& call);
     std::uint32_t Listen(Call& call);
     std::uint32_t Stop(Call& call);
-    void EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error);
+    /// Returns how many there were.
+    std::uint32_t EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error);
     void StopListening(const Handle& handle);
     void ObeyWrite(std::uint32_t address, std::uint32_t value);
     void RefreshStatus();

@@ -142,12 +142,13 @@ std::uint32_t Device::StreamLeave(Call& call) {
     return Answer(call, std::uint32_t{0});
 }
 
-void Device::EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error) {
+std::uint32_t Device::EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error) {
     std::vector<std::uint64_t> ids;
     for (const PendedRequest& pended : handle->pended) {
         if (pended.request->code == code) ids.push_back(pended.id);
     }
     for (const std::uint64_t id : ids) EndPended(handle, id, error, 0);
+    return static_cast<std::uint32_t>(ids.size());
 }
 
 std::uint32_t Device::QueryBusy(Call& call) {

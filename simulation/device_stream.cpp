@@ -354,8 +354,8 @@ void Device::ResetBus(const Handle& listener) {
     StopFrame();
     trace->WriteEvent(position, "busReset");
     EndWaiting(listener, FW_IOCTL_NOTIFY_WAIT, PlatformErrorNone);
-    EndWaiting(listener, FW_IOCTL_ASYNC_READ, PlatformErrorGeneralFailure);
-    EndWaiting(listener, FW_IOCTL_ASYNC_WRITE, PlatformErrorGeneralFailure);
+    requestsFailed += EndWaiting(listener, FW_IOCTL_ASYNC_READ, PlatformErrorGeneralFailure);
+    requestsFailed += EndWaiting(listener, FW_IOCTL_ASYNC_WRITE, PlatformErrorGeneralFailure);
     if (listener->attached.empty() || listener->attached.front().filled == 0) return;
     const AttachedBuffer& buffer = listener->attached.front();
     EndPended(listener, buffer.id, PlatformErrorGeneralFailure, 0);

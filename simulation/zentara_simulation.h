@@ -46,7 +46,7 @@ struct ZentaraSimulationState {
     std::uint64_t framesExposed;
     std::uint64_t framesSent;
     std::uint32_t isStreaming;
-    std::uint32_t requestsFailed;  ///< By the fault failRequest.
+    std::uint32_t requestsFailed;  ///< By failRequest; register requests by busReset too.
 };
 
 /// 0, or 1 for a camera that is not there. `camera` 0xFFFFFFFF sums over all.

@@ -328,6 +328,7 @@ TEST(Faults, ABusResetEndsTheRegisterRequestThatItMeetsAndLetsOthersPass) {
 
     EXPECT_EQ(PlatformErrorGeneralFailure, cut.error);
     EXPECT_EQ(0u, whole.error);
+    EXPECT_EQ(1u, world.GetState().requestsFailed);
 }
 
 TEST(Faults, AFrameUnplugsTheDevice) {

@@ -86,10 +86,11 @@ bool ReadOptions(int count, char** arguments, Options* options) {
     return options->cameras >= 1 && options->cameras <= CamerasMax && options->minuteSeconds > 0;
 }
 
-/// Packets that go wrong at the rate; a frame has some tens of them.
+/// Packets that go wrong, or meet a reset of the bus, at the rate; a frame has some tens of them.
 std::string MakeFaults(double rate) {
-    constexpr std::array Kinds{"losePacket",  "repeatPacket",     "truncatePacket", "corruptPacket",
-                               "missingTail", "overwriteRequest", "frameStart",     "wrongPsn"};
+    constexpr std::array Kinds{"losePacket",    "repeatPacket", "truncatePacket",
+                               "corruptPacket", "missingTail",  "overwriteRequest",
+                               "frameStart",    "busReset",     "wrongPsn"};
     std::string faults;
     for (const char* kind : Kinds) {
         if (!faults.empty()) faults += ", ";
@@ -99,9 +100,10 @@ std::string MakeFaults(double rate) {
     return faults;
 }
 
-/// Control requests that fail at the rate, by the call itself or when they end. A buffer that
-/// cannot be attached ends a stream's loop, and there is one for each request of a stream: they
-/// fail less often.
+/// Control requests that fail at the rate, by the call itself or when they end, and reads and
+/// writes of registers that a reset of the bus cuts at the same rate. A buffer that cannot be
+/// attached ends a stream's loop, and there is one for each request of a stream: they fail less
+/// often.
 std::vector<std::string> MakeRequestFaults(double rate) {
     constexpr double AttachShare = 0.01;
     std::vector<std::string> faults;
@@ -120,6 +122,10 @@ std::vector<std::string> MakeRequestFaults(double rate) {
         add(code, 1);
     }
     add("ATTACH_BUFFER", AttachShare);
+    for (const char* code : {"ASYNC_READ", "ASYNC_WRITE"}) {
+        faults.push_back(fmt::format(
+            R"({{"kind": "busReset", "code": "FW_IOCTL_{}", "probability": {}}})", code, rate));
+    }
     return faults;
 }
 

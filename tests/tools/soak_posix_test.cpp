@@ -149,8 +149,8 @@ TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
 // Each camera goes away by itself at its first start, and no fault has failed a request.
 TEST(Soak, FailsWhenACallFailsWithoutARequestThatAFaultHasFailed) {
     const ProgramResult result =
-        RunSoak({"--seconds", "3", "--cameras", "2", "--request-faults", "0", "--fault",
-                 R"({"kind": "unplug", "code": "FW_IOCTL_LISTEN"})"});
+        RunSoak({"--seconds", "3", "--cameras", "2", "--faults", "0", "--request-faults", "0",
+                 "--fault", R"({"kind": "unplug", "code": "FW_IOCTL_LISTEN"})"});
 
     EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
     EXPECT_THAT(result.output, testing::HasSubstr("requestsFailed 0,"));
