@@ -139,7 +139,9 @@ void Client::Reset() {
     served = 0;
     strangeCode = 0;
     for (Frame& frame : frames) {
-        frame.record = {.pBuffer = frame.pixels.data(), .bufferSize = BufferBytes};
+        frame.record = {};
+        frame.record.pBuffer = frame.pixels.data();
+        frame.record.bufferSize = BufferBytes;
         std::fill_n(frame.pixels.begin(), BufferBytes, std::uint8_t{0});
     }
 }
