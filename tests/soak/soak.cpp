@@ -199,10 +199,11 @@ class Soak {
         begin = Clock::now();
         const auto end = begin + std::chrono::seconds(options.seconds);
         auto minute = begin + std::chrono::seconds(options.minuteSeconds);
-        while (!isInterrupted && Clock::now() < end) {
+        for (auto now = begin; !isInterrupted && now < end;) {
             Test::Disturb(MeasuringStep);
             judge.Add(MeasureUsage());
-            if (Clock::now() < minute) continue;
+            now = Clock::now();  // one look: a minute that ends with the soak is whole
+            if (now < minute) continue;
             judge.EndMinute();
             Tell();
             minute += std::chrono::seconds(options.minuteSeconds);
