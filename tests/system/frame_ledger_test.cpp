@@ -419,8 +419,6 @@ TEST_P(FreeRunLedger, EveryFrameUntilTheCameraGoesIsDeliveredOrCounted) {
         return counters.begun.Get() - SumFates(counters) <= 2 &&
                counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
     }));
-    EXPECT_LT(0U, counters.delivered.Get(FrameStatusMissingData));
-    EXPECT_LT(0U, counters.bad.Get()) << "of another parameter set";
     ExpectClientGotWhatWasDelivered(client, counters);
     ExpectWholeFramesWereSent(client, session.world);
 }
