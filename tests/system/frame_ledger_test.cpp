@@ -22,6 +22,8 @@ namespace {
 constexpr std::uint32_t TriggerModeSoftware = 5;
 constexpr std::uint64_t Triggers = 40;
 constexpr std::size_t Queued = 25;
+/// Long enough for an abort amid it: 20 ms in a world of this time scale.
+constexpr std::uint64_t AbortedExposureNs = 1'000'000'000;
 /// More than the ring holds: whatever the camera had sent before has been parsed by then.
 constexpr std::uint32_t RequestsUntilSettled = 70;
 
@@ -55,6 +57,7 @@ struct LedgerFault {
     std::uint64_t failedTriggersMax = 0;  ///< Requests for an exposure that may fail.
     std::uint32_t silentVersions = 0;     ///< Pixels change, and nothing can tell.
     bool leavesOneUnfinished = false;     ///< A stop takes the last frame out of the queue.
+    bool isAborted = false;               ///< The engine refuses one frame.
 };
 
 /// The client dawdles over the first frames; each frame of these comes to an idle engine.
@@ -62,6 +65,7 @@ constexpr std::uint64_t FirstPaced = 15, LastPaced = 22;
 
 constexpr LedgerFault Faults[] = {
     {.name = "none", .json = ""},
+    {.name = "aborted", .json = "", .isAborted = true},
     {.name = "lostInside",
      .json = R"({"kind": "losePacket", "packet": 2, "frame": 16, "count": 2})",
      .damage = MissingData},
@@ -286,6 +290,10 @@ void TriggerAll(const CameraSession& session, const LedgerFault& fault) {
     std::uint64_t failuresLeft = fault.failedTriggersMax;
     for (std::uint64_t i = 1; i <= Triggers; ++i) {
         ASSERT_NO_FATAL_FAILURE(Trigger(session, &failuresLeft));
+        // In the midst of its exposure; a trigger would take an earlier abort back.
+        if (fault.isAborted && i > FirstPaced && i <= LastPaced && counters.refused.Get() == 0) {
+            ASSERT_EQ(CameraOk, session.GetCamera().Abort());
+        }
         if (i + 1 < FirstPaced || i > LastPaced) continue;
         ASSERT_TRUE(WaitUntil([&] { return session.world.GetState().framesExposed == i; }));
         ASSERT_TRUE(WaitUntilSettled(session.world));
@@ -326,7 +334,7 @@ void ExpectFaultShows(const LedgerCase& testCase, const CountingClient& client,
         EXPECT_TRUE(seen < Triggers ||
                     counters.delivered.Get(FrameStatusGood) < counters.delivered.GetSum());
     }
-    EXPECT_EQ(0U, counters.refused.Get());
+    EXPECT_EQ(fault.isAborted ? 1U : 0U, counters.refused.Get());
     if (fault.leavesOneUnfinished) {
         EXPECT_LT(0U, counters.cleared.Get());
     }
@@ -339,6 +347,9 @@ TEST_P(FrameLedger, EveryExposedFrameIsDeliveredOrCounted) {
     CameraSession session(MakeScenario(fault.json, GetVersion()));
     ASSERT_TRUE(session.IsOpen());
     ASSERT_EQ(CameraOk, session.GetCamera().SetTriggerMode(TriggerModeSoftware));
+    if (fault.isAborted) {
+        ASSERT_EQ(CameraOk, session.GetCamera().SetExposure(AbortedExposureNs));
+    }
     ASSERT_EQ(CameraOk, session.GetCamera().UpdateSettingsOnCamera());
     CountingClient client(session);
     client.DawdleUntilOneIsDropped();
