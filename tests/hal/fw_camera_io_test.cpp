@@ -350,6 +350,35 @@ TEST_F(RegisterTrace, AWriteShowsTheValuesBeforeTheirReversal) {
         Take());
 }
 
+TEST_F(RegisterTrace, ItsSwitchMayChangeWhileOtherThreadsRead) {
+    ASSERT_TRUE(mono.world.Poke(ScratchAddress, 0x01020304));
+    std::atomic<std::uint32_t> right{0}, wrong{0};
+    std::atomic<bool> mayEnd{false};
+    const auto readOn = [&] {
+        while (!mayEnd) {
+            std::uint32_t data = 0;
+            const HALStatus status = HAL_CameraReadData(camera, ScratchAddress, &data, 1);
+            ++(status == HALOk && data == 0x01020304 ? right : wrong);
+        }
+    };
+    std::thread first(readOn), second(readOn);
+    for (std::uint8_t i = 0; i < 100; ++i) {
+        EXPECT_EQ(HALOk, HAL_CameraSetShouldOutputReads(0, i % 2));
+        const std::uint32_t before = right;
+        EXPECT_TRUE(WaitUntil([&] { return right > before || wrong > 0; }));
+    }
+    EXPECT_EQ(HALOk, HAL_CameraSetShouldOutputReads(0, 0));
+    mayEnd = true;
+    first.join();
+    second.join();
+
+    EXPECT_EQ(0u, wrong.load());
+    EXPECT_NE(std::string::npos, output.Take().find("Async read from address"));
+    std::uint32_t data = 0;
+    EXPECT_EQ(HALOk, HAL_CameraReadData(camera, ScratchAddress, &data, 1));
+    EXPECT_EQ("", output.Take());
+}
+
 TEST_F(RegisterTrace, AReadShowsTheValuesAfterTheirReversal) {
     ASSERT_EQ(HALOk, HAL_CameraSetShouldOutputReads(0, 1));
     ASSERT_TRUE(mono.world.Poke(ScratchAddress, 0x01020304));
