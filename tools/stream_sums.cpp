@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cstddef>
 #include <span>
 #include <utility>
 
@@ -43,14 +44,14 @@ void StreamSums::CountNumber(std::uint16_t number) {
         lastNumber = number;
         return;
     }
-    if (doubted == number) {
+    if (!doubted.empty() && doubted.back() == number) {
         ++repeats;
         return;
     }
-    if (const auto suspect = std::exchange(doubted, std::nullopt)) Judge(*suspect, number);
+    if (!doubted.empty()) Judge(number);
     const std::uint32_t step = GetStep(lastNumber, number);
     if (step > numbersPerFrame) {
-        doubted = number;
+        Doubt(number);
     } else {
         Advance(step);
     }
@@ -60,18 +61,47 @@ bool StreamSums::IsClose(std::uint32_t step) const {
     return step > 0 && step <= CloseFrames * numbersPerFrame;
 }
 
+bool StreamSums::IsRowAhead() const {
+    std::uint64_t former = lastNumber;
+    return std::all_of(doubted.begin(), doubted.end(), [&](std::uint16_t number) {
+        const std::uint32_t step = GetStep(std::exchange(former, number), number);
+        return step > 0 && step <= AheadMax * numbersPerFrame;
+    });
+}
+
 /// A short step is believed unless the next frame belongs before it; a long one, ahead or back,
 /// only when the next frame carries on behind it and not behind the frame before it.
-void StreamSums::Judge(std::uint16_t number, std::uint16_t next) {
+void StreamSums::Judge(std::uint16_t next) {
+    const std::uint16_t number = doubted.back();
     const std::uint32_t jump = GetStep(lastNumber, number);
     const bool goesOn = IsClose(GetStep(number, next));
     const bool goesOnFromLast = IsClose(GetStep(lastNumber, next));
-    const bool isWrong = IsClose(jump) ? !goesOn && goesOnFromLast : !goesOn || goesOnFromLast;
-    if (isWrong) {
-        ++misnumbered;
-    } else {
-        Advance(jump);
+    if (goesOnFromLast && !(IsClose(jump) && goesOn)) {
+        Discard(doubted.size());
+    } else if (goesOn || IsClose(jump)) {
+        Discard(doubted.size() - 1);
+        BelieveRow();
     }
+}
+
+void StreamSums::Doubt(std::uint16_t number) {
+    doubted.push_back(number);
+    if (doubted.size() < RowMin) return;
+    if (IsRowAhead()) {
+        BelieveRow();
+    } else {
+        Discard(1);
+    }
+}
+
+void StreamSums::BelieveRow() {
+    for (const std::uint16_t number : doubted) Advance(GetStep(lastNumber, number));
+    doubted.clear();
+}
+
+void StreamSums::Discard(std::size_t suspects) {
+    misnumbered += suspects;
+    doubted.erase(doubted.begin(), doubted.begin() + static_cast<std::ptrdiff_t>(suspects));
 }
 
 void StreamSums::Advance(std::uint32_t step) {
@@ -90,13 +120,12 @@ void StreamSums::Advance(std::uint32_t step) {
 }
 
 void StreamSums::Settle() {
-    const auto suspect = std::exchange(doubted, std::nullopt);
-    if (!suspect) return;
-    const std::uint32_t jump = GetStep(lastNumber, *suspect);
-    if (IsClose(jump)) {
-        Advance(jump);
+    if (doubted.empty()) return;
+    const bool isRow = doubted.size() > 1 && IsRowAhead();
+    if (isRow || IsClose(GetStep(lastNumber, doubted.back()))) {
+        BelieveRow();
     } else {
-        ++misnumbered;
+        Discard(doubted.size());
     }
 }
 

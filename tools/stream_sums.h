@@ -2,7 +2,6 @@
 
 #include <cstdint>
 #include <map>
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -23,10 +22,12 @@ struct MissingFrames {
 /// between two frames that came: what was lost before the first and behind the last is unknown, and
 /// so are whole rounds of the number. A number that jumps is doubted until the next frame, or
 /// `Settle`. A step of more than `CloseFrames` frames is believed when the next number lies close
-/// behind it, and only then: whatever follows, a wrong number, as a damaged header makes it, moves
-/// nothing. Its frame counts as `misnumbered`, and as missing the number that none came under. So
-/// does a frame between two losses of more than that, and a last one behind such a loss. A first
-/// number that is wrong shows as a gap, and so does a wrong one that happens to lie close ahead.
+/// behind it; a row of such steps, as of a client that is slower than its camera, when it has
+/// `RowMin` of them (two at the end of the stream), each ahead by `AheadMax` at most. Whatever else
+/// comes, a wrong number, as a damaged header makes it, moves nothing: its frame counts as
+/// `misnumbered`, and as missing the number that none came under. So does a frame between two
+/// single losses of more than `CloseFrames`, and a last one behind such a loss. A first number that
+/// is wrong shows as a gap, and so does a wrong one that happens to lie close ahead.
 class StreamSums {
   public:
     /// Runs of missing frames that are kept; of further ones the count alone.
@@ -35,6 +36,9 @@ class StreamSums {
     static constexpr std::size_t DescribedMax = 1000;
     /// So many frames may be lost behind a jump that is believed.
     static constexpr std::uint32_t CloseFrames = 64;
+    /// Of a row of jumps that is believed: its length, and the longest step.
+    static constexpr std::size_t RowMin = 4;
+    static constexpr std::uint32_t AheadMax = 8192;
 
     /// A frame of `numbersPerFrame` exposures uses up as many numbers.
     explicit StreamSums(std::uint32_t numbersPerFrame);
@@ -67,13 +71,17 @@ class StreamSums {
   private:
     void CountNumber(std::uint16_t number);
     [[nodiscard]] bool IsClose(std::uint32_t step) const;
-    void Judge(std::uint16_t number, std::uint16_t next);
+    [[nodiscard]] bool IsRowAhead() const;
+    void Judge(std::uint16_t next);
+    void Doubt(std::uint16_t number);
+    void BelieveRow();
+    void Discard(std::size_t suspects);
     void Advance(std::uint32_t step);
 
     std::uint32_t numbersPerFrame;
     std::uint64_t lastNumber = 0;
     bool hasBegun = false;
-    std::optional<std::uint16_t> doubted;
+    std::vector<std::uint16_t> doubted;  ///< In the order of their frames.
     std::vector<MissingFrames> missing;
     std::map<std::uint32_t, std::uint64_t> errors;
 };

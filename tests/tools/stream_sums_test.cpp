@@ -87,6 +87,29 @@ TEST(StreamSumsTest, AFrameBetweenTwoLongLossesIsMissingUnderItsNumber) {
     EXPECT_EQ("5-399", sums.DescribeMissing());
 }
 
+TEST(StreamSumsTest, AClientThatLosesManyFramesEachTimeIsToldOfAll) {
+    const StreamSums sums = CountNumbers({0, 90, 180, 270});
+    const StreamSums longer = CountNumbers({0, 90, 180, 270, 360, 450, 540, 630, 720});
+    const StreamSums oneWrong = CountNumbers({0, 90, 180, 40000, 360, 450, 540, 630});
+
+    EXPECT_EQ("1-89, 91-179, 181-269", sums.DescribeMissing());
+    EXPECT_EQ(8U * 89U, longer.drops);
+    EXPECT_EQ(8U, longer.gaps);
+    EXPECT_EQ(720U, longer.GetLastNumber());
+    for (const StreamSums& whole : {sums, longer}) EXPECT_EQ(0U, whole.misnumbered);
+    EXPECT_EQ(3U, oneWrong.misnumbered);
+    EXPECT_EQ("1-359, 361-449, 451-539, 541-629", oneWrong.DescribeMissing());
+}
+
+TEST(StreamSumsTest, WrongNumbersAtTheEndOfAStreamAreNoRow) {
+    for (const StreamSums& sums : {CountNumbers({4, 900, 30000}), CountNumbers({4, 900, 300}),
+                                   CountNumbers({4, 60000, 8})}) {
+        EXPECT_GE(2U, sums.gaps);
+        EXPECT_LE(1U, sums.misnumbered);
+        EXPECT_GT(10U, sums.drops);
+    }
+}
+
 TEST(StreamSumsTest, AWrongNumberBesideALossHidesNothing) {
     const StreamSums sums = CountNumbers({4, 6, 2, 9, 10});
 
