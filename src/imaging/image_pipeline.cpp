@@ -134,7 +134,8 @@ FilterResult ZImagePipeline::ProcessImage(ZExImage* image, bool* complete) {
     }
     image->SetImageSize(oldSize);
     const bool lacksMemory = imageBufferBytes < needed || intermediate.GetBytes() < needed;
-    if (result == FilterFailed && lacksMemory && image->GetErrorCode() == FrameStatusGood) {
+    const bool isUnmade = (result == FilterFailed && lacksMemory) || result == FilterNotInitialised;
+    if (isUnmade && image->GetErrorCode() == FrameStatusGood) {
         image->SetErrorCode(FrameStatusBufferTooSmall);
     }
     if (result == FilterDone) {

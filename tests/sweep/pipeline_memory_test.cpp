@@ -49,5 +49,28 @@ TEST(PipelineWithoutMemory, LetsNoImageThatItHasNotMadePassAsAGoodOne) {
     EXPECT_EQ(FrameStatusBufferTooSmall, image.GetErrorCode());
 }
 
+/// A filter wheel or mosaic filter whose buffers could not be had.
+class Unprepared : public Tripler {
+  public:
+    FilterResult Process(ZInImageBufferStruct*, ZOutImageBufferStruct*) override {
+        return FilterNotInitialised;
+    }
+};
+
+TEST(PipelineWithoutMemory, LetsNoImagePassAsAGoodOneWhoseFilterHasNoBuffers) {
+    Unprepared filter;
+    ZImagePipeline pipeline;
+    pipeline.Setup(4, 2);
+    pipeline.AddFilter(&filter);
+    ZExImage image = Testing::MakeImage(Testing::Ramp(8));
+    bool isComplete = false;
+
+    EXPECT_EQ(FilterNotInitialised, pipeline.ProcessImage(&image, &isComplete));
+
+    EXPECT_TRUE(isComplete);
+    EXPECT_EQ(8U, image.GetImageSize());
+    EXPECT_EQ(FrameStatusBufferTooSmall, image.GetErrorCode());
+}
+
 }  // namespace
 }  // namespace ZV::Test
