@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-#include "camera/camera.h"
+#include "camera/morvane_fw_camera.h"
 #include "imaging/image_filter.h"
 #include "imaging/image_pipeline.h"
 #include "support/flat_camera.h"
@@ -62,6 +62,9 @@ Bytes LayOut(const std::array<Bytes, 3>& planes, std::uint32_t format) {
     }
     return image;
 }
+
+/// More than the ring holds.
+constexpr std::uint32_t RequestsUntilSettled = 70;
 
 class WheelCapture : public OpenedCamera {
   protected:
@@ -175,9 +178,27 @@ class WheelCapture : public OpenedCamera {
     void Step(std::size_t exposures) {
         for (std::size_t i = 0; i < exposures; ++i) {
             const std::size_t sent = world.ReadFrames().size();
+            const std::uint64_t begun = GetCounters().begun.Get();
             ASSERT_ZERR(zerrNone, Zentara_Trigger(handle));
             ASSERT_TRUE(WaitUntil([&] { return world.ReadFrames().size() > sent; }));
+            ASSERT_TRUE(WaitUntilServed(begun));
         }
+    }
+    StreamCounters& GetCounters() {
+        return static_cast<MorvaneFWCamera&>(GetCamera()).GetStreamCounters();
+    }
+    /// Whether the frame sent last, if its start is seen at all, is past the queue of two, which
+    /// would drop one else. One that has lost its end waits for the next.
+    bool WaitUntilServed(std::uint64_t begunBefore) {
+        const std::uint32_t served = world.GetState().requestsServed;
+        const StreamCounters& counters = GetCounters();
+        return WaitUntil([&] {
+            const bool isParsed = counters.begun.Get() > begunBefore ||
+                                  world.GetState().requestsServed - served >= RequestsUntilSettled;
+            return isParsed &&
+                   counters.begun.Get() <= counters.delivered.GetSum() + counters.heldBack.Get() +
+                                               counters.dropped.Get() + counters.bad.Get() + 1;
+        });
     }
 
     std::array<double, 3> seconds{};
