@@ -46,10 +46,6 @@ struct RegisterWrite {
 /// Checksum of a trace's frames: FNV-1a of 64 bits.
 std::uint64_t CalculateChecksum(const void* bytes, std::size_t count);
 
-/// A simulated world for the life of the object: a scenario in a folder of its own, with a trace,
-/// and `ZENTARA_SIMULATION` naming it. The bus starts when the library lists its devices, or with
-/// Start; the destructor ends it, clears the variable and removes the folder.
-///
 /// Reads a trace that grows: what it has parsed once it does not parse again. Of several threads.
 class TraceReader {
   public:
@@ -62,6 +58,10 @@ class TraceReader {
     std::vector<TraceRecord> records;
 };
 
+/// A simulated world for the life of the object: a scenario in a folder of its own, with a trace,
+/// and `ZENTARA_SIMULATION` naming it. The bus starts when the library lists its devices, or with
+/// Start; the destructor ends it, clears the variable and removes the folder.
+///
 /// The scenario is the name of a built-in one, or a JSON object (docs/simulation.md). Unless it
 /// says otherwise, time scale is 0 and each camera's images have no noise.
 class SimulationWorld {
