@@ -48,8 +48,8 @@ class ZENTARA_API ZImagePipeline : public ZObject {
     /// Runs the filters over an image, whose buffer grows if one of them needs it. Only a result of
     /// `FilterDone` changes the image's format, size, width and height, the latter two cut to 16
     /// bits; its pixels may be those of an earlier filter in any case. An image that the filters
-    /// have failed on for want of memory, or whose filter has no buffers of its size, gets the error
-    /// code `FrameStatusBufferTooSmall`, unless it has one.
+    /// have failed on for want of memory, or whose filter has no buffers of its size, gets the
+    /// error code `FrameStatusBufferTooSmall`, unless it has one.
     FilterResult ProcessImage(ZExImage* image, bool* complete);
 
   private:
