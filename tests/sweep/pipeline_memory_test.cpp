@@ -30,25 +30,6 @@ class Tripler : public ZImageFilter {
     }
 };
 
-TEST(PipelineWithoutMemory, LetsNoImageThatItHasNotMadePassAsAGoodOne) {
-    Tripler tripler;
-    ZImagePipeline pipeline;
-    pipeline.Setup(4, 2);
-    pipeline.AddFilter(&tripler);
-    ZExImage image = Testing::MakeImage(Testing::Ramp(8));
-
-    BeginAllocations(1);
-    bool isComplete = false;
-    const FilterResult result = pipeline.ProcessImage(&image, &isComplete);
-    EXPECT_TRUE(EndAllocations());
-
-    // Kept: the image that a filter has failed on is delivered as it came.
-    EXPECT_EQ(FilterFailed, result);
-    EXPECT_TRUE(isComplete);
-    EXPECT_EQ(8U, image.GetImageSize());
-    EXPECT_EQ(FrameStatusBufferTooSmall, image.GetErrorCode());
-}
-
 /// A filter wheel or mosaic filter whose buffers could not be had.
 class Unprepared : public Tripler {
   public:
@@ -57,19 +38,46 @@ class Unprepared : public Tripler {
     }
 };
 
-TEST(PipelineWithoutMemory, LetsNoImagePassAsAGoodOneWhoseFilterHasNoBuffers) {
-    Unprepared filter;
+/// A pipeline of one filter.
+class PipelineWithoutMemory : public testing::Test {
+  protected:
+    void Add(ZImageFilter* filter) {
+        pipeline.Setup(4, 2);
+        pipeline.AddFilter(filter);
+    }
+    FilterResult Process() { return pipeline.ProcessImage(&image, &isComplete); }
+    /// Kept: the image that a filter has failed on is delivered as it came.
+    void ExpectImageAsItCame() const {
+        EXPECT_TRUE(isComplete);
+        EXPECT_EQ(8U, image.GetImageSize());
+        EXPECT_EQ(0, std::memcmp(Testing::Ramp(8).data(), image.GetImageData(), 8));
+        EXPECT_EQ(FrameStatusBufferTooSmall, image.GetErrorCode());
+    }
+
     ZImagePipeline pipeline;
-    pipeline.Setup(4, 2);
-    pipeline.AddFilter(&filter);
     ZExImage image = Testing::MakeImage(Testing::Ramp(8));
     bool isComplete = false;
+};
 
-    EXPECT_EQ(FilterNotInitialised, pipeline.ProcessImage(&image, &isComplete));
+TEST_F(PipelineWithoutMemory, LetsNoImageThatItHasNotMadePassAsAGoodOne) {
+    Tripler tripler;
+    Add(&tripler);
 
-    EXPECT_TRUE(isComplete);
-    EXPECT_EQ(8U, image.GetImageSize());
-    EXPECT_EQ(FrameStatusBufferTooSmall, image.GetErrorCode());
+    BeginAllocations(1);
+    const FilterResult result = Process();
+    EXPECT_TRUE(EndAllocations());
+
+    EXPECT_EQ(FilterFailed, result);
+    ExpectImageAsItCame();
+}
+
+TEST_F(PipelineWithoutMemory, LetsNoImagePassAsAGoodOneWhoseFilterHasNoBuffers) {
+    Unprepared filter;
+    Add(&filter);
+
+    EXPECT_EQ(FilterNotInitialised, Process());
+
+    ExpectImageAsItCame();
 }
 
 }  // namespace
