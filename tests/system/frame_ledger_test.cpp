@@ -7,6 +7,7 @@
 #include <mutex>
 #include <set>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -242,6 +243,11 @@ bool WaitUntilSettled(const SimulationWorld& world) {
         [&] { return world.GetState().requestsServed - served >= RequestsUntilSettled; });
 }
 
+/// Starts that the library saw.
+std::uint64_t CountSeen(const StreamCounters& counters) {
+    return counters.begun.Get() + counters.refused.Get();
+}
+
 /// What became of the starts that the library saw, after the stop.
 std::uint64_t SumFates(const StreamCounters& counters) {
     return counters.delivered.GetSum() + counters.heldBack.Get() + counters.dropped.Get() +
@@ -330,7 +336,7 @@ void ExpectFaultShows(const LedgerCase& testCase, const CountingClient& client,
         EXPECT_LT(0U, counters.delivered.Get(status)) << "with status " << status;
     }
     if (fault.requestsLost > 0) {
-        const std::uint64_t seen = counters.begun.Get() + counters.refused.Get();
+        const std::uint64_t seen = CountSeen(counters);
         EXPECT_TRUE(seen < Triggers ||
                     counters.delivered.Get(FrameStatusGood) < counters.delivered.GetSum());
     }
@@ -370,7 +376,7 @@ TEST_P(FrameLedger, EveryExposedFrameIsDeliveredOrCounted) {
     EXPECT_TRUE(WaitUntilServed(client, counters));
     EXPECT_EQ(counters.begun.Get(), SumFates(counters));
     EXPECT_EQ(Triggers - fault.brokenOff, session.world.ReadFrames().size()) << "in the trace";
-    const std::uint64_t seen = counters.begun.Get() + counters.refused.Get();
+    const std::uint64_t seen = CountSeen(counters);
     const std::uint64_t seenMax = Triggers + fault.restarts - fault.unseen;
     EXPECT_GE(seenMax, seen);
     EXPECT_LE(seenMax, seen + fault.requestsLost * CountStartsInRequest(session));
@@ -422,7 +428,7 @@ TEST_P(FreeRunLedger, EveryFrameUntilTheCameraGoesIsDeliveredOrCounted) {
     const StreamCounters& counters = session.GetCamera().GetStreamCounters();
     EXPECT_EQ(LastFrame - 1, session.world.ReadFrames().size()) << "in the trace";
     // One start is lost, and one frame has two, of which each has a number.
-    const std::uint64_t seen = counters.begun.Get() + counters.refused.Get();
+    const std::uint64_t seen = CountSeen(counters);
     ASSERT_FALSE(client.GetWholeNumbers().empty());
     EXPECT_LE(*client.GetWholeNumbers().rbegin(), seen + 1);
     EXPECT_GE(LastFrame, seen);
@@ -435,6 +441,83 @@ TEST_P(FreeRunLedger, EveryFrameUntilTheCameraGoesIsDeliveredOrCounted) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Versions, FreeRunLedger, testing::Values(0U, 1U, 2U));
+
+/// What goes wrong with every frame of a free run, or by chance, and how it shows.
+struct LastingFault {
+    const char* name;
+    const char* json;
+    bool (*hasShown)(const StreamCounters& counters, std::uint64_t framesExposed);
+};
+
+constexpr LastingFault LastingFaults[] = {
+    {"lostInside", R"({"kind": "losePacket", "packet": 1})",
+     [](const StreamCounters& counters, std::uint64_t) {
+         return counters.delivered.Get(FrameStatusMissingData) > 0;
+     }},
+    {"lostStart", R"({"kind": "losePacket", "packet": 0})",
+     [](const StreamCounters&, std::uint64_t framesExposed) { return framesExposed >= Queued; }},
+    {"startInside", R"({"kind": "frameStart", "packet": 2})",
+     [](const StreamCounters& counters, std::uint64_t) {
+         return counters.delivered.Get(FrameStatusOutOfSync) +
+                    counters.delivered.Get(FrameStatusMissingData) >
+                0;
+     }},
+    // No arrival tells of such a frame: it is looked at when a good one has come.
+    {"otherSettings", R"({"kind": "wrongPsn", "probability": 0.5})",
+     [](const StreamCounters& counters, std::uint64_t) { return counters.bad.Get() > 0; }},
+};
+
+struct LastingCase {
+    std::uint32_t version;
+    LastingFault fault;
+};
+
+std::ostream& operator<<(std::ostream& stream, const LastingCase& testCase) {
+    return stream << testCase.fault.name << " of version " << testCase.version;
+}
+
+std::vector<LastingCase> ListLastingCases() {
+    std::vector<LastingCase> cases;
+    for (const LastingFault& fault : LastingFaults) {
+        for (std::uint32_t version = 0; version < 3; ++version) cases.push_back({version, fault});
+    }
+    return cases;
+}
+
+class LastingFaultLedger : public testing::TestWithParam<LastingCase> {};
+
+// However many frames the queue of two drops, some come by.
+TEST_P(LastingFaultLedger, ShowsInAFreeRun) {
+    const auto& [version, fault] = GetParam();
+    CameraSession session(MakeScenario(fault.json, version));
+    ASSERT_TRUE(session.IsOpen());
+    CountingClient client(session);
+    client.Queue(Queued);
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
+    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
+
+    ASSERT_TRUE(WaitUntil([&, &hasShown = fault.hasShown] {
+        return hasShown(counters, session.world.GetState().framesExposed);
+    }));
+    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
+
+    // Of two frames that wait at a stop one stays for the next stream.
+    ASSERT_TRUE(WaitUntil([&] {
+        return counters.begun.Get() - SumFates(counters) <= 1 &&
+               counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
+    }));
+    if (std::string_view(fault.name) == "lostStart") {
+        EXPECT_EQ(0U, CountSeen(counters));
+    }
+    ExpectClientGotWhatWasDelivered(client, counters);
+    ExpectWholeFramesWereSent(client, session.world);
+}
+
+INSTANTIATE_TEST_SUITE_P(Versions, LastingFaultLedger, testing::ValuesIn(ListLastingCases()),
+                         [](const auto& caseInfo) {
+                             return std::string(caseInfo.param.fault.name) + "OfVersion" +
+                                    std::to_string(caseInfo.param.version);
+                         });
 
 TEST(FrameLedgerTest, AnAbortRefusesExactlyOneFrame) {
     CameraSession session(MakeScenario("", 1));
