@@ -1,43 +1,23 @@
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <array>
-#include <deque>
-#include <map>
-#include <mutex>
-#include <set>
 #include <string>
-#include <string_view>
-#include <utility>
 #include <vector>
 
 #include "support/expect_zerr.h"
 #include "support/wait_until.h"
-#include "system/camera_session.h"
+#include "system/frame_ledger.h"
 
-// No frame is lost without a count: what the simulated camera exposed, as its state and its trace
-// tell, is what the camera's counters and the client's callbacks add up to.
+// No frame of a paced stream is lost without a count.
 namespace ZV::Test {
 namespace {
 
-constexpr std::uint32_t TriggerModeSoftware = 5;
 constexpr std::uint64_t Triggers = 40;
 constexpr std::size_t Queued = 25;
 /// Long enough for an abort amid it: 20 ms in a world of this time scale.
 constexpr std::uint64_t AbortedExposureNs = 1'000'000'000;
 /// More than the ring holds: whatever the camera had sent before has been parsed by then.
 constexpr std::uint32_t RequestsUntilSettled = 70;
-
-/// Frame status code of an image and the code that the client gets for it.
-struct CodeRow {
-    std::uint16_t status;
-    std::uint32_t code;
-};
-constexpr CodeRow Codes[] = {{FrameStatusGood, zerrNone},
-                             {FrameStatusMissingData, zerrMissingData},
-                             {FrameStatusOutOfSync, zerrOutOfSync},
-                             {FrameStatusBufferTooSmall, zerrBufferTooSmall},
-                             {FrameStatusIncomplete, zerrFrameIncomplete}};
 
 using StatusByVersion = std::array<std::uint16_t, 3>;
 constexpr StatusByVersion Undamaged{},
@@ -150,86 +130,6 @@ std::vector<LedgerCase> ListCases() {
     return cases;
 }
 
-constexpr std::uint64_t Width = 160, Height = 120;
-
-std::string MakeScenario(const std::string& faults, std::uint32_t version) {
-    return R"({"timeScale": 0.02, "cameras": [{"model": "SolvaneA1", "streamingVersion": )" +
-           std::to_string(version) + R"(, "sensor": {"width": )" + std::to_string(Width) +
-           R"(, "height": )" + std::to_string(Height) + R"(, "colour": "mono"},
-           "scene": {"kind": "flat"}, "faults": [)" +
-           faults + "]}]}";
-}
-
-/// A client that queues frames and writes down the codes that come back.
-class CountingClient {
-  public:
-    explicit CountingClient(CameraSession& countedSession) : session(countedSession) {}
-    CountingClient(const CountingClient&) = delete;
-    CountingClient& operator=(const CountingClient&) = delete;
-
-    void Queue(std::size_t count) { Queue(count, session.GetCamera().GetImageSize()); }
-    void Queue(std::size_t count, std::uint32_t bytes) {
-        for (std::size_t i = 0; i < count; ++i) {
-            DeliveredFrame& delivered = frames.emplace_back();
-            delivered.pixels.resize(bytes);
-            delivered.frame.pBuffer = delivered.pixels.data();
-            delivered.frame.bufferSize = bytes;
-            EXPECT_ZERR(zerrNone, Zentara_QueueFrame(session.GetHandle(), &delivered.frame, Receive,
-                                                     zcbFrameDone,
-                                                     reinterpret_cast<std::uintptr_t>(this), 0));
-        }
-    }
-    /// The first frame's callback returns when a frame behind it has been dropped.
-    void DawdleUntilOneIsDropped() { hasDawdled = false; }
-    std::map<std::uint32_t, std::uint64_t> CountCodes() const {
-        const std::lock_guard hold(mutex);
-        return codes;
-    }
-    std::uint64_t CountAll() const {
-        std::uint64_t sum = 0;
-        for (const auto& [code, count] : CountCodes()) sum += count;
-        return sum;
-    }
-    /// Checksums of what came whole, by rolling number.
-    std::map<std::uint32_t, std::uint64_t> GetWholeChecksums() const {
-        std::map<std::uint32_t, std::uint64_t> checksums;
-        for (const DeliveredFrame& delivered : frames) {
-            if (delivered.frame.frameNumber == 0 || delivered.frame.errorCode != 0) continue;
-            checksums[delivered.frame.frameNumber] =
-                CalculateChecksum(delivered.pixels.data(), delivered.frame.size);
-        }
-        return checksums;
-    }
-    /// Rolling numbers of what came whole.
-    std::set<std::uint32_t> GetWholeNumbers() const {
-        std::set<std::uint32_t> numbers;
-        for (const DeliveredFrame& delivered : frames) {
-            if (delivered.frame.frameNumber == 0 || delivered.frame.errorCode != 0) continue;
-            numbers.insert(delivered.frame.frameNumber);
-        }
-        return numbers;
-    }
-
-  private:
-    static void Receive(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
-                        std::uint32_t) {
-        auto& client = *reinterpret_cast<CountingClient*>(userPrivate);
-        {
-            const std::lock_guard hold(client.mutex);
-            ++client.codes[errorCode];
-        }
-        if (std::exchange(client.hasDawdled, true)) return;
-        const StreamCounters& counters = client.session.GetCamera().GetStreamCounters();
-        EXPECT_TRUE(WaitUntil([&] { return counters.dropped.Get() > 0; }));
-    }
-
-    CameraSession& session;
-    std::deque<DeliveredFrame> frames;
-    mutable std::mutex mutex;
-    std::map<std::uint32_t, std::uint64_t> codes;
-    bool hasDawdled = true;  // The run loop's.
-};
-
 class FrameLedger : public testing::TestWithParam<LedgerCase> {
   protected:
     static std::uint32_t GetVersion() { return GetParam().version; }
@@ -241,43 +141,6 @@ bool WaitUntilSettled(const SimulationWorld& world) {
     const std::uint32_t served = world.GetState().requestsServed;
     return WaitUntil(
         [&] { return world.GetState().requestsServed - served >= RequestsUntilSettled; });
-}
-
-/// Starts that the library saw.
-std::uint64_t CountSeen(const StreamCounters& counters) {
-    return counters.begun.Get() + counters.refused.Get();
-}
-
-/// What became of the starts that the library saw, after the stop.
-std::uint64_t SumFates(const StreamCounters& counters) {
-    return counters.delivered.GetSum() + counters.heldBack.Get() + counters.dropped.Get() +
-           counters.bad.Get() + counters.cleared.Get();
-}
-
-/// A stop does not wait for the frame that the run loop is serving. False when frames are missing.
-bool WaitUntilServed(const CountingClient& client, const StreamCounters& counters) {
-    return WaitUntil([&] {
-        return counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum() &&
-               counters.begun.Get() == SumFates(counters);
-    });
-}
-
-void ExpectClientGotWhatWasDelivered(const CountingClient& client, const StreamCounters& counters) {
-    auto codes = client.CountCodes();
-    for (const CodeRow& row : Codes) {
-        EXPECT_EQ(counters.delivered.Get(row.status),
-                  codes[row.code] + counters.withoutTaker.Get(row.status))
-            << GetZerrName(row.code);
-    }
-}
-
-/// Every whole frame stands in the trace: it went over the bus to its end.
-void ExpectWholeFramesWereSent(const CountingClient& client, const SimulationWorld& world) {
-    std::set<std::uint32_t> sent;
-    for (const TraceRecord& record : world.ReadFrames()) sent.insert(record.rollingFrameNumber);
-    for (const std::uint32_t number : client.GetWholeNumbers()) {
-        EXPECT_EQ(1U, sent.count(number)) << "frame " << number;
-    }
 }
 
 /// Asks until the camera has exposed. What falls into a reset of the bus fails and is not done.
@@ -311,7 +174,7 @@ void TriggerAll(const CameraSession& session, const LedgerFault& fault) {
 std::uint64_t CountStartsInRequest(const CameraSession& session) {
     constexpr std::uint64_t PacketsInRequest = 30;
     const std::uint64_t payload = session.GetPacketBytes();
-    const std::uint64_t packets = (Width * Height + payload - 1) / payload;
+    const std::uint64_t packets = (LedgerWidth * LedgerHeight + payload - 1) / payload;
     return PacketsInRequest / packets + 1;
 }
 
@@ -350,7 +213,7 @@ void ExpectFaultShows(const LedgerCase& testCase, const CountingClient& client,
 
 TEST_P(FrameLedger, EveryExposedFrameIsDeliveredOrCounted) {
     const LedgerFault& fault = GetFault();
-    CameraSession session(MakeScenario(fault.json, GetVersion()));
+    CameraSession session(MakeLedgerScenario(fault.json, GetVersion()));
     ASSERT_TRUE(session.IsOpen());
     ASSERT_EQ(CameraOk, session.GetCamera().SetTriggerMode(TriggerModeSoftware));
     if (fault.isAborted) {
@@ -393,196 +256,6 @@ INSTANTIATE_TEST_SUITE_P(Versions, FrameLedger, testing::ValuesIn(ListCases()),
                              return std::string(caseInfo.param.fault.name) + "OfVersion" +
                                     std::to_string(caseInfo.param.version);
                          });
-
-/// Whether the thread that parses has come to the requests that the unplugging ended.
-bool HasLeftStream(const SimulationWorld& world) {
-    const auto requests = world.ReadRequests();
-    return std::any_of(requests.begin(), requests.end(), [](const TraceRecord& record) {
-        return record.name == "FW_IOCTL_STREAM_LEAVE";
-    });
-}
-
-class FreeRunLedger : public testing::TestWithParam<std::uint32_t> {};
-
-// What lies in the ring when a camera goes is never parsed: it is the tail that no number follows.
-TEST_P(FreeRunLedger, EveryFrameUntilTheCameraGoesIsDeliveredOrCounted) {
-    constexpr std::uint64_t LastFrame = 60;
-    CameraSession session(
-        MakeScenario(R"({"kind": "losePacket", "packet": 1, "frame": 11, "count": 8},
-        {"kind": "losePacket", "packet": 0, "frame": 21},
-        {"kind": "wrongPsn", "frame": 31, "count": 8},
-        {"kind": "frameStart", "packet": 2, "frame": 41},
-        {"kind": "unplug", "packet": 2, "frame": 60})",
-                     GetParam()));
-    ASSERT_TRUE(session.IsOpen());
-    CountingClient client(session);
-    client.DawdleUntilOneIsDropped();
-    client.Queue(LastFrame);
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
-
-    ASSERT_TRUE(WaitUntil([&] { return HasLeftStream(session.world); }));
-    EXPECT_ZERR(zerrDriverFault, Zentara_SetStreaming(session.GetHandle(), 0));
-
-    // The stop has failed before it emptied the queue; frames that the run loop has not served wait
-    // there: the last one, which has no end, and what came since the latest wake.
-    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
-    EXPECT_EQ(LastFrame - 1, session.world.ReadFrames().size()) << "in the trace";
-    // One start is lost, and one frame has two, of which each has a number.
-    const std::uint64_t seen = CountSeen(counters);
-    ASSERT_FALSE(client.GetWholeNumbers().empty());
-    EXPECT_LE(*client.GetWholeNumbers().rbegin(), seen + 1);
-    EXPECT_GE(LastFrame, seen);
-    ASSERT_TRUE(WaitUntil([&] {
-        return counters.begun.Get() - SumFates(counters) <= 2 &&
-               counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
-    }));
-    ExpectClientGotWhatWasDelivered(client, counters);
-    ExpectWholeFramesWereSent(client, session.world);
-}
-
-INSTANTIATE_TEST_SUITE_P(Versions, FreeRunLedger, testing::Values(0U, 1U, 2U));
-
-/// What goes wrong with every frame of a free run, or by chance, and how it shows.
-struct LastingFault {
-    const char* name;
-    const char* json;
-    bool (*hasShown)(const StreamCounters& counters, std::uint64_t framesExposed);
-};
-
-constexpr LastingFault LastingFaults[] = {
-    {"lostInside", R"({"kind": "losePacket", "packet": 1})",
-     [](const StreamCounters& counters, std::uint64_t) {
-         return counters.delivered.Get(FrameStatusMissingData) > 0;
-     }},
-    {"lostStart", R"({"kind": "losePacket", "packet": 0})",
-     [](const StreamCounters&, std::uint64_t framesExposed) { return framesExposed >= Queued; }},
-    {"startInside", R"({"kind": "frameStart", "packet": 2})",
-     [](const StreamCounters& counters, std::uint64_t) {
-         return counters.delivered.Get(FrameStatusOutOfSync) +
-                    counters.delivered.Get(FrameStatusMissingData) >
-                0;
-     }},
-    // No arrival tells of such a frame: it is looked at when a good one has come.
-    {"otherSettings", R"({"kind": "wrongPsn", "probability": 0.5})",
-     [](const StreamCounters& counters, std::uint64_t) { return counters.bad.Get() > 0; }},
-};
-
-struct LastingCase {
-    std::uint32_t version;
-    LastingFault fault;
-};
-
-std::ostream& operator<<(std::ostream& stream, const LastingCase& testCase) {
-    return stream << testCase.fault.name << " of version " << testCase.version;
-}
-
-std::vector<LastingCase> ListLastingCases() {
-    std::vector<LastingCase> cases;
-    for (const LastingFault& fault : LastingFaults) {
-        for (std::uint32_t version = 0; version < 3; ++version) cases.push_back({version, fault});
-    }
-    return cases;
-}
-
-class LastingFaultLedger : public testing::TestWithParam<LastingCase> {};
-
-// However many frames the queue of two drops, some come by.
-TEST_P(LastingFaultLedger, ShowsInAFreeRun) {
-    const auto& [version, fault] = GetParam();
-    CameraSession session(MakeScenario(fault.json, version));
-    ASSERT_TRUE(session.IsOpen());
-    CountingClient client(session);
-    client.Queue(Queued);
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
-    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
-
-    ASSERT_TRUE(WaitUntil([&, &hasShown = fault.hasShown] {
-        return hasShown(counters, session.world.GetState().framesExposed);
-    }));
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
-
-    // Of two frames that wait at a stop one stays for the next stream.
-    ASSERT_TRUE(WaitUntil([&] {
-        return counters.begun.Get() - SumFates(counters) <= 1 &&
-               counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
-    }));
-    if (std::string_view(fault.name) == "lostStart") {
-        EXPECT_EQ(0U, CountSeen(counters));
-    }
-    ExpectClientGotWhatWasDelivered(client, counters);
-    ExpectWholeFramesWereSent(client, session.world);
-}
-
-INSTANTIATE_TEST_SUITE_P(Versions, LastingFaultLedger, testing::ValuesIn(ListLastingCases()),
-                         [](const auto& caseInfo) {
-                             return std::string(caseInfo.param.fault.name) + "OfVersion" +
-                                    std::to_string(caseInfo.param.version);
-                         });
-
-TEST(FrameLedgerTest, AnAbortRefusesExactlyOneFrame) {
-    CameraSession session(MakeScenario("", 1));
-    ASSERT_TRUE(session.IsOpen());
-    CountingClient client(session);
-    client.Queue(3);
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
-    ASSERT_TRUE(WaitUntil([&] { return client.CountAll() == 3; }));
-    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
-
-    ASSERT_ZERR(zerrNone, Zentara_Abort(session.GetHandle()));
-    const std::uint64_t begun = counters.begun.Get();
-    ASSERT_TRUE(WaitUntil([&] { return counters.begun.Get() > begun + 3; }));
-
-    EXPECT_EQ(1U, counters.refused.Get());
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
-}
-
-TEST(FrameLedgerTest, ImagesThatNobodyWaitsForAreCountedAsSuch) {
-    CameraSession session(MakeScenario("", 1));
-    ASSERT_TRUE(session.IsOpen());
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
-    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
-
-    ASSERT_TRUE(WaitUntil([&] { return counters.withoutTaker.GetSum() >= 5; }));
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
-
-    EXPECT_TRUE(
-        WaitUntil([&] { return counters.delivered.GetSum() == counters.withoutTaker.GetSum(); }));
-}
-
-TEST(FrameLedgerTest, TheExposuresOfAWheelAreHeldBackUntilTheyAreAnImage) {
-    CameraSession session(
-        R"({"base": "wheel", "timeScale": 0.02, "cameras": [{"sensor": {"width": 60, "height": 40}}]})");
-    ASSERT_TRUE(session.IsOpen());
-    Zentara_Settings settings{};
-    ASSERT_ZERR(zerrNone, Zentara_ReadSettingsFromCam(session.GetHandle(), &settings));
-    ASSERT_ZERR(zerrNone, Zentara_SetParam(&settings, zprmImageFormat, zfmtRGBPlane8));
-    ASSERT_ZERR(zerrNone, Zentara_SendSettingsToCam(session.GetHandle(), &settings));
-    ASSERT_EQ(CameraOk, session.GetCamera().SetTriggerMode(TriggerModeSoftware));
-    ASSERT_EQ(CameraOk, session.GetCamera().UpdateSettingsOnCamera());
-    CountingClient client(session);
-    client.Queue(4, 3 * session.GetCamera().GetImageSize());
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 1));
-
-    const StreamCounters& counters = session.GetCamera().GetStreamCounters();
-    constexpr std::uint64_t Exposures = 12;
-    for (std::uint64_t i = 1; i <= Exposures; ++i) {
-        ASSERT_ZERR(zerrNone, Zentara_Trigger(session.GetHandle()));
-        ASSERT_TRUE(WaitUntil([&] { return session.world.GetState().framesSent == i; }));
-        ASSERT_TRUE(WaitUntil([&] { return SumFates(counters) == i; }));
-    }
-    ASSERT_ZERR(zerrNone, Zentara_SetStreaming(session.GetHandle(), 0));
-
-    EXPECT_EQ(Exposures, session.world.GetState().framesExposed);
-    EXPECT_EQ(Exposures, counters.begun.Get());
-    EXPECT_EQ(0U, counters.refused.Get());
-    EXPECT_EQ(Exposures, counters.heldBack.Get() + counters.delivered.GetSum());
-    EXPECT_LT(0U, counters.delivered.GetSum());
-    ASSERT_TRUE(WaitUntil([&] {
-        return counters.delivered.GetSum() == client.CountAll() + counters.withoutTaker.GetSum();
-    }));
-    EXPECT_LE(2 * counters.delivered.GetSum(), counters.heldBack.Get());
-    ExpectClientGotWhatWasDelivered(client, counters);
-}
 
 }  // namespace
 }  // namespace ZV::Test
