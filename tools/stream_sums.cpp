@@ -6,6 +6,7 @@
 #include <array>
 #include <cstddef>
 #include <span>
+#include <tuple>
 #include <utility>
 
 namespace ZentaraProgram {
@@ -40,68 +41,91 @@ void StreamSums::Count(const Zentara_Frame& frame) {
 }
 
 void StreamSums::CountNumber(std::uint16_t number) {
-    if (!std::exchange(hasBegun, true)) {
-        lastNumber = number;
-        return;
-    }
     if (!doubted.empty() && doubted.back() == number) {
         ++repeats;
         return;
     }
-    if (!doubted.empty()) Judge(number);
-    const std::uint32_t step = GetStep(lastNumber, number);
-    if (step > numbersPerFrame) {
-        Doubt(number);
-    } else {
-        Advance(step);
-    }
-}
-
-bool StreamSums::IsClose(std::uint32_t step) const {
-    return step > 0 && step <= CloseFrames * numbersPerFrame;
-}
-
-bool StreamSums::IsRowAhead() const {
-    std::uint64_t former = lastNumber;
-    return std::all_of(doubted.begin(), doubted.end(), [&](std::uint16_t number) {
-        const std::uint32_t step = GetStep(std::exchange(former, number), number);
-        return step > 0 && step <= AheadMax * numbersPerFrame;
-    });
-}
-
-/// A short step is believed unless the next frame belongs before it; a long one, ahead or back,
-/// only when the next frame carries on behind it and not behind the frame before it.
-void StreamSums::Judge(std::uint16_t next) {
-    const std::uint16_t number = doubted.back();
-    const std::uint32_t jump = GetStep(lastNumber, number);
-    const bool goesOn = IsClose(GetStep(number, next));
-    const bool goesOnFromLast = IsClose(GetStep(lastNumber, next));
-    if (goesOnFromLast && !(IsClose(jump) && goesOn)) {
-        Discard(doubted.size());
-    } else if (goesOn || IsClose(jump)) {
-        Discard(doubted.size() - 1);
-        BelieveRow();
-    }
-}
-
-void StreamSums::Doubt(std::uint16_t number) {
     doubted.push_back(number);
-    if (doubted.size() < RowMin) return;
-    if (IsRowAhead()) {
-        BelieveRow();
+    while (const std::size_t first = GetCertainFirst(ReadDoubted())) Believe(first);
+    if (doubted.size() <= DoubtedMax) return;
+    if (const std::size_t first = GetCheapestFirst(ReadDoubted())) {
+        Believe(first);
     } else {
         Discard(1);
     }
 }
 
-void StreamSums::BelieveRow() {
-    for (const std::uint16_t number : doubted) Advance(GetStep(lastNumber, number));
-    doubted.clear();
+bool StreamSums::Reading::IsCheaper(const Reading& other) const {
+    return std::tie(cost, missing) < std::tie(other.cost, other.missing);
 }
 
-void StreamSums::Discard(std::size_t suspects) {
-    misnumbered += suspects;
-    doubted.erase(doubted.begin(), doubted.begin() + static_cast<std::ptrdiff_t>(suspects));
+std::uint32_t StreamSums::GetLost(std::uint32_t step) const {
+    return step == 0 ? 0 : (step - 1) / numbersPerFrame;
+}
+
+/// The reading of the numbers up to `from` with the one at `to` as its next that is believed.
+StreamSums::Reading StreamSums::GoOn(const Reading& reading, std::size_t from,
+                                     std::size_t to) const {
+    Reading further{reading.cost + (to - from - 1), reading.missing,
+                    from == 0 ? to : reading.first};
+    if (from == 0 && !hasBegun) return further;
+    const std::uint64_t former = from == 0 ? lastNumber : doubted[from - 1];
+    const std::uint32_t lost = GetLost(GetStep(former, doubted[to - 1]));
+    further.missing += lost;
+    if (lost > ShortLossMax) further.cost += LongLossCost;
+    return further;
+}
+
+/// The reading at 0 believes none of the doubted numbers, that at i the i-th one as its last.
+std::vector<StreamSums::Reading> StreamSums::ReadDoubted() const {
+    std::vector<Reading> readings(1);
+    readings.reserve(doubted.size() + 1);
+    for (std::size_t to = 1; to <= doubted.size(); ++to) {
+        Reading cheapest = GoOn(readings[to - 1], to - 1, to);
+        for (std::size_t from = to - 1; from-- > 0;) {
+            const Reading reading = GoOn(readings[from], from, to);
+            if (reading.IsCheaper(cheapest)) cheapest = reading;
+        }
+        readings.push_back(cheapest);
+    }
+    for (std::size_t i = 0; i < readings.size(); ++i) readings[i].cost += doubted.size() - i;
+    return readings;
+}
+
+std::size_t StreamSums::GetCheapestFirst(const std::vector<Reading>& readings) {
+    return std::min_element(
+               readings.begin(), readings.end(),
+               [](const Reading& left, const Reading& right) { return left.IsCheaper(right); })
+        ->first;
+}
+
+/// From the cheapest reading any number can be reached by one long loss, so that a reading which
+/// costs more than both is out. 0 while those that are left do not begin alike.
+std::size_t StreamSums::GetCertainFirst(const std::vector<Reading>& readings) {
+    std::uint64_t costMax = readings.front().cost;
+    for (const Reading& reading : readings) costMax = std::min(costMax, reading.cost);
+    costMax += LongLossCost;
+    const std::size_t first = readings.back().first;
+    const bool isCertain = std::all_of(
+        readings.begin(), readings.end(),
+        [&](const Reading& reading) { return reading.cost > costMax || reading.first == first; });
+    return isCertain ? first : 0;
+}
+
+void StreamSums::Believe(std::size_t first) {
+    Discard(first - 1);
+    const std::uint16_t number = doubted.front();
+    doubted.erase(doubted.begin());
+    if (std::exchange(hasBegun, true)) {
+        Advance(GetStep(lastNumber, number));
+    } else {
+        lastNumber = number;
+    }
+}
+
+void StreamSums::Discard(std::size_t count) {
+    misnumbered += count;
+    doubted.erase(doubted.begin(), doubted.begin() + static_cast<std::ptrdiff_t>(count));
 }
 
 void StreamSums::Advance(std::uint32_t step) {
@@ -111,7 +135,7 @@ void StreamSums::Advance(std::uint32_t step) {
     }
     const std::uint64_t former = lastNumber;
     lastNumber += step;
-    const std::uint32_t lost = (step - 1) / numbersPerFrame;
+    const std::uint32_t lost = GetLost(step);
     if (lost == 0) return;
     ++gaps;
     drops += lost;
@@ -120,12 +144,13 @@ void StreamSums::Advance(std::uint32_t step) {
 }
 
 void StreamSums::Settle() {
-    if (doubted.empty()) return;
-    const bool isRow = doubted.size() > 1 && IsRowAhead();
-    if (isRow || IsClose(GetStep(lastNumber, doubted.back()))) {
-        BelieveRow();
-    } else {
-        Discard(doubted.size());
+    while (!doubted.empty()) {
+        const std::size_t first = GetCheapestFirst(ReadDoubted());
+        if (first == 0) {
+            Discard(doubted.size());
+        } else {
+            Believe(first);
+        }
     }
 }
 

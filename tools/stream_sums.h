@@ -20,40 +20,43 @@ struct MissingFrames {
 ///
 /// The camera numbers its frames in 16 bits; here they go on counting beyond 65535. A loss shows
 /// between two frames that came: what was lost before the first and behind the last is unknown, and
-/// so are whole rounds of the number. A number that jumps is doubted until the next frame, or
-/// `Settle`. A step of more than `CloseFrames` frames is believed when the next number lies close
-/// behind it; a row of such steps, as of a client that is slower than its camera, when it has
-/// `RowMin` of them (two at the end of the stream), each ahead by `AheadMax` at most. Whatever else
-/// comes, a wrong number, as a damaged header makes it, moves nothing: its frame counts as
-/// `misnumbered`, and as missing the number that none came under. So does a frame between two
-/// single losses of more than `CloseFrames`, and a last one behind such a loss. A first number that
-/// is wrong shows as a gap, and so does a wrong one that happens to lie close ahead.
+/// so are whole rounds of the number. A damaged header makes a wrong number; which ones are wrong
+/// is read from all that came, in the cheapest way: a number that is not believed costs 1, a loss
+/// of up to `ShortLossMax` frames nothing, a longer one `LongLossCost`. A number that goes back is
+/// a loss of most of a round. Of equally cheap ways the one with the fewest missing frames is
+/// taken.
+///
+/// So numbers that only go ahead by short losses are all believed. Up to `LongLossCost` wrong ones
+/// in a row are `misnumbered`, and missing the numbers that none came under; so are as few right
+/// ones between, before or behind long losses. Wrong ones are believed when nothing disproves them,
+/// as last ones that lie short losses ahead, or when more than so few go on from each other.
 class StreamSums {
   public:
     /// Runs of missing frames that are kept; of further ones the count alone.
     static constexpr std::size_t MissingMax = 100000;
     /// Of those, as many as a text names.
     static constexpr std::size_t DescribedMax = 1000;
-    /// So many frames may be lost behind a jump that is believed.
-    static constexpr std::uint32_t CloseFrames = 64;
-    /// Of a row of jumps that is believed: its length, and the longest step.
-    static constexpr std::size_t RowMin = 4;
-    static constexpr std::uint32_t AheadMax = 8192;
+    /// A client that is slower than its camera loses fewer frames at a time.
+    static constexpr std::uint32_t ShortLossMax = 1024;
+    static constexpr std::uint32_t LongLossCost = 3;
+    /// A number is in doubt while frames to come could change how it is read, and no longer than
+    /// until so many are.
+    static constexpr std::size_t DoubtedMax = 64;
 
     /// A frame of `numbersPerFrame` exposures uses up as many numbers.
     explicit StreamSums(std::uint32_t numbersPerFrame);
 
     void Count(const Zentara_Frame& frame);
 
-    /// Ends the doubt about the last number; no frame follows.
+    /// Ends the doubt about the last numbers, as if no frame followed.
     void Settle();
 
-    /// Counts from 0 again; the numbers go on, and so does a doubt.
+    /// Counts from 0 again; the numbers go on, and those in doubt count later.
     void ForgetCounts();
 
     [[nodiscard]] double GetRate() const;
     [[nodiscard]] double GetMegabytesPerSecond() const;
-    /// Of the last frame but those whose number is doubted or wrong; 0 before the first.
+    /// The last one that is believed and no longer in doubt; 0 before the first.
     [[nodiscard]] std::uint64_t GetLastNumber() const { return lastNumber; }
     [[nodiscard]] const std::vector<MissingFrames>& GetMissing() const { return missing; }
     /// Gaps whose frames are not among the missing ones that are kept.
@@ -65,17 +68,26 @@ class StreamSums {
 
     std::uint64_t frames = 0, bytes = 0, damaged = 0, gaps = 0, drops = 0, files = 0;
     std::uint64_t repeats = 0;      ///< Frames under the number of the one before.
-    std::uint64_t misnumbered = 0;  ///< Frames under a number that cannot be theirs.
+    std::uint64_t misnumbered = 0;  ///< Frames whose number is not believed.
     double seconds = 0;
 
   private:
+    /// The cheapest way to read the doubted numbers up to one that is believed.
+    struct Reading {
+        std::uint64_t cost = 0, missing = 0;
+        std::size_t first = 0;  ///< Of those believed, counted from 1; 0 when none is.
+
+        [[nodiscard]] bool IsCheaper(const Reading& other) const;
+    };
+
     void CountNumber(std::uint16_t number);
-    [[nodiscard]] bool IsClose(std::uint32_t step) const;
-    [[nodiscard]] bool IsRowAhead() const;
-    void Judge(std::uint16_t next);
-    void Doubt(std::uint16_t number);
-    void BelieveRow();
-    void Discard(std::size_t suspects);
+    [[nodiscard]] std::uint32_t GetLost(std::uint32_t step) const;
+    [[nodiscard]] Reading GoOn(const Reading& reading, std::size_t from, std::size_t to) const;
+    [[nodiscard]] std::vector<Reading> ReadDoubted() const;
+    [[nodiscard]] static std::size_t GetCheapestFirst(const std::vector<Reading>& readings);
+    [[nodiscard]] static std::size_t GetCertainFirst(const std::vector<Reading>& readings);
+    void Believe(std::size_t first);
+    void Discard(std::size_t count);
     void Advance(std::uint32_t step);
 
     std::uint32_t numbersPerFrame;
