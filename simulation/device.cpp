@@ -220,8 +220,10 @@ std::uint32_t Device::CarryOut(std::unique_lock<std::mutex>& lock, Call& call,
                                          : Block(lock, call.handle);
     }
     if (const FaultDescription* fault = FindFault(matches, FaultKind::FailRequest)) {
-        ++requestsFailed;
-        if (!fault->isPended || !mayPend) return fault->error;
+        CountFailed(request.code, 1);
+        const bool isRefused = !fault->isPended || !mayPend;
+        if (request.code == FW_IOCTL_ATTACH_BUFFER) ++(isRefused ? buffersRefused : buffersFailed);
+        if (isRefused) return fault->error;
         pended.forcedError = fault->error;
         return Pend(call.handle, pended, true);
     }
@@ -229,7 +231,7 @@ std::uint32_t Device::CarryOut(std::unique_lock<std::mutex>& lock, Call& call,
                           (request.code == FW_IOCTL_ASYNC_WRITE && !camera.areWritesPended);
     // A reset finds what is on its way to the camera pended, and ends it.
     if (FindFault(matches, FaultKind::BusReset) != nullptr && IsRegisterRequest(request)) {
-        ++requestsFailed;
+        CountFailed(request.code, 1);
         if (!mayPend || isAtOnce) return PlatformErrorGeneralFailure;
         pended.forcedError = PlatformErrorGeneralFailure;
     }
@@ -437,6 +439,10 @@ void Device::AddState(ZentaraSimulationState* state) const {
     }
     state->requestsServed += requestsServed;
     state->requestsFailed += requestsFailed;
+    state->registerRequestsFailed += registerRequestsFailed;
+    state->buffersRefused += buffersRefused;
+    state->buffersFailed += buffersFailed;
+    state->framesBegun += framesBegun;
     state->framesExposed += framesExposed;
     state->framesSent += framesSent;
     state->isStreaming |= sender.isOn;

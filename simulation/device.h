@@ -111,6 +111,7 @@ class Device {
     std::uint32_t Stop(Call& call);
     /// Returns how many there were.
     std::uint32_t EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error);
+    void CountFailed(std::uint32_t code, std::uint32_t count);
     void StopListening(const Handle& handle);
     void ObeyWrite(std::uint32_t address, std::uint32_t value);
     void RefreshStatus();
@@ -198,6 +199,7 @@ class Device {
     bool isPlugged = true;
     bool isEnding = false;
     std::uint32_t requestsServed = 0, requestsFailed = 0;
+    std::uint32_t registerRequestsFailed = 0, buffersRefused = 0, buffersFailed = 0;
     std::uint64_t framesExposed = 0, framesSent = 0, framesBegun = 0;
     std::uint32_t wheelStep = 0;
     std::uint64_t cycles = 0;

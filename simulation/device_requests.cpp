@@ -151,6 +151,13 @@ std::uint32_t Device::EndWaiting(const Handle& handle, std::uint32_t code, std::
     return static_cast<std::uint32_t>(ids.size());
 }
 
+void Device::CountFailed(std::uint32_t code, std::uint32_t count) {
+    requestsFailed += count;
+    if (code == FW_IOCTL_ASYNC_READ || code == FW_IOCTL_ASYNC_WRITE) {
+        registerRequestsFailed += count;
+    }
+}
+
 std::uint32_t Device::QueryBusy(Call& call) {
     const std::uint64_t opening = call.handle->opening;
     bool isBusy = camera.heldFrom != 0 && opening >= camera.heldFrom &&

@@ -354,10 +354,12 @@ void Device::ResetBus(const Handle& listener) {
     StopFrame();
     trace->WriteEvent(position, "busReset");
     EndWaiting(listener, FW_IOCTL_NOTIFY_WAIT, PlatformErrorNone);
-    requestsFailed += EndWaiting(listener, FW_IOCTL_ASYNC_READ, PlatformErrorGeneralFailure);
-    requestsFailed += EndWaiting(listener, FW_IOCTL_ASYNC_WRITE, PlatformErrorGeneralFailure);
+    for (const std::uint32_t code : {FW_IOCTL_ASYNC_READ, FW_IOCTL_ASYNC_WRITE}) {
+        CountFailed(code, EndWaiting(listener, code, PlatformErrorGeneralFailure));
+    }
     if (listener->attached.empty() || listener->attached.front().filled == 0) return;
     const AttachedBuffer& buffer = listener->attached.front();
+    ++buffersFailed;
     EndPended(listener, buffer.id, PlatformErrorGeneralFailure, 0);
 }
 

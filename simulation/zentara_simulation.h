@@ -47,6 +47,14 @@ struct ZentaraSimulationState {
     std::uint64_t framesSent;
     std::uint32_t isStreaming;
     std::uint32_t requestsFailed;  ///< By failRequest; register requests by busReset too.
+    /// Of them the reads and writes of registers.
+    std::uint32_t registerRequestsFailed;
+    /// Buffers of a stream that failRequest has refused by the call itself.
+    std::uint32_t buffersRefused;
+    /// Buffers of a stream that ended with an error of failRequest or busReset.
+    std::uint32_t buffersFailed;
+    /// Numbers that frames have used up: one that begins anew takes another.
+    std::uint64_t framesBegun;
 };
 
 /// 0, or 1 for a camera that is not there. `camera` 0xFFFFFFFF sums over all.
