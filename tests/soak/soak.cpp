@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <array>
 #include <atomic>
+#include <charconv>
 #include <chrono>
 #include <csignal>
 #include <cstdio>
@@ -14,6 +15,7 @@
 #include <memory>
 #include <string>
 #include <string_view>
+#include <system_error>
 #include <thread>
 #include <vector>
 
@@ -46,32 +48,47 @@ void PartOutputs() {
 }
 
 struct Options {
-    std::uint64_t seconds = 60, minuteSeconds = 60;
-    std::uint32_t cameras = 10;
+    std::uint64_t seconds = 60, minuteSeconds = 60, cameras = 10;
     double faults = 0.001, requestFaults = 0.001;
     std::string fault;  ///< Of every camera, besides.
     std::string state;
 };
 
+/// False for a text that is not a number to its end.
+bool ReadNumber(const char* text, std::uint64_t* number) {
+    const char* const end = text + std::strlen(text);
+    const auto [stop, error] = std::from_chars(text, end, *number);
+    return error == std::errc() && stop == end;
+}
+
+bool ReadRate(const char* text, double* rate) {
+    const char* const end = text + std::strlen(text);
+    const auto [stop, error] = std::from_chars(text, end, *rate);
+    return error == std::errc() && stop == end && *rate >= 0 && *rate <= 1;
+}
+
 struct OptionRow {
     std::string_view name;
-    void (*read)(const char* text, Options* options);
+    bool (*read)(const char* text, Options* options);
 };
 
 constexpr OptionRow OptionRows[] = {
-    {"--seconds",
-     [](const char* text, Options* o) { o->seconds = std::strtoull(text, nullptr, 10); }},
-    {"--minute",
-     [](const char* text, Options* o) { o->minuteSeconds = std::strtoull(text, nullptr, 10); }},
-    {"--cameras",
-     [](const char* text, Options* o) {
-         o->cameras = static_cast<std::uint32_t>(std::strtoul(text, nullptr, 10));
-     }},
-    {"--faults", [](const char* text, Options* o) { o->faults = std::strtod(text, nullptr); }},
+    {"--seconds", [](const char* text, Options* o) { return ReadNumber(text, &o->seconds); }},
+    {"--minute", [](const char* text, Options* o) { return ReadNumber(text, &o->minuteSeconds); }},
+    {"--cameras", [](const char* text, Options* o) { return ReadNumber(text, &o->cameras); }},
+    {"--faults", [](const char* text, Options* o) { return ReadRate(text, &o->faults); }},
     {"--request-faults",
-     [](const char* text, Options* o) { o->requestFaults = std::strtod(text, nullptr); }},
-    {"--fault", [](const char* text, Options* o) { o->fault = text; }},
-    {"--state", [](const char* text, Options* o) { o->state = text; }},
+     [](const char* text, Options* o) { return ReadRate(text, &o->requestFaults); }},
+    {"--fault",
+     [](const char* text, Options* o) {
+         o->fault = text;
+         return true;
+     }},
+    {"--state",
+     [](const char* text, Options* o) {
+         o->state = text;
+         return true;
+     }},
 };
 
 bool ReadOptions(int count, char** arguments, Options* options) {
@@ -81,9 +98,10 @@ bool ReadOptions(int count, char** arguments, Options* options) {
             if (row.name == arguments[i]) found = &row;
         }
         if (found == nullptr || i + 1 == count) return false;
-        found->read(arguments[i + 1], options);
+        if (!found->read(arguments[i + 1], options)) return false;
     }
-    return options->cameras >= 1 && options->cameras <= CamerasMax && options->minuteSeconds > 0;
+    return options->cameras >= 1 && options->cameras <= CamerasMax && options->minuteSeconds > 0 &&
+           options->seconds > 0;
 }
 
 /// Packets that go wrong, or meet a reset of the bus, at the rate; a frame has some tens of them.
@@ -129,6 +147,10 @@ std::vector<std::string> MakeRequestFaults(double rate) {
     return faults;
 }
 
+std::uint32_t GetStreamingVersion(std::uint32_t position) {
+    return position % 3;
+}
+
 /// Cameras of all versions of the stream, each on a bus of its own.
 std::string MakeScenario(const Options& options) {
     constexpr std::array Models{"SolvaneA1", "PellanA1", "SolvaneG1", "SolvaneC2", "Folary"};
@@ -138,7 +160,7 @@ std::string MakeScenario(const Options& options) {
         buses += std::string(separator) + "{}";
         cameras += std::string(separator) + R"({"model": ")" + Models[i % Models.size()] +
                    R"(", "bus": )" + std::to_string(i) + R"(, "streamingVersion": )" +
-                   std::to_string(i % 3) +
+                   std::to_string(GetStreamingVersion(i)) +
                    R"(, "sensor": {"width": 320, "height": 240, "noise": false}, "faults": [)" +
                    MakeFaults(options.faults) + "]}";
     }
@@ -180,7 +202,8 @@ class Soak {
         if (Zentara_ListCameras(items.data(), &length) != zerrNone) return false;
         if (length != options.cameras) return false;
         for (std::uint32_t i = 0; i < length; ++i) {
-            cameras.push_back(std::make_unique<SoakedCamera>(i, items[i].uniqueId, listMutex));
+            cameras.push_back(std::make_unique<SoakedCamera>(i, items[i].uniqueId,
+                                                             GetStreamingVersion(i), listMutex));
         }
         if (!AddFaults()) return false;
         for (const auto& camera : cameras) {
@@ -210,23 +233,29 @@ class Soak {
         }
     }
 
-    /// 0 if all cameras streamed, nothing grew, every frame is accounted for and no call failed
-    /// without a reason.
+    /// 0 if in this run all cameras streamed, nothing grew, every frame is accounted for under its
+    /// number and no call failed without a reason.
     int End(bool haveAllStreamed) {
         isOver = true;
         for (std::thread& thread : threads) thread.join();
         Zentara_ReleaseDriver();
         Tell();
-        const SoakSums sums = AddUp();
+        TellEarlierFaults();
         if (!judge.HasJudged()) {
             (void)std::fputs("growth was not judged: it takes a minute behind the first\n", output);
         }
-        if (!judge.IsSteady()) (void)std::fputs("memory, threads or handles have grown\n", output);
-        if (sums.unaccounted != 0) (void)std::fputs("frames are missing without a count\n", output);
-        if (!haveAllStreamed) (void)std::fputs("a camera has not begun to stream\n", output);
-        if (sums.failures != 0) (void)std::fputs("calls have failed\n", output);
-        const bool isGood = haveAllStreamed && judge.IsSteady() && sums.unaccounted == 0;
-        return isGood && sums.failures == 0 ? 0 : 1;
+        bool isGood = true;
+        const auto demand = [&](bool holds, const char* otherwise) {
+            if (!holds) (void)std::fputs(otherwise, output);
+            isGood = isGood && holds;
+        };
+        const SoakSums sums = AddUp();
+        demand(judge.IsSteady(), "memory, threads or handles have grown\n");
+        demand(sums.unaccounted == 0, "frames are missing without a count\n");
+        demand(sums.wrongNumbers == 0, "frames came under a wrong number\n");
+        demand(haveAllStreamed, "a camera has not begun to stream\n");
+        demand(sums.failures == 0, "calls have failed\n");
+        return isGood ? 0 : 1;
     }
 
   private:
@@ -245,12 +274,26 @@ class Soak {
         return std::all_of(cameras.begin(), cameras.end(),
                            [](const auto& camera) { return camera->GetSums().frames > 0; });
     }
+    /// Of this run.
     SoakSums AddUp() const {
-        SoakSums sums = former.sums;
+        SoakSums sums;
         for (const auto& camera : cameras) sums += camera->GetSums();
         sums.seconds += static_cast<std::uint64_t>(
             std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin).count());
+        sums.grown = judge.IsSteady() ? 0 : 1;
         return sums;
+    }
+    SoakSums AddUpAllRuns() const {
+        SoakSums sums = former.sums;
+        return sums += AddUp();
+    }
+    /// They are in the sums, and not held against this run.
+    void TellEarlierFaults() const {
+        const SoakSums& sums = former.sums;
+        if (sums.failures + sums.unaccounted + sums.wrongNumbers + sums.grown == 0) return;
+        fmt::print(output,
+                   "of earlier runs: failures {}, unaccounted {}, wrongNumbers {}, grown {}\n",
+                   sums.failures, sums.unaccounted, sums.wrongNumbers, sums.grown);
     }
     SoakState MakeState(const SoakSums& sums) const {
         const ProcessUsage* const first = judge.GetFirstMinute();
@@ -258,7 +301,7 @@ class Soak {
         return {sums, options.cameras, *first};
     }
     void Tell() const {
-        const SoakSums sums = AddUp();
+        const SoakSums sums = AddUpAllRuns();
         const ProcessUsage usage = MeasureUsage();
         std::fprintf(output, "%s; resident %.1f MB, heap %.1f MB, threads %llu, handles %llu\n",
                      Describe(sums).c_str(), static_cast<double>(usage.residentBytes) / 1e6,

@@ -15,7 +15,9 @@ struct SoakSums {
 
     std::uint64_t seconds = 0;
     std::uint64_t frames = 0, bytes = 0, gaps = 0, missing = 0, damaged = 0, repeats = 0;
-    std::uint64_t misnumbered = 0;
+    std::uint64_t misnumbered = 0;   ///< As the numbers of the frames alone tell.
+    std::uint64_t wrongNumbers = 0;  ///< No loss explains them, by what the camera has numbered.
+    std::uint64_t staleNumbers = 0;  ///< Likewise, of a stream whose packets explain them.
     /// Of the engine: what became of the frames that began. Those delivered came to the client, but
     /// for the ones without a taker.
     std::uint64_t begun = 0, delivered = 0, heldBack = 0, dropped = 0, refused = 0, bad = 0,
@@ -29,6 +31,7 @@ struct SoakSums {
     std::uint64_t requestsFailed = 0;  ///< By a fault.
     std::uint64_t stalls = 0;          ///< Streams without frames after a request had failed.
     std::uint64_t failures = 0;        ///< Calls that failed with no fault to explain it.
+    std::uint64_t grown = 0;           ///< Runs that ended with more than their first minute held.
     /// Calls that failed with a code of the table after a request had failed.
     std::array<std::uint64_t, CodeCount> failedWith{};
 

@@ -28,10 +28,14 @@ constexpr auto ListLimit = 10s;
 constexpr int ClosesMax = 3;
 constexpr std::uint32_t AllCameras = 0xFFFFFFFF;
 
-std::uint32_t CountFailed(std::uint32_t camera) {
+ZentaraSimulationState GetState(std::uint32_t camera) {
     ZentaraSimulationState state{};
     (void)ZentaraSimulation_GetState(camera, &state);  // zeros without a bus
-    return state.requestsFailed;
+    return state;
+}
+
+std::uint32_t CountFailed(std::uint32_t camera) {
+    return GetState(camera).requestsFailed;
 }
 
 /// Cameras that are unplugged or plugged in.
@@ -71,8 +75,12 @@ std::uint64_t SumFates(const StreamCounters& counters) {
 }  // namespace
 
 SoakedCamera::SoakedCamera(std::uint32_t cameraPosition, std::uint32_t cameraId,
-                           std::mutex& allMutex)
-    : position(cameraPosition), uniqueId(cameraId), listMutex(allMutex), random(cameraPosition) {
+                           std::uint32_t streamingVersion, std::mutex& allMutex)
+    : position(cameraPosition),
+      uniqueId(cameraId),
+      hasBlocks(streamingVersion == 0),
+      listMutex(allMutex),
+      random(cameraPosition) {
     for (Slot& slot : slots) slot.camera = this;
 }
 
@@ -86,8 +94,10 @@ void SoakedCamera::Count(std::uint64_t SoakSums::*sum) {
     ++(sums.*sum);
 }
 
-std::uint32_t SoakedCamera::CountFailedRequests() const {
-    return CountFailed(position);
+FailedRequests SoakedCamera::CountFailedRequests() const {
+    const ZentaraSimulationState state = GetState(position);
+    return {state.requestsFailed, state.registerRequestsFailed, state.buffersRefused,
+            state.buffersFailed};
 }
 
 /// A call may fail, with a code of the table, when there is a reason. True for none that has
@@ -105,8 +115,17 @@ bool SoakedCamera::Tell(const char* call, ZentaraResult result, bool isExcused) 
 }
 
 /// The reason is a request of the camera that has failed since there were `failedBefore`.
-bool SoakedCamera::Judge(const char* call, ZentaraResult result, std::uint32_t failedBefore) {
-    return Tell(call, result, CountFailedRequests() != failedBefore);
+bool SoakedCamera::Judge(const char* call, ZentaraResult result,
+                         const FailedRequests& failedBefore) {
+    return Tell(call, result, CountFailedRequests().all != failedBefore.all);
+}
+
+/// Of a stream that was to end: a request has failed since `failedAtStop`, or the loop has left by
+/// itself, as it does when a buffer cannot be attached.
+bool SoakedCamera::JudgeEnd(const char* call, ZentaraResult result) {
+    const FailedRequests failed = CountFailedRequests();
+    return Tell(call, result,
+                failed.all != failedAtStop.all || failed.refused != failedAtStream.refused);
 }
 
 /// For a call that sends no request, or none that may fail.
@@ -141,7 +160,7 @@ bool SoakedCamera::TakeTurn() {
 }
 
 bool SoakedCamera::GoOnWithoutFrames() {
-    if (CountFailedRequests() != failedAtOpening) {
+    if (HasReasonToStall()) {
         Count(&SoakSums::stalls);
         return Reopen();
     }
@@ -166,10 +185,17 @@ bool SoakedCamera::Restart() {
     return true;
 }
 
+/// A buffer that cannot be attached ends the loop. Registers of which one could not be written may
+/// not be what the library takes them for.
+bool SoakedCamera::HasReasonToStall() const {
+    const FailedRequests failed = CountFailedRequests();
+    return failed.refused != failedAtStream.refused ||
+           failed.registers != failedAtOpening.registers;
+}
+
 bool SoakedCamera::IsStalled(std::chrono::steady_clock::time_point begin) const {
-    const bool hasFailed = CountFailedRequests() != failedAtOpening;
     return std::chrono::steady_clock::now() - begin >
-           (hasFailed ? FrameLimitAfterFailure : FrameLimit);
+           (HasReasonToStall() ? FrameLimitAfterFailure : FrameLimit);
 }
 
 SoakedCamera::Slot* SoakedCamera::Take() {
@@ -224,19 +250,46 @@ bool SoakedCamera::CountRest() {
 void SoakedCamera::Receive(std::uint64_t userPrivate, std::uint32_t, std::uint32_t, std::uint32_t) {
     auto& slot = *reinterpret_cast<Slot*>(static_cast<std::uintptr_t>(userPrivate));
     const std::lock_guard hold(slot.camera->doneMutex);
+    slot.camera->JudgeNumber(slot.frame);
     slot.camera->done.push_back(&slot);
     ++slot.camera->received;
     slot.camera->arrived.notify_one();
 }
 
-/// The sending of a change fails when the camera is gone, or a request since it was queued has.
+void SoakedCamera::JudgeNumber(const Zentara_Frame& frame) {
+    const ZentaraSimulationState state = GetState(position);
+    const bool isDamaged = frame.errorCode != zerrNone;
+    const std::uint64_t last = numbers.GetLast();
+    const auto verdict = numbers.Judge(frame.frameNumber, isDamaged, state.framesBegun);
+    if (verdict != FrameNumbers::Verdict::Wrong) return;
+    if (MayBeStale(isDamaged, state.buffersFailed)) return Count(&SoakSums::staleNumbers);
+    std::fprintf(
+        stderr, "camera %u: frame %u with code %u came behind %llu, when there were %llu\n",
+        position, frame.frameNumber, frame.errorCode, static_cast<unsigned long long>(last),
+        static_cast<unsigned long long>(state.framesBegun));
+    Count(&SoakSums::wrongNumbers);
+}
+
+/// In streaming version 0 a header of damaged packets is taken wherever its marks seem to be, and a
+/// buffer that fails twice in its turn holds old packets that are taken once more, the number with
+/// its bytes exchanged. The other versions take the tail mark off a first packet: it passes once.
+bool SoakedCamera::MayBeStale(bool isDamaged, std::uint32_t buffersFailed) const {
+    constexpr std::uint32_t FailuresOfOneBuffer = 2;
+    if (!hasBlocks) return false;
+    return isDamaged || buffersFailed - failedAtStream.buffers >= FailuresOfOneBuffer;
+}
+
+/// The sending of a change fails when the camera is gone, or a read or write of its registers has
+/// since it was queued.
 void SoakedCamera::ReceiveChange(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
                                  std::uint32_t) {
     const auto& change = *reinterpret_cast<Change*>(static_cast<std::uintptr_t>(userPrivate));
     SoakedCamera& camera = *change.camera;
     if (change.opening != camera.opening) return;
     ++camera.changesMade;
-    if (camera.isPlugged) (void)camera.Judge("a change", errorCode, change.failedBefore);
+    if (!camera.isPlugged) return;
+    (void)camera.Tell("a change", errorCode,
+                      camera.CountFailedRequests().registers != change.failedBefore);
 }
 
 void SoakedCamera::Queue(Slot& slot) {
@@ -249,7 +302,8 @@ void SoakedCamera::QueueAll() {
 }
 
 void SoakedCamera::QueueChange() {
-    Change& change = changes.emplace_back(Change{this, opening, CountFailedRequests(), settings});
+    Change& change =
+        changes.emplace_back(Change{this, opening, CountFailedRequests().registers, settings});
     Test::SetWide(change.settings, zprm64Exposure, 100000 * (1 + random() % 20));
     Expect("Zentara_QueueSettings",
            Zentara_QueueSettings(handle, &change.settings, ReceiveChange, zcbFrameDone,
@@ -277,12 +331,15 @@ bool SoakedCamera::Open() {
     return false;
 }
 
-bool SoakedCamera::OpenListed(std::uint32_t cameraId, std::uint32_t failedBefore) {
+bool SoakedCamera::OpenListed(std::uint32_t cameraId, const FailedRequests& failedBefore) {
     if (!Judge("Zentara_OpenCamera", Zentara_OpenCamera(cameraId, &handle), failedBefore)) {
         handle = {};
         return false;
     }
     Prepare();
+    hasTrouble = false;
+    const std::lock_guard hold(doneMutex);
+    numbers.Begin(GetState(position).framesBegun);
     return true;
 }
 
@@ -305,7 +362,7 @@ void SoakedCamera::Close() {
     CountChanges();
     const std::lock_guard listing(listMutex);
     for (int closes = 0; closes < ClosesMax; ++closes) {
-        if (Judge("Zentara_CloseCamera", Zentara_CloseCamera(handle), failedAtStream)) break;
+        if (JudgeEnd("Zentara_CloseCamera", Zentara_CloseCamera(handle))) break;
     }
     handle = {};
 }
@@ -320,7 +377,7 @@ bool SoakedCamera::CountEngine() {
         return counters.begun.Get() == SumFates(counters) + WaitingFrames::Count(camera) &&
                counters.delivered.GetSum() == counters.withoutTaker.GetSum() + received;
     });
-    const std::uint32_t failed = CountFailedRequests();
+    const std::uint32_t failed = CountFailedRequests().all;
     const std::lock_guard hold(sumsMutex);
     sums.requestsFailed += failed - failedCounted;
     failedCounted = failed;
@@ -345,14 +402,19 @@ void SoakedCamera::CountChanges() {
 
 bool SoakedCamera::BeginStream() {
     stream = ZentaraProgram::StreamSums(1);
-    failedAtStream = CountFailedRequests();
-    return Judge("Zentara_SetStreaming", Zentara_SetStreaming(handle, 1), failedAtStream);
+    failedAtStream = failedAtStop = CountFailedRequests();
+    const ZentaraResult begun = Zentara_SetStreaming(handle, 1);
+    hasTrouble = begun != zerrNone;
+    return Judge("Zentara_SetStreaming", begun, failedAtStream);
 }
 
+/// What has failed to begin or to end in good order may fail to end once more, for the same reason.
 /// The stream of a camera that is gone cannot be stopped in good order.
 bool SoakedCamera::EndStream() {
+    if (!hasTrouble) failedAtStop = CountFailedRequests();
     const ZentaraResult stopped = Zentara_SetStreaming(handle, 0);
-    return !isPlugged || Judge("the stop", stopped, failedAtStream);
+    if (stopped != zerrNone) hasTrouble = true;
+    return !isPlugged || JudgeEnd("the stop", stopped);
 }
 
 /// False when the camera is lost to the soak.

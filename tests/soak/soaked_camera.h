@@ -11,11 +11,20 @@
 #include <random>
 #include <vector>
 
+#include "soak/frame_numbers.h"
 #include "soak/soak_sums.h"
 #include "tools/stream_sums.h"
 #include "zentara/zentara.h"
 
 namespace ZV::Soak {
+
+/// Requests of a camera that faults have failed.
+struct FailedRequests {
+    std::uint32_t all = 0;
+    std::uint32_t registers = 0;  ///< Of those the reads and writes.
+    std::uint32_t refused = 0;    ///< Buffers of a stream, by the call itself.
+    std::uint32_t buffers = 0;    ///< Buffers at their end, also those that a bus reset has cut.
+};
 
 /// One camera that streams for as long as the soak lasts, on a thread of its own. Its frames
 /// circulate; now and then its settings change, its stream is switched off and on, it is closed and
@@ -25,7 +34,8 @@ namespace ZV::Soak {
 class SoakedCamera {
   public:
     /// `position` in the scenario. `listMutex` is for all cameras: one lists, opens or closes.
-    SoakedCamera(std::uint32_t position, std::uint32_t uniqueId, std::mutex& listMutex);
+    SoakedCamera(std::uint32_t position, std::uint32_t uniqueId, std::uint32_t streamingVersion,
+                 std::mutex& listMutex);
     SoakedCamera(const SoakedCamera&) = delete;
     SoakedCamera& operator=(const SoakedCamera&) = delete;
 
@@ -48,7 +58,7 @@ class SoakedCamera {
     struct Change {
         SoakedCamera* camera = nullptr;
         std::uint32_t opening = 0;
-        std::uint32_t failedBefore = 0;  ///< Requests, when it was queued.
+        std::uint32_t failedBefore = 0;  ///< Reads and writes, when it was queued.
         Zentara_Settings settings{};
     };
 
@@ -57,7 +67,7 @@ class SoakedCamera {
     static void ReceiveChange(std::uint64_t userPrivate, std::uint32_t userData,
                               std::uint32_t errorCode, std::uint32_t flags);
     bool Open();
-    bool OpenListed(std::uint32_t cameraId, std::uint32_t failedBefore);
+    bool OpenListed(std::uint32_t cameraId, const FailedRequests& failedBefore);
     void Prepare();
     bool Start();
     void Close();
@@ -73,19 +83,24 @@ class SoakedCamera {
     void Serve(Slot& slot);
     bool TakeTurn();
     Slot* Take();
+    [[nodiscard]] bool HasReasonToStall() const;
     bool IsStalled(std::chrono::steady_clock::time_point begin) const;
     bool CountEngine();
     void CountStream();
     void SettleStream();
     bool CountRest();
     void CountChanges();
-    [[nodiscard]] std::uint32_t CountFailedRequests() const;
+    [[nodiscard]] FailedRequests CountFailedRequests() const;
     bool Tell(const char* call, ZentaraResult result, bool isExcused);
-    bool Judge(const char* call, ZentaraResult result, std::uint32_t failedBefore);
+    bool Judge(const char* call, ZentaraResult result, const FailedRequests& failedBefore);
+    bool JudgeEnd(const char* call, ZentaraResult result);
     void Expect(const char* call, ZentaraResult result);
     void Count(std::uint64_t SoakSums::*sum);
+    void JudgeNumber(const Zentara_Frame& frame);
+    [[nodiscard]] bool MayBeStale(bool isDamaged, std::uint32_t buffersFailed) const;
 
     const std::uint32_t position, uniqueId;
+    const bool hasBlocks;  ///< As streaming version 0.
     std::mutex& listMutex;
     std::mt19937 random;
     ZentaraHandle handle{};  ///< 0 while the camera is not open.
@@ -99,15 +114,17 @@ class SoakedCamera {
     std::uint64_t taken = 0;
     std::atomic<std::uint32_t> opening{0};
     std::atomic<bool> isPlugged{true};
-    /// Requests that faults had failed when this opening was listed, when its stream began, and
-    /// when they were last taken over into the sums.
-    std::uint32_t failedAtOpening = 0, failedAtStream = 0, failedCounted = 0;
+    /// When this opening was listed, when its stream began, and when that was to end.
+    FailedRequests failedAtOpening, failedAtStream, failedAtStop;
+    bool hasTrouble = false;          ///< The stream has failed to begin or to end.
+    std::uint32_t failedCounted = 0;  ///< Of all, those taken over into the sums.
     std::uint64_t served = 0;
     ZentaraProgram::StreamSums stream{1};
 
     std::mutex doneMutex;
     std::condition_variable arrived;
     std::deque<Slot*> done;  // guarded by doneMutex
+    FrameNumbers numbers;    // guarded by doneMutex
 
     mutable std::mutex sumsMutex;
     SoakSums sums;  // guarded by sumsMutex

@@ -3,6 +3,7 @@
 
 #include <numeric>
 
+#include "soak/frame_numbers.h"
 #include "soak/process_usage.h"
 #include "soak/soak_sums.h"
 #include "support/scoped_variable.h"
@@ -12,6 +13,7 @@
 namespace ZentaraTest {
 namespace {
 
+using ZV::Soak::FrameNumbers;
 using ZV::Soak::GrowthJudge;
 using ZV::Soak::ProcessUsage;
 using ZV::Soak::SoakState;
@@ -85,6 +87,43 @@ TEST(GrowthJudgeTest, JudgesTheFirstMinuteOfARunThatGoesOnAgainstTheFirstOfAll) 
     EXPECT_FALSE(judge.IsSteady());
 }
 
+TEST(FrameNumbersTest, BelievesWhatTheCameraHasNumberedAcrossLossesAndWraps) {
+    FrameNumbers numbers;
+    numbers.Begin(65530);
+
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(65535, false, 65535));
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(4, false, 65541));
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(30000, false, 95536));
+    EXPECT_EQ(95536U, numbers.GetLast());
+}
+
+TEST(FrameNumbersTest, FindsANumberThatTheCameraHasNotReached) {
+    FrameNumbers numbers;
+    numbers.Begin(100);
+
+    EXPECT_EQ(FrameNumbers::Verdict::Wrong, numbers.Judge(106, false, 105));
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(105, false, 105));
+}
+
+TEST(FrameNumbersTest, FindsANumberOfAFrameBeforeTheLastAndOfAFormerOpening) {
+    FrameNumbers numbers;
+    numbers.Begin(100);
+
+    EXPECT_EQ(FrameNumbers::Verdict::Wrong, numbers.Judge(99, true, 110));
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(104, false, 110));
+    EXPECT_EQ(FrameNumbers::Verdict::Wrong, numbers.Judge(103, true, 110));
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(105, false, 110));
+}
+
+TEST(FrameNumbersTest, TakesANumberTwiceWhenOneOfTheFramesIsDamaged) {
+    FrameNumbers numbers;
+    numbers.Begin(100);
+
+    EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(101, true, 110));
+    EXPECT_EQ(FrameNumbers::Verdict::Repeated, numbers.Judge(101, false, 110));
+    EXPECT_EQ(FrameNumbers::Verdict::Wrong, numbers.Judge(101, false, 110));
+}
+
 TEST(SoakStateTest, GoesOnWhereTheFormerRunEnded) {
     const TemporaryFolder folder;
     SoakSums sums;
@@ -131,6 +170,7 @@ TEST(Soak, RunsForItsTimeAndLosesNothingQuietly) {
 
     EXPECT_EQ(0, result.exitCode) << result.output << result.errors;
     EXPECT_THAT(result.output, testing::HasSubstr("unaccounted 0"));
+    EXPECT_THAT(result.output, testing::HasSubstr("wrongNumbers 0"));
     EXPECT_THAT(result.output, testing::HasSubstr("growth was not judged"));
     SoakState state;
     EXPECT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &state));
@@ -155,6 +195,41 @@ TEST(Soak, FailsWhenACallFailsWithoutARequestThatAFaultHasFailed) {
     EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
     EXPECT_THAT(result.output, testing::HasSubstr("requestsFailed 0,"));
     EXPECT_THAT(result.output, testing::HasSubstr("calls have failed"));
+}
+
+TEST(Soak, JudgesItsOwnRunAndTellsOfEarlierOnes) {
+    const TemporaryFolder folder;
+    SoakState state;
+    state.sums.failures = 2;
+    state.sums.unaccounted = state.sums.wrongNumbers = state.sums.grown = 1;
+    ASSERT_TRUE(ZV::Soak::WriteState(folder.GetPath("state"), state));
+
+    const ProgramResult result =
+        RunSoak({"--seconds", "1", "--cameras", "1", "--state", folder.GetPath("state")});
+
+    EXPECT_EQ(0, result.exitCode) << result.output << result.errors;
+    EXPECT_THAT(result.output, testing::HasSubstr("of earlier runs: failures 2, unaccounted 1, "
+                                                  "wrongNumbers 1, grown 1"));
+    ASSERT_TRUE(ZV::Soak::ReadState(folder.GetPath("state"), &state));
+    EXPECT_EQ(2U, state.sums.failures);
+    EXPECT_EQ(1U, state.sums.grown);
+}
+
+TEST(Soak, RefusesWhatIsNotANumberToItsEnd) {
+    for (const char* name :
+         {"--seconds", "--minute", "--cameras", "--faults", "--request-faults"}) {
+        for (const char* text : {"", "x", "1x", "-1", "0,1"}) {
+            EXPECT_EQ(2, RunSoak({"--seconds", "1", name, text}).exitCode) << name << " " << text;
+        }
+    }
+    EXPECT_EQ(2, RunSoak({"--seconds", "0"}).exitCode);
+    EXPECT_EQ(2, RunSoak({"--seconds", "1", "--faults", "1.5"}).exitCode);
+}
+
+TEST(Soak, RefusesMinutesThatAreNone) {
+    for (const char* text : {"abc", "--help", "0", "1h", ""}) {
+        EXPECT_EQ(2, RunTool({ZENTARA_SOURCE_DIR "/scripts/soak", text}).exitCode) << text;
+    }
 }
 
 TEST(Soak, RefusesAFaultThatIsNone) {
