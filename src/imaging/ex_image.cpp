@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
+#include <new>
 
 namespace ZV {
 
@@ -167,7 +168,11 @@ bool ZExImage::TakeNewBuffer(const std::uint8_t* data, std::uint32_t dataBytes,
         if (block == nullptr) return false;
         if (dataBytes != 0) std::memcpy(block, data, dataBytes);
     }
-    ownedBuffer.reset(block, std::free);
+    try {
+        ownedBuffer.reset(block, std::free);
+    } catch (const std::bad_alloc&) {  // For the owners' count; the block has been freed.
+        return false;
+    }
     imageData = block;
     imageSize = size;
     bufferBytes = size;

@@ -99,14 +99,19 @@ std::uint32_t ZImagePipeline::GetNeededOutputBufferSize(ZInImageBufferStruct* in
 
 FilterResult ZImagePipeline::ProcessImage(ZInImageBufferStruct* in, ZOutImageBufferStruct* out,
                                           bool* complete) {
+    return RunFilters(*in, *out, complete, nullptr);
+}
+
+FilterResult ZImagePipeline::RunFilters(ZInImageBufferStruct& in, ZOutImageBufferStruct& out,
+                                        bool* complete, const ZExImage* image) {
     // Kept: `*complete` is not touched by this one, so callers set it beforehand.
     if (!hasBuffer) return PipelineNotSetUp;
     *complete = true;
     if (filters.empty()) return PipelineEmpty;
-    out->imageSize = 0;
+    out.imageSize = 0;
     FilterResult status = FilterDone;
     for (ZImageFilter* filter : filters) {
-        status = RunFilter(*filter, *in, *out);
+        status = RunFilter(*filter, in, out, image);
         if (status == FilterNothingYet) {
             *complete = false;
         } else if (status != FilterDone && status != FilterDeclined) {
@@ -117,23 +122,21 @@ FilterResult ZImagePipeline::ProcessImage(ZInImageBufferStruct* in, ZOutImageBuf
 }
 
 FilterResult ZImagePipeline::ProcessImage(ZExImage* image, bool* complete) {
-    imageFormInProgress = true;
     const std::uint32_t oldSize = image->GetImageSize();
     ZInImageBufferStruct in = DescribeImage(*image);
     const std::uint32_t needed = GetNeededOutputBufferSize(&in);
     if (needed > oldSize) image->ResizeBuffer(needed);
+    image->SetImageSize(oldSize);
     in.data = image->GetImageData();
-    imageBufferBytes = image->GetBufferBytes();
 
     ZOutImageBufferStruct out;
     FilterResult result = FilterFailed;
     if (!hasBuffer || ReserveIntermediate(std::max(needed, std::uint32_t{1}))) {
         out.data = intermediate.GetData();
         out.dataCapacity = intermediate.GetBytes();
-        result = ProcessImage(&in, &out, complete);
+        result = RunFilters(in, out, complete, image);
     }
-    image->SetImageSize(oldSize);
-    const bool lacksMemory = imageBufferBytes < needed || intermediate.GetBytes() < needed;
+    const bool lacksMemory = image->GetBufferBytes() < needed || intermediate.GetBytes() < needed;
     const bool isUnmade = (result == FilterFailed && lacksMemory) || result == FilterNotInitialised;
     if (isUnmade && image->GetErrorCode() == FrameStatusGood) {
         image->SetErrorCode(FrameStatusBufferTooSmall);
@@ -144,26 +147,25 @@ FilterResult ZImagePipeline::ProcessImage(ZExImage* image, bool* complete) {
         image->SetWidth(static_cast<std::uint16_t>(out.width));
         image->SetHeight(static_cast<std::uint16_t>(out.height));
     }
-    imageFormInProgress = false;
     return result;
 }
 
 FilterResult ZImagePipeline::RunFilter(ZImageFilter& filter, ZInImageBufferStruct& in,
-                                       ZOutImageBufferStruct& out) {
+                                       ZOutImageBufferStruct& out, const ZExImage* image) {
     // Kept: nothing is copied for a disabled filter, so one that works in place behind it finds old
     // bytes.
     if (!filter.IsEnabled()) return FilterDeclined;
     const FilterResult status = filter.Process(&in, &out);
-    if (status == FilterDone) return TakeOutput(in, out);
+    if (status == FilterDone) return TakeOutput(in, out, image);
     if (status == FilterDeclined) return PassInputOn(in, out);
     return status;
 }
 
-FilterResult ZImagePipeline::TakeOutput(ZInImageBufferStruct& in,
-                                        const ZOutImageBufferStruct& out) {
+FilterResult ZImagePipeline::TakeOutput(ZInImageBufferStruct& in, const ZOutImageBufferStruct& out,
+                                        const ZExImage* image) {
     if (!DoesFit(out.imageSize, out)) return FilterFailed;
-    if (imageFormInProgress) {
-        if (out.imageSize > imageBufferBytes) return FilterFailed;
+    if (image != nullptr) {
+        if (out.imageSize > image->GetBufferBytes()) return FilterFailed;
     } else {
         if (!ReserveIntermediate(out.imageSize)) return FilterFailed;
         in.data = intermediate.GetData();

@@ -53,9 +53,14 @@ class ZENTARA_API ZImagePipeline : public ZObject {
     FilterResult ProcessImage(ZExImage* image, bool* complete);
 
   private:
+    // `image` is the one in progress, whose own buffer takes what the filters make; null for a pair
+    // of plain buffers.
+    FilterResult RunFilters(ZInImageBufferStruct& in, ZOutImageBufferStruct& out, bool* complete,
+                            const ZExImage* image);
     FilterResult RunFilter(ZImageFilter& filter, ZInImageBufferStruct& in,
-                           ZOutImageBufferStruct& out);
-    FilterResult TakeOutput(ZInImageBufferStruct& in, const ZOutImageBufferStruct& out);
+                           ZOutImageBufferStruct& out, const ZExImage* image);
+    FilterResult TakeOutput(ZInImageBufferStruct& in, const ZOutImageBufferStruct& out,
+                            const ZExImage* image);
     bool ReserveIntermediate(std::uint64_t bytes);
 
     std::vector<ZImageFilter*> filters;  // borrowed from the camera or its context, until removed
@@ -63,8 +68,6 @@ class ZENTARA_API ZImagePipeline : public ZObject {
     std::uint32_t height = 0;
     bool hasBuffer = false;
     PixelBuffer intermediate;
-    bool imageFormInProgress = false;
-    std::uint32_t imageBufferBytes = 0;  // Of the image in progress.
 };
 
 }  // namespace ZV

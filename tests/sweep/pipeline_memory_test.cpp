@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <vector>
 
 #include "camera/camera_result.h"
 #include "imaging/image_fixture.h"
@@ -69,6 +70,43 @@ TEST_F(PipelineWithoutMemory, LetsNoImageThatItHasNotMadePassAsAGoodOne) {
 
     EXPECT_EQ(FilterFailed, result);
     ExpectImageAsItCame();
+}
+
+TEST_F(PipelineWithoutMemory, LetsNothingBeThrownForTheOwnersOfTheImagesPixels) {
+    Tripler tripler;
+    Add(&tripler);
+
+    BeginAllocations(2);
+    const FilterResult result = Process();
+    EXPECT_TRUE(EndAllocations());
+
+    EXPECT_EQ(FilterFailed, result);
+    ExpectImageAsItCame();
+    EXPECT_EQ(FilterDone, Process()) << "with memory again";
+}
+
+TEST_F(PipelineWithoutMemory, WritesNoPixelOfAClientBehindAnImageThatCouldNotGrow) {
+    Tripler tripler;
+    Add(&tripler);
+    ASSERT_EQ(FilterDone, Process());
+    ZExImage later = Testing::MakeImage(Testing::Ramp(8));
+    BeginAllocations(2);
+    EXPECT_EQ(FilterFailed, pipeline.ProcessImage(&later, &isComplete));
+    EXPECT_TRUE(EndAllocations());
+    std::vector<std::uint8_t> pixels = Testing::Ramp(8), made(24);
+    ZInImageBufferStruct in;
+    in.data = pixels.data();
+    in.imageSize = 8;
+    in.width = 4;
+    in.height = 2;
+    ZOutImageBufferStruct out;
+    out.data = made.data();
+    out.dataCapacity = made.size();
+
+    EXPECT_EQ(FilterDone, pipeline.ProcessImage(&in, &out, &isComplete));
+
+    EXPECT_EQ(Testing::Ramp(8), pixels);
+    EXPECT_NE(pixels.data(), in.data) << "the pipeline's own buffer";
 }
 
 TEST_F(PipelineWithoutMemory, LetsNoImagePassAsAGoodOneWhoseFilterHasNoBuffers) {
