@@ -1,3 +1,5 @@
+#include <memory>
+
 #include "api/camera_context.h"
 #include "api/delivery.h"
 #include "api/entry_queue.h"
@@ -27,14 +29,14 @@ ZentaraResult GrabFrame(const char* function, ZentaraHandle handle, Zentara_Fram
     if (GetQueueCount(*context) != 0) return zerrBusy;
     if (camera->GetImageSize() > GetFrameCapacity(*frame)) return zerrBufferTooSmall;
 
-    ZExImage* image = nullptr;
-    const CameraResult taken = camera->GetOneImage(&image);
-    if (taken != CameraOk) return TranslateCameraResult(taken);
-    if (image == nullptr) return zerrDriverFault;
+    ZExImage* taken = nullptr;
+    const CameraResult result = camera->GetOneImage(&taken);
+    if (result != CameraOk) return TranslateCameraResult(result);
+    if (taken == nullptr) return zerrDriverFault;
+    const std::unique_ptr<ZExImage, void (*)(ZExImage*)> image(taken, ZCamera::FreeImage);
     PostProcess(*context, *image);
     ExportImageToFrame(handle, GetLastSettings(*context), *image, *frame, /*copiesPixels=*/true);
     ZLogFrame(function, *frame);
-    ZCamera::FreeImage(image);
     return zerrNone;
 }
 

@@ -219,26 +219,25 @@ void CountWithoutTaker(ZCamera& camera, ZExImage* image) {
     camera.GetStreamCounters().withoutTaker.Add(image->GetErrorCode());
 }
 
-/// False when no frame waited for the image.
-bool ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status) {
+/// `*hasTaker` becomes true when a frame waited for the image.
+void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status, bool* hasTaker) {
     const SemaphoreHold delivery(*context.deliveryLock);
     EventService service(context, EventService::Kind::Image);
     {
         const EntryHold head(context, HoldEntry(context, 0));
-        if (!head) return false;
+        if (!head) return;
         MakeUpForExposeDone(context, service, *head);
     }
     const EntryHold entry(context, TakeFirstEntry(context));
-    if (!entry) return false;
+    if (!entry) return;
     // Kept: a change that is the last entry stays. At the next image it is taken out as the entry
     // itself, dropped without being sent, and that image is dropped with it.
     const EntryHold change(context, service.TakeChange(/*index=*/0, /*countMin=*/2));
-    const bool isFrame = entry->kind == QueueKindFrame;
-    if (isFrame) DeliverFrame(context, *entry, image, status);
-    if (!change) return isFrame;
+    *hasTaker = entry->kind == QueueKindFrame;
+    if (*hasTaker) DeliverFrame(context, *entry, image, status);
+    if (!change) return;
     const ZentaraResult result = MakeChange(service, *change);
     if (WantsCall(*change, zcbFrameDone)) CallClient(*change, result, change->flags);
-    return isFrame;
 }
 
 }  // namespace
@@ -268,12 +267,12 @@ void* ImageReceived(ZImageReceivedCallbackStruct* record) {
         ZLogLeave(ImageReceivedName, zerrBadParameter);
         return nullptr;
     }
+    bool hasTaker = false;
     (void)Guarded([&] {
-        if (!ServeImage(*context, record->image, record->status)) {
-            CountWithoutTaker(camera, record->image);
-        }
+        ServeImage(*context, record->image, record->status, &hasTaker);
         return ZentaraResult{zerrNone};
     });
+    if (!hasTaker) CountWithoutTaker(camera, record->image);
     ZCamera::FreeImage(record->image);
     ZLogLeave(ImageReceivedName, zerrNone);
     return nullptr;
@@ -283,10 +282,17 @@ void PostProcess(CameraContext& context, ZExImage& image) {
     if (context.postProcessing != 1) return;
     const std::uint32_t format = GetSettingsWord(GetLastSettings(context), zprmImageFormat);
     if (format == zfmtRaw8 || format == zfmtRaw16) return;
-    const std::lock_guard hold(context.postMutex);
-    bool isComplete = true;
-    (void)context.postPipeline->ProcessImage(&image,
-                                             &isComplete);  // the image says what became of it
+    const ZentaraResult ended = Guarded([&] {
+        const std::lock_guard hold(context.postMutex);
+        bool isComplete = true;
+        // The image says what became of it.
+        (void)context.postPipeline->ProcessImage(&image, &isComplete);
+        return ZentaraResult{zerrNone};
+    });
+    // What was thrown on the way is want of memory, and the frame is the client's all the same.
+    if (ended != zerrNone && image.GetErrorCode() == FrameStatusGood) {
+        image.SetErrorCode(FrameStatusBufferTooSmall);
+    }
 }
 
 }  // namespace ZV

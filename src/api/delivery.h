@@ -19,6 +19,7 @@ void* ExposeDone(void* refCon);
 void* ImageReceived(ZImageReceivedCallbackStruct* record);
 
 /// Runs the post-processing chain on `image` if it is on and the client has not asked for raw data.
+/// Throws nothing: an image that it leaves unfinished for want of memory bears a code.
 void PostProcess(CameraContext& context, ZExImage& image);
 
 }  // namespace ZV
