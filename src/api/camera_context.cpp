@@ -19,6 +19,12 @@ bool IsComplete(const CameraContext& context) {
            context.bayerFilter && context.deliveryLock && context.queueLock;
 }
 
+/// A lock that is none excludes nobody, and a wheel without its own packs nothing.
+bool HasLocks(const CameraContext& context) {
+    return context.deliveryLock->IsMade() && context.queueLock->IsMade() &&
+           context.rgbWheel->HasSemaphore();
+}
+
 }  // namespace
 
 CameraContext::~CameraContext() {
@@ -38,7 +44,8 @@ std::unique_ptr<CameraContext> MakeCameraContext(ZCamera& camera) {
     context->deliveryLock.reset(new (std::nothrow) ZSemaphore);
     context->queueLock.reset(new (std::nothrow) ZSemaphore);
     std::memset(&context->lastSettings, UnknownSettingsByte, sizeof(context->lastSettings));
-    if (!IsComplete(*context) || camera.GetImagePipeline() == nullptr) return nullptr;
+    if (!IsComplete(*context) || !HasLocks(*context)) return nullptr;
+    if (camera.GetImagePipeline() == nullptr) return nullptr;
 
     context->postPipeline->Setup(camera.GetCCDWidth(), camera.GetCCDHeight());
     context->postPipeline->AddFilter(context->ratioCorrection);

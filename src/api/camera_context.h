@@ -83,7 +83,7 @@ struct CameraContext {
 };
 
 /// Makes the context of a camera that has just been opened and puts the wheel into the camera's own
-/// pipeline. Null when there is no memory.
+/// pipeline. Null when there is no memory for it or for one of its locks.
 std::unique_ptr<CameraContext> MakeCameraContext(ZCamera& camera);
 
 /// Takes the wheel out of the camera's pipeline and drops what is queued, without a callback.

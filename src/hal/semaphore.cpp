@@ -22,6 +22,10 @@ ZSemaphore::~ZSemaphore() {
     ReportFailure(HAL_SemaphoreDestroy(&semaphore), "HAL_SemaphoreDestroy");
 }
 
+bool ZSemaphore::IsMade() const {
+    return IsHALSemaphoreMade(semaphore);
+}
+
 void ZSemaphore::Wait() {
     ReportFailure(HAL_SemaphoreWait(semaphore), "HAL_SemaphoreWait");
 }

@@ -15,6 +15,10 @@ class ZENTARA_API ZSemaphore {
     ZSemaphore(const ZSemaphore&) = delete;
     ZSemaphore& operator=(const ZSemaphore&) = delete;
 
+    /// False when there was no memory for it, which the constructor does not tell: nothing is ever
+    /// held then, and every Wait prints.
+    bool IsMade() const;
+
     /// Takes the unit, waiting without limit.
     void Wait();
     /// Gives it back.

@@ -184,6 +184,10 @@ std::uint32_t ZRGBFilterWheel::GetNeededOutputBufferSize(ZInImageBufferStruct* i
     return GetThreeColourPixelBytes(GetOutputFormat()) * in->imageSize;
 }
 
+bool ZRGBFilterWheel::HasSemaphore() const {
+    return IsHALSemaphoreMade(semaphore);
+}
+
 std::uint32_t ZRGBFilterWheel::GetOutputFormat() const {
     return outputFormat.load(std::memory_order_relaxed);
 }

@@ -45,6 +45,8 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     /// What the finished image takes when this frame would complete the set, else the input's size.
     std::uint32_t GetNeededOutputBufferSize(ZInImageBufferStruct* in) override;
 
+    /// False when its semaphore could not be made: each `Process` then gives 9.
+    bool HasSemaphore() const;
     std::uint32_t GetOutputFormat() const;
     bool IsStarted() const { return isStarted.load(std::memory_order_relaxed); }
     /// Frames taken in this set.

@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+#include <string>
+
 #include "api/camera_context.h"
 #include "api/camera_store.h"
 #include "api/entry_queue.h"
@@ -60,6 +63,10 @@ TEST_F(OpeningWithoutMemory, OfItsContextClosesTheCameraAgain) {
     for (std::uint32_t allocation = first; allocation <= last; ++allocation) {
         if (OpenWithout(allocation) == zerrNone) {
             // It could do without, as a filter does without its scratch space.
+            const CameraContext& context = *GetCameraContext(GetCamera());
+            EXPECT_TRUE(context.deliveryLock->IsMade()) << allocation;
+            EXPECT_TRUE(context.queueLock->IsMade()) << allocation;
+            EXPECT_TRUE(context.rgbWheel->HasSemaphore()) << allocation;
             EXPECT_ZERR(zerrNone, Zentara_CloseCamera(handle)) << allocation;
             continue;
         }
@@ -68,11 +75,37 @@ TEST_F(OpeningWithoutMemory, OfItsContextClosesTheCameraAgain) {
         EXPECT_EQ(nullptr, GetCameraContext(GetCamera())) << allocation;
         EXPECT_EQ(0u, world.GetState().openHandles) << allocation;
     }
-    EXPECT_GT(failures, 8u);
+    EXPECT_GE(failures, 13u) << "seven objects, and three locks of two parts";
 
     ASSERT_ZERR(zerrNone, Zentara_OpenCamera(0, &handle));
     ZV::Test::ClientFrame frame(64 * 48);
     EXPECT_ZERR(zerrNone, Zentara_GrabFrame(handle, frame.Get()));
+}
+
+class DeliveringWithoutMemory : public ZV::Test::OpenedCamera {};
+
+TEST_F(DeliveringWithoutMemory, ForALockPrintsALineForEachWaitAndTheRunGoesOn) {
+    CameraContext& context = *GetCameraContext(*FindCamera(handle));
+    for (std::unique_ptr<ZSemaphore>* const lock : {&context.deliveryLock, &context.queueLock}) {
+        ZV::Test::FailAllocation(2);  // the first one is the object
+        lock->reset(new ZSemaphore);
+        ASSERT_EQ(0u, ZV::Test::EndFailingAllocation());
+        ASSERT_FALSE((*lock)->IsMade());
+        ZV::Test::CallbackLog calls;
+        ZV::Test::ClientFrame frame(64 * 48);
+        testing::internal::CaptureStdout();
+
+        EXPECT_ZERR(zerrNone, Queue(frame, calls, zcbFrameDone));
+        EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 1));
+        EXPECT_TRUE(calls.WaitForCalls(1));
+        EXPECT_ZERR(zerrNone, Zentara_SetStreaming(handle, 0));
+
+        EXPECT_NE(std::string::npos,
+                  testing::internal::GetCapturedStdout().find(
+                      "ZSemaphore::ZSemaphore() call to HAL_SemaphoreWait failed\n"));
+        EXPECT_ZERR(zerrNone, frame->errorCode);
+        lock->reset(new ZSemaphore);
+    }
 }
 
 class QueueingWithoutMemory : public ZV::Test::OpenedCamera {};
