@@ -137,8 +137,9 @@ HALStatus MorvaneFWCamera::StartRunLoop() {
         return nullptr;
     };
     const HALStatus status = HAL_ThreadCreate(entry, this, &streaming.runLoopThread);
-    if (!IsHALThreadStarted(streaming.runLoopThread)) streaming.runLoopsAlive.fetch_sub(1);
-    return status;
+    if (status == HALOk && IsHALThreadStarted(streaming.runLoopThread)) return HALOk;
+    streaming.runLoopsAlive.fetch_sub(1);
+    return status != HALOk ? status : HALThreadNotStarted;  // it would not say so itself
 }
 
 void MorvaneFWCamera::StartExposeDoneThread() {

@@ -161,7 +161,10 @@ void SetAdapterPacketSource(const AdapterPacketSource& source) {
 HALCamera MakeAdapterCamera(std::uint32_t adapterIndex, std::uint32_t nodeId) {
     HALCamera camera{};
     camera.kind = HALKindAdapter;
-    camera.context = new (std::nothrow) AdapterContext(adapterIndex, nodeId);
+    std::unique_ptr<AdapterContext> context(new (std::nothrow)
+                                                AdapterContext(adapterIndex, nodeId));
+    // Without its event the camera's run loop would never rest.
+    if (context != nullptr && context->frameEvent.IsMade()) camera.context = context.release();
     return camera;
 }
 
@@ -222,11 +225,11 @@ HALStatus AdapterCameraReallocateBandwidth(HALCamera* camera, std::uint16_t payl
 HALStatus AdapterCameraStartStreaming(HALCamera camera, std::uint32_t,
                                       std::uint16_t streamingVersion) {
     AdapterContext* const context = GetAdapterContext(camera);
-    if (context == nullptr) return HALAdapterThreadNotStarted;
+    if (context == nullptr) return HALThreadNotStarted;
     if (context->streaming.load(std::memory_order_relaxed) != 0) return HALOk;
     // Without its event the thread would never rest, without its mutex nothing guards the frame.
     if (context->streamMutex == nullptr || context->stopEvent == nullptr) {
-        return HALAdapterThreadNotStarted;
+        return HALThreadNotStarted;
     }
     {
         const std::lock_guard guard(sourceMutex);
@@ -236,7 +239,7 @@ HALStatus AdapterCameraStartStreaming(HALCamera camera, std::uint32_t,
     context->assembler.StartStream(static_cast<std::uint8_t>(streamingVersion));
     if (MakeRing(*context) && StartStreamThread(*context)) return HALOk;
     EndStream(*context);
-    return HALAdapterThreadNotStarted;
+    return HALThreadNotStarted;
 }
 
 HALStatus AdapterCameraStopStreaming(HALCamera camera, std::uint32_t) {
@@ -248,8 +251,7 @@ HALStatus AdapterCameraStopStreaming(HALCamera camera, std::uint32_t) {
 
 HALStatus AdapterCameraWaitingForFrame(HALCamera camera, const FrameArrivals* arrivals) {
     AdapterContext* const context = GetAdapterContext(camera);
-    if (context != nullptr) context->frameEvent.Wait(arrivals);
-    return HALOk;
+    return context != nullptr ? context->frameEvent.Wait(arrivals) : HALOk;
 }
 
 HALStatus AdapterCameraStopWaitingForFrame(HALCamera camera) {

@@ -18,12 +18,13 @@ void FrameGate::Close() {
     (void)SignalEvent(frameEvent);
 }
 
-void FrameGate::Wait(const FrameArrivals* arrivals) {
+HALStatus FrameGate::Wait(const FrameArrivals* arrivals) {
     ClearEvent(frameEvent);
     // Looked at behind the clearing, so that the signal that counts is never the one that is lost.
-    if (!isOpen.load()) return;
-    if (arrivals != nullptr && arrivals->count->load() != arrivals->seen) return;
-    (void)WaitForEvent(frameEvent, WaitForEver);
+    if (!isOpen.load()) return HALOk;
+    if (arrivals != nullptr && arrivals->count->load() != arrivals->seen) return HALOk;
+    const WaitOutcome outcome = WaitForEvent(frameEvent, WaitForEver);
+    return outcome == WaitOutcome::Signalled ? HALOk : HALConditionFailed;
 }
 
 void FrameGate::Release() {

@@ -76,6 +76,7 @@ HALStatus FWCameraConnect(HALCamera* camera, std::uint16_t payloadBytes) {
     if (context == nullptr) return HALDeviceNotOpen;
     StorePacketSize(camera, *context, payloadBytes);
     if (context->deviceMutex == nullptr) context->deviceMutex = MakeMutex();
+    if (context->deviceMutex == nullptr) return HALDeviceNotOpen;
     if (const HALStatus status = OpenFreeDevice(*context); status != HALOk) return status;
     camera->connected = 1;
     context->streaming.store(0, std::memory_order_relaxed);

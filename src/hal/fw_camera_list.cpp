@@ -123,12 +123,13 @@ void GiveUpRecords(HALCamera* cameras, std::uint32_t count) {
 
 bool FillRecords(HALCamera* cameras, const PathStaging& staging) {
     for (std::uint32_t i = 0; i < staging.count; ++i) {
-        auto* const context = new (std::nothrow) FWDeviceContext;
-        if (context == nullptr) return false;
+        std::unique_ptr<FWDeviceContext> context(new (std::nothrow) FWDeviceContext);
+        // Without its event the camera's run loop would never rest.
+        if (context == nullptr || !context->frameEvent.IsMade()) return false;
         std::memcpy(context->devicePath, staging.paths.get()[i].text, DevicePathBytes);
         cameras[i].index = i;
         cameras[i].kind = HALKindFWCamera;
-        cameras[i].context = context;
+        cameras[i].context = context.release();
     }
     return true;
 }

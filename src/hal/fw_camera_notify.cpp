@@ -2,6 +2,7 @@
 #include <cstring>
 #include <memory>
 #include <new>
+#include <utility>
 
 #include "hal/fw_camera.h"
 #include "hal/fw_device_context.h"
@@ -53,12 +54,13 @@ HALStatus FWCameraEnableNotification(HALCamera camera) {
     if (!EndNotification(*context)) return HALWriteFailed;
     const MutexHold hold(context->deviceMutex);
     if (!SendPlain(*context, FW_IOCTL_NOTIFY_ENABLE)) return HALWriteFailed;
-    context->notification.reset(new (std::nothrow) NotificationRequest);
-    if (context->notification == nullptr || context->notification->overlapped == nullptr) {
-        return HALWriteFailed;
-    }
+    std::unique_ptr<NotificationRequest> request(new (std::nothrow) NotificationRequest);
+    if (request == nullptr || request->overlapped == nullptr) return HALWriteFailed;
+    context->notification = std::move(request);
     context->notifying.store(1, std::memory_order_relaxed);
-    return HAL_ThreadCreate(RunNotificationLoop, context, &context->notifyThread);
+    (void)HAL_ThreadCreate(RunNotificationLoop, context, &context->notifyThread);
+    if (IsHALThreadStarted(context->notifyThread)) return HALOk;
+    return EndNotification(*context) ? HALWriteFailed : HALThreadNotTerminated;
 }
 
 HALStatus FWCameraDisableNotification(HALCamera camera) {

@@ -94,7 +94,10 @@ void AttachAllRequests(RequestRing& ring) {
 HALStatus StartCallbackLoop(FWDeviceContext& context) {
     context.streaming.store(1, std::memory_order_relaxed);
     for (std::uint32_t& counter : context.requestCounters) counter = 0;
-    return HAL_ThreadCreate(RunCallbackLoop, context.ring.get(), &context.callbackThread);
+    const HALStatus status =
+        HAL_ThreadCreate(RunCallbackLoop, context.ring.get(), &context.callbackThread);
+    if (status != HALOk) return status;
+    return IsHALThreadStarted(context.callbackThread) ? HALOk : HALReadFailed;
 }
 
 bool SendListen(FWDeviceContext& context) {
@@ -143,6 +146,17 @@ void GiveUpRing(FWDeviceContext& context, bool isDetached) {
     context.ring.reset();
 }
 
+/// After a start that has no loop: the driver gives the buffers back.
+void GiveUpStart(FWDeviceContext& context) {
+    context.streaming.store(0, std::memory_order_relaxed);
+    (void)EndHALThread(&context.callbackThread);  // none runs
+    std::uint64_t handle = context.resourceHandle;
+    const bool isDetached =
+        SendRecord(context.device, FW_IOCTL_DETACH_BUFFERS, &handle, HandleRecordBytes);
+    GiveUpRing(context, isDetached);
+    (void)DestroyEvent(std::exchange(context.stopEvent, nullptr));
+}
+
 HALStatus WriteStreamRegister(HALCamera camera, std::uint32_t streamRegister, std::uint32_t value) {
     return HAL_CameraWriteData(&camera, streamRegister, &value, 1);
 }
@@ -161,7 +175,10 @@ HALStatus FWCameraStartStreaming(HALCamera camera, std::uint32_t streamRegister,
     }
     context->assembler.StartStream(static_cast<std::uint8_t>(streamingVersion));
     AttachAllRequests(*context->ring);
-    if (const HALStatus status = StartCallbackLoop(*context); status != HALOk) return status;
+    if (const HALStatus status = StartCallbackLoop(*context); status != HALOk) {
+        GiveUpStart(*context);
+        return status;
+    }
     // Kept: after a refused listen the loop runs on, and the context counts as streaming.
     if (!SendListen(*context)) return HALReadFailed;
     return WriteStreamRegister(camera, streamRegister,
@@ -185,8 +202,7 @@ HALStatus FWCameraStopStreaming(HALCamera camera, std::uint32_t streamRegister) 
 
 HALStatus FWCameraWaitingForFrame(HALCamera camera, const FrameArrivals* arrivals) {
     FWDeviceContext* const context = GetFWContext(camera);
-    if (context != nullptr) context->frameEvent.Wait(arrivals);
-    return HALOk;
+    return context != nullptr ? context->frameEvent.Wait(arrivals) : HALOk;
 }
 
 HALStatus FWCameraStopWaitingForFrame(HALCamera camera) {

@@ -28,7 +28,8 @@ inline constexpr HALStatus HALChannelNotFreed =
     27;  ///< Also: the in-use query of a connect failed.
 inline constexpr HALStatus HALResourcesNotAllocated = 28;
 inline constexpr HALStatus HALResourcesNotFreed = 29;  ///< Also: buffers could not be detached.
-inline constexpr HALStatus HALAdapterThreadNotStarted = 30;
+inline constexpr HALStatus HALThreadNotStarted =
+    30;  ///< A camera's run loop, or the stream of kind 1.
 inline constexpr HALStatus HALStopFailed = 31;
 inline constexpr HALStatus HALSemaphoreFailed = 32;
 inline constexpr HALStatus HALConditionFailed = 33;  ///< Also: a timed wait ran out.

@@ -225,7 +225,7 @@ TEST_F(AdapterCamera, ARecordWithoutAContextIsRefused) {
     empty.kind = HALKindAdapter;
 
     EXPECT_EQ(HALDeviceNotOpen, Connect(&empty));
-    EXPECT_EQ(HALAdapterThreadNotStarted, HAL_CameraStartStreaming(&empty, 0, 1, nullptr));
+    EXPECT_EQ(HALThreadNotStarted, HAL_CameraStartStreaming(&empty, 0, 1, nullptr));
     EXPECT_EQ(HALOk, HAL_CameraStopStreaming(&empty, 0));
     EXPECT_EQ(HALOk, HAL_CameraDisconnect(&empty));
 }

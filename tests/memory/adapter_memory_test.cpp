@@ -69,7 +69,7 @@ TEST(AdapterMemory, EachFailureOfASecondKindCamerasLifeGivesACodeAndTheNextLifeI
         hasRefused = EndAllocations();
 
         EXPECT_EQ(life.hasContext ? HALOk : HALDeviceNotOpen, life.connected);
-        EXPECT_TRUE(life.started == HALOk || life.started == HALAdapterThreadNotStarted);
+        EXPECT_TRUE(life.started == HALOk || life.started == HALThreadNotStarted);
         EXPECT_EQ(mappings, CountLiveMappings());
         EXPECT_FALSE(AdapterLife::HasEntry());
         if (!hasRefused) {
@@ -95,7 +95,7 @@ TEST(AdapterMemory, ACameraWithoutItsMutexOrItsEventDoesNotStart) {
         ASSERT_EQ(HALOk, HAL_CameraConnect(&camera, 100, nullptr, nullptr, nullptr, nullptr,
                                            nullptr, nullptr));
 
-        EXPECT_EQ(HALAdapterThreadNotStarted, HAL_CameraStartStreaming(&camera, 0, 1, nullptr));
+        EXPECT_EQ(HALThreadNotStarted, HAL_CameraStartStreaming(&camera, 0, 1, nullptr));
 
         EXPECT_EQ(HALOk, HAL_CameraRelease(&camera));
     }

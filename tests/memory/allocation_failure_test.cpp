@@ -26,7 +26,8 @@ bool IsKnown(ZentaraResult result) {
     return result <= GreatestCode;
 }
 
-/// Ends a grab for which no image comes: a camera whose run loop could not be made has none.
+/// Ends a grab for which no image comes: where the memory for a number of its frames was refused,
+/// the camera sends none that fits.
 class GrabEnder {
   public:
     GrabEnder() : thread([this] { Run(); }) {}
