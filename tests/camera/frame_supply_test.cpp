@@ -215,6 +215,56 @@ TEST_F(CameraAskedForFrames, RefusesAFrameOfANonsensicalSizeLikeAFailedAllocatio
     EXPECT_EQ(0u, CountFrames());
 }
 
+TEST_F(CameraAskedForFrames, LosesAFrameWithoutAWordForEachLockThatItCannotTake) {
+    for (HALSemaphore* StreamingState::*lock :
+         {&StreamingState::frameLock, &StreamingState::externalLock, &StreamingState::streamLock}) {
+        ASSERT_EQ(HALOk, HAL_SemaphoreDestroy(&(camera->streaming.*lock)));
+        testing::internal::CaptureStdout();
+
+        const tStFrameInfo* frame = Peek();
+
+        EXPECT_EQ("", testing::internal::GetCapturedStdout());
+        EXPECT_EQ(nullptr, frame);
+        EXPECT_EQ(0u, CountFrames());
+        ASSERT_EQ(HALOk, HAL_SemaphoreCreate(&(camera->streaming.*lock)));
+    }
+    EXPECT_EQ(3u, camera->GetStreamCounters().refused.Get());
+    EXPECT_NE(nullptr, Peek());
+}
+
+TEST_F(CameraAskedForFrames, HasNoNewFrameWhileItCannotTakeTheLockOfItsFrames) {
+    tStFrameInfo* const frame = Peek();
+    ASSERT_NE(nullptr, frame);
+    ASSERT_EQ(HALOk, HAL_SemaphoreDestroy(&camera->streaming.frameLock));
+    testing::internal::CaptureStdout();
+
+    EXPECT_EQ(nullptr, camera->PrivateGetNewFrame());
+
+    EXPECT_EQ("", testing::internal::GetCapturedStdout());
+    ASSERT_EQ(HALOk, HAL_SemaphoreCreate(&camera->streaming.frameLock));
+    EXPECT_EQ(frame, camera->PrivateGetNewFrame());
+}
+
+TEST_F(CameraAskedForFrames, HasARunLoopThatPrintsALineForALockThatItCannotTakeAndGoesOn) {
+    TestClient client;
+    camera->streaming.callbacks.Set({TestClient::ReceiveImage, nullptr, &client});
+    ASSERT_NE(nullptr, PeekDone());
+    ASSERT_EQ(HALOk, HAL_SemaphoreDestroy(&camera->streaming.frameLock));
+    camera->streaming.runLoopActive = true;
+    testing::internal::CaptureStdout();
+
+    std::thread loop([&] { camera->PrivateImageStreamingRunLoop(); });
+    EXPECT_TRUE(WaitUntil([&] { return client.GetImageCount() == 1; }));
+    camera->streaming.runLoopActive = false;
+    loop.join();
+
+    EXPECT_EQ(0u, testing::internal::GetCapturedStdout().find(
+                      "MorvaneFWCamera::PrivateImageStreamingRunLoop() error 32 occurred calling "
+                      "HAL_SemaphoreWait\n"));
+    ASSERT_EQ(HALOk, HAL_SemaphoreCreate(&camera->streaming.frameLock));
+    ASSERT_EQ(HALOk, HAL_SemaphoreWait(camera->streaming.closeLock)) << "as a close takes it";
+}
+
 TEST_F(CameraAskedForFrames, LeavesTheOlderOfTwoFramesBehindAtAStop) {
     tStFrameInfo* older = PeekDone();
     ASSERT_NE(nullptr, PeekDone());
