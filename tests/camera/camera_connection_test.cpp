@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "camera/test_camera.h"
+#include "hal/fw_device_context.h"
 #include "hal/platform/clock.h"
 #include "imaging/ex_image.h"
 
@@ -33,6 +34,17 @@ TEST_F(OneClosedCamera, IsConnectedWhileItIsOpen) {
     EXPECT_EQ(0, TestCamera::m_numOfConnectedCameras);
     EXPECT_EQ(0u, world.GetState().openHandles);
     EXPECT_EQ(0u, world.GetState().reservedChannels);
+}
+
+TEST_F(OneClosedCamera, PrintsALineForAnOverrunAndGoesOn) {
+    ASSERT_EQ(CameraOk, camera->OpenCamera());
+    const StreamAssembler& assembler = GetFWContext(camera->GetHALCamera())->assembler;
+    testing::internal::CaptureStdout();
+
+    assembler.overrun(assembler.context);
+
+    EXPECT_EQ("OverrunCB called\n", testing::internal::GetCapturedStdout());
+    EXPECT_EQ(CameraOk, camera->CloseCamera());
 }
 
 TEST_F(OneClosedCamera, HasNothingToClose) {
