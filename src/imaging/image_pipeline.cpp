@@ -37,14 +37,25 @@ void CopyBytes(std::uint8_t* to, const std::uint8_t* from, std::uint32_t bytes) 
     if (bytes != 0 && to != from) std::memmove(to, from, bytes);
 }
 
-FilterResult PassInputOn(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out) {
-    if (!DoesFit(in.imageSize, out)) return FilterFailed;
-    CopyBytes(out.data, in.data, in.imageSize);
+/// An image without an intermediate buffer is passed on where it lies: a filter that would work on
+/// the output's bytes finds no room there and fails.
+FilterResult PassInputOn(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out,
+                         bool isOfImage) {
+    const bool doesFit = DoesFit(in.imageSize, out);
+    if (!doesFit && !isOfImage) return FilterFailed;
+    if (doesFit) CopyBytes(out.data, in.data, in.imageSize);
     out.imageSize = in.imageSize;
     out.width = in.width;
     out.height = in.height;
     out.imageFormat = in.imageFormat;
     return FilterDeclined;
+}
+
+/// Whether a filter that ended like this has left the image as it was though it is one for it: for
+/// want of memory, or of its lock.
+bool IsUnmade(FilterResult result, bool lacksMemory) {
+    if (result == FilterFailed) return lacksMemory;
+    return result == FilterNotInitialised || result == CameraHalFault;
 }
 
 }  // namespace
@@ -129,16 +140,18 @@ FilterResult ZImagePipeline::ProcessImage(ZExImage* image, bool* complete) {
     image->SetImageSize(oldSize);
     in.data = image->GetImageData();
 
+    std::uint8_t noRoom = 0;  // A capacity of 0 would be one that its owner vouches for.
     ZOutImageBufferStruct out;
-    FilterResult result = FilterFailed;
-    if (!hasBuffer || ReserveIntermediate(std::max(needed, std::uint32_t{1}))) {
+    out.data = &noRoom;
+    out.dataCapacity = sizeof(noRoom);
+    const bool hasRoom = hasBuffer && ReserveIntermediate(std::max(needed, std::uint32_t{1}));
+    if (hasRoom) {
         out.data = intermediate.GetData();
         out.dataCapacity = intermediate.GetBytes();
-        result = RunFilters(in, out, complete, image);
     }
-    const bool lacksMemory = image->GetBufferBytes() < needed || intermediate.GetBytes() < needed;
-    const bool isUnmade = (result == FilterFailed && lacksMemory) || result == FilterNotInitialised;
-    if (isUnmade && image->GetErrorCode() == FrameStatusGood) {
+    const FilterResult result = RunFilters(in, out, complete, image);
+    const bool lacksMemory = !hasRoom || image->GetBufferBytes() < needed;
+    if (IsUnmade(result, lacksMemory) && image->GetErrorCode() == FrameStatusGood) {
         image->SetErrorCode(FrameStatusBufferTooSmall);
     }
     if (result == FilterDone) {
@@ -157,7 +170,7 @@ FilterResult ZImagePipeline::RunFilter(ZImageFilter& filter, ZInImageBufferStruc
     if (!filter.IsEnabled()) return FilterDeclined;
     const FilterResult status = filter.Process(&in, &out);
     if (status == FilterDone) return TakeOutput(in, out, image);
-    if (status == FilterDeclined) return PassInputOn(in, out);
+    if (status == FilterDeclined) return PassInputOn(in, out, image != nullptr);
     return status;
 }
 

@@ -47,9 +47,10 @@ class ZENTARA_API ZImagePipeline : public ZObject {
 
     /// Runs the filters over an image, whose buffer grows if one of them needs it. Only a result of
     /// `FilterDone` changes the image's format, size, width and height, the latter two cut to 16
-    /// bits; its pixels may be those of an earlier filter in any case. An image that the filters
-    /// have failed on for want of memory, or whose filter has no buffers of its size, gets the
-    /// error code `FrameStatusBufferTooSmall`, unless it has one.
+    /// bits; its pixels may be those of an earlier filter in any case. An image that a filter has
+    /// failed on for want of memory, that its filter has no buffers of its size for, or cannot have
+    /// the lock for, gets the error code `FrameStatusBufferTooSmall`, unless it has one. Without an
+    /// intermediate buffer the filters are asked all the same: what they decline needs none.
     FilterResult ProcessImage(ZExImage* image, bool* complete);
 
   private:
