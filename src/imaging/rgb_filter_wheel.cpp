@@ -210,6 +210,7 @@ FilterResult ZRGBFilterWheel::Collect(const ZInImageBufferStruct& in, ZOutImageB
     if (in.camera == nullptr || in.camera->GetImageFormat() != CameraRGBFilter) {
         return FilterDeclined;
     }
+    if (lacksPlanes) MakePlanes(widthMax, heightMax);
     if (!IsInTurn(in)) return FilterNothingYet;
     const FilterResult stored = Store(in);
     if (stored != FilterDone) return stored;
@@ -296,11 +297,13 @@ void ZRGBFilterWheel::MakePlanes(std::uint32_t width, std::uint32_t height) {
         return shot.plane.AllocateAhead(planeBytes);
     });
     if (!buffersAllocated) FreePlanes();
+    lacksPlanes = !buffersAllocated;
 }
 
 void ZRGBFilterWheel::FreePlanes() {
     for (Shot& shot : shots) shot.plane.Free();
     buffersAllocated = false;
+    lacksPlanes = false;
 }
 
 }  // namespace ZV

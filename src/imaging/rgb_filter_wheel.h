@@ -31,7 +31,7 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     /// 12; `FilterNotInitialised` the format reads words and the planes hold fewer than the image
     /// has pixels; `FilterFailed` the image does not fit the output; 9 the semaphore cannot be
     /// given back. A set that could not be packed stays as it is: the next frame in turn tries
-    /// again.
+    /// again. So does each frame for planes that there was no memory for.
     FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override;
     /// Stores the largest size and makes the planes if there are none. `FilterDone`.
     FilterResult Init(std::uint32_t width, std::uint32_t height) override;
@@ -82,6 +82,7 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     std::uint16_t nextColour = 0;
     std::array<Shot, 3> shots;  // Red, green, blue.
     bool buffersAllocated = false;
+    bool lacksPlanes = false;  // For want of memory when they were to be made.
     std::uint32_t widthMax = 0;
     std::uint32_t heightMax = 0;
 };

@@ -3,10 +3,12 @@
 #include <cstring>
 #include <vector>
 
+#include "camera/bare_camera.h"
 #include "camera/camera_result.h"
 #include "imaging/bayer_interpolation.h"
 #include "imaging/image_fixture.h"
 #include "imaging/image_pipeline.h"
+#include "imaging/rgb_filter_wheel.h"
 #include "memory/failing_allocator.h"
 
 namespace ZV::Test {
@@ -200,6 +202,101 @@ TEST_F(PipelineWithoutMemory, KeepsTheCodeThatAnImageHas) {
     EXPECT_EQ(FilterNotInitialised, Process());
 
     EXPECT_EQ(FrameStatusMissingData, image.GetErrorCode());
+}
+
+/// The wheel of a camera in a pipeline, and frames of its colours.
+class WheelWithoutMemory : public PipelineWithoutMemory {
+  protected:
+    class Camera : public BareBase {
+      public:
+        std::uint32_t GetImageFormat() override { return CameraRGBFilter; }
+        std::uint16_t GetRGBFilterStartColour() override { return PatternRed; }
+    };
+
+    void AddWithout(std::int64_t plane) {
+        pipeline.Setup(4, 2);
+        BeginAllocations(plane);
+        (void)wheel.Init(4, 2);
+        ASSERT_TRUE(EndAllocations());
+        pipeline.AddFilter(&bystander);
+    }
+    FilterResult Take(ZColourPatternEnum colour) {
+        image = Testing::MakeImage(Testing::Ramp(8),
+                                   {.pattern = colour, .camera = static_cast<ZCamera*>(&camera)});
+        return Process();
+    }
+
+    /// Lets the pipeline have the wheel without telling it the size anew.
+    class Bystander : public Tripler {
+      public:
+        explicit Bystander(ZRGBFilterWheel& newWheel) : wheel(newWheel) {}
+        FilterResult Process(ZInImageBufferStruct* in, ZOutImageBufferStruct* out) override {
+            return wheel.Process(in, out);
+        }
+        std::uint32_t GetNeededOutputBufferSize(ZInImageBufferStruct* in) override {
+            return wheel.GetNeededOutputBufferSize(in);
+        }
+
+      private:
+        ZRGBFilterWheel& wheel;
+    };
+
+    Camera camera;
+    ZRGBFilterWheel wheel{RGBPlane8};
+    Bystander bystander{wheel};
+};
+
+TEST_F(WheelWithoutMemory, MakesItsPlanesWithTheFirstFrameThatFindsSome) {
+    for (std::int64_t plane = 1; plane <= 3; ++plane) {
+        SCOPED_TRACE(plane);
+        AddWithout(plane);
+
+        EXPECT_EQ(FilterNothingYet, Take(PatternRed));
+        EXPECT_EQ(FilterNothingYet, Take(PatternGreen));
+        EXPECT_EQ(FilterDone, Take(PatternBlue));
+
+        EXPECT_EQ(24U, image.GetImageSize());
+        EXPECT_EQ(FrameStatusGood, image.GetErrorCode());
+        wheel.FreeBuffers();
+        pipeline.RemoveFilter(&bystander);
+    }
+}
+
+TEST_F(WheelWithoutMemory, TellsOfEachFrameUntilThereIsSome) {
+    AddWithout(1);
+    image = Testing::MakeImage(Testing::Ramp(8),
+                               {.pattern = PatternRed, .camera = static_cast<ZCamera*>(&camera)});
+    BeginAllocations(1);
+    EXPECT_EQ(FilterNotInitialised, Process());
+    EXPECT_TRUE(EndAllocations());
+    ExpectImageAsItCame();
+
+    EXPECT_EQ(FilterNothingYet, Take(PatternRed));
+    EXPECT_EQ(1, wheel.GetRedCount());
+}
+
+TEST_F(WheelWithoutMemory, MakesNoPlanesThatWereLetGoOnPurpose) {
+    pipeline.Setup(4, 2);
+    (void)wheel.Init(4, 2);
+    wheel.FreeBuffers();
+    pipeline.AddFilter(&bystander);
+
+    EXPECT_EQ(FilterNotInitialised, Take(PatternRed));
+
+    ExpectImageAsItCame();
+}
+
+TEST_F(WheelWithoutMemory, OfAFormatThatIsNoneLeavesTheImageGoodWithMemoryAtHand) {
+    pipeline.Setup(4, 2);
+    pipeline.AddFilter(&wheel);
+    (void)wheel.SetOutputFormat(RGBX32);
+    (void)Take(PatternRed);
+    (void)Take(PatternGreen);
+
+    EXPECT_EQ(FilterFailed, Take(PatternBlue));
+
+    EXPECT_EQ(8U, image.GetImageSize());
+    EXPECT_EQ(FrameStatusGood, image.GetErrorCode());
 }
 
 TEST_F(PipelineWithoutMemory, TellsOfAMosaicThatCouldNotBeFinished) {
