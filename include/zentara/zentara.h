@@ -104,7 +104,7 @@ enum {
     zerrFirewireFault = 14,   /**< General internal error (bus). */
     zerrCameraFault = 15,     /**< General internal error (camera). */
     zerrDriverFault = 16,     /**< General internal error (driver). */
-    zerrBufferTooSmall = 18,  /**< bufferSize of the frame is too small for its image. */
+    zerrBufferTooSmall = 18,  /**< The frame's buffer, or memory for its image, is too small. */
     zerrBusy = 21,            /**< The function cannot be processed at this time. */
     zerrQueueFull = 22,       /**< The queue of frames and settings changes is full. */
     zerrFrameIncomplete = 23, /**< Frame: it ended before all its data had come. */
@@ -722,7 +722,10 @@ ZENTARA_API ZentaraResult Zentara_GetCameraModelString(ZentaraHandle handle, cha
  * The frame's errorCode tells any trouble with the image, the result does not: an image that the
  * camera's filter wheel or post-processing made larger than bufferSize gives result 0, errorCode
  * zerrBufferTooSmall, size 0 and untouched pixels, with width, height and format telling what was
- * needed.
+ * needed. The same code with a size that is not 0 is no matter of bufferSize: the library has been
+ * too short of memory for the image. It comes as far as it got, by width, height and format of a
+ * single colour of the wheel or still a mosaic, and is not to be relied on; the next one is whole
+ * if there is memory again. Frames of a stream tell of both in the same way.
  *
  * 8 not loaded; 9 `handle` null; 2 `frame` null; 9 not open; 9 open in another process; 21 the
  * queue is not empty; 18 bufferSize is smaller than the camera's image; a camera's failure (15, 16
