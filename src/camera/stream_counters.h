@@ -44,13 +44,15 @@ class StatusCounters {
 /// Each frame start that the stream layer finds is `begun` or `refused`. Each begun frame is in the
 /// frame queue, or counts once as `delivered`, `heldBack`, `dropped`, `bad` or `cleared`.
 struct StreamCounters {
-    StreamCounter begun;       ///< Got a record and a buffer.
-    StreamCounter refused;     ///< After an abort, without a stream, a buffer or memory.
-    StreamCounter dropped;     ///< The youngest of two that wait, when a third begins.
-    StreamCounter bad;         ///< Discarded by the run loop: stale, refused, without memory.
-    StreamCounter cleared;     ///< Taken out of the queue by a stop.
-    StreamCounter heldBack;    ///< Kept by the pipeline: colours that are not an image yet.
-    StatusCounters delivered;  ///< Handed to the image callback, by frame status code.
+    StreamCounter begun;     ///< Got a record and a buffer.
+    StreamCounter refused;   ///< After an abort, without a stream, a buffer or memory.
+    StreamCounter dropped;   ///< The youngest of two that wait, when a third begins.
+    StreamCounter bad;       ///< Discarded by the run loop: stale, refused, without memory.
+    StreamCounter cleared;   ///< Taken out of the queue by a stop.
+    StreamCounter heldBack;  ///< Kept by the pipeline: colours that are not an image yet.
+    /// Handed to the image callback, by the frame status code of that moment: what post-processing
+    /// adds to it behind the callback, for want of memory, a client sees alone.
+    StatusCounters delivered;
     /// Delivered, but nobody waited for an image. Part of `delivered`.
     StatusCounters withoutTaker;
 };
