@@ -443,6 +443,7 @@ void Device::AddState(ZentaraSimulationState* state) const {
     state->buffersRefused += buffersRefused;
     state->buffersFailed += buffersFailed;
     state->framesBegun += framesBegun;
+    state->psn = settings.psn;
     state->framesExposed += framesExposed;
     state->framesSent += framesSent;
     state->isStreaming |= sender.isOn;

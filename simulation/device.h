@@ -109,7 +109,7 @@ class Device {
     std::uint32_t DetachBuffers(Call& call);
     std::uint32_t Listen(Call& call);
     std::uint32_t Stop(Call& call);
-    /// Returns how many there were.
+    /// Returns how many there were that would not have failed anyway.
     std::uint32_t EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error);
     void CountFailed(std::uint32_t code, std::uint32_t count);
     void StopListening(const Handle& handle);

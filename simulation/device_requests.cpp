@@ -144,11 +144,14 @@ std::uint32_t Device::StreamLeave(Call& call) {
 
 std::uint32_t Device::EndWaiting(const Handle& handle, std::uint32_t code, std::uint32_t error) {
     std::vector<std::uint64_t> ids;
+    std::uint32_t newlyFailed = 0;
     for (const PendedRequest& pended : handle->pended) {
-        if (pended.request->code == code) ids.push_back(pended.id);
+        if (pended.request->code != code) continue;
+        ids.push_back(pended.id);
+        if (pended.forcedError == PlatformErrorNone) ++newlyFailed;
     }
     for (const std::uint64_t id : ids) EndPended(handle, id, error, 0);
-    return static_cast<std::uint32_t>(ids.size());
+    return newlyFailed;
 }
 
 void Device::CountFailed(std::uint32_t code, std::uint32_t count) {

@@ -55,6 +55,7 @@ struct ZentaraSimulationState {
     std::uint32_t buffersFailed;
     /// Numbers that frames have used up: one that begins anew takes another.
     std::uint64_t framesBegun;
+    std::uint32_t psn;  ///< Parameter set number in force, of one camera alone.
 };
 
 /// 0, or 1 for a camera that is not there. `camera` 0xFFFFFFFF sums over all.

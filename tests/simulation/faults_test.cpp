@@ -286,6 +286,8 @@ TEST(Faults, AFrameBeginsAnewInItsMiddle) {
     EXPECT_EQ(0, packets[2][PlainFlagsOffset]);
     EXPECT_EQ(PlainFlagFirst, packets[3][PlainFlagsOffset]);
     EXPECT_NE(packets[0][PlainFrameNumberOffset], packets[3][PlainFrameNumberOffset]);
+    const ZentaraSimulationState state = stream.world.GetState();
+    EXPECT_EQ(state.framesExposed + 1, state.framesBegun);
     EXPECT_EQ(PlainFlagFirst, packets[3 + PacketsPerFrame][PlainFlagsOffset]);
 }
 
@@ -306,6 +308,7 @@ TEST(Faults, ABusResetCutsTheFrameAndFailsTheRequestUnderWay) {
 
     (void)stream.reader.ReadRequest();
     EXPECT_EQ(PlatformErrorGeneralFailure, stream.reader.lastError);
+    EXPECT_EQ(1u, stream.world.GetState().buffersFailed);
 
     EXPECT_FALSE(stream.reader.ReadRequest().empty());
     EXPECT_EQ(0u, stream.reader.lastError);
@@ -329,6 +332,45 @@ TEST(Faults, ABusResetEndsTheRegisterRequestThatItMeetsAndLetsOthersPass) {
     EXPECT_EQ(PlatformErrorGeneralFailure, cut.error);
     EXPECT_EQ(0u, whole.error);
     EXPECT_EQ(1u, world.GetState().requestsFailed);
+    EXPECT_EQ(1u, world.GetState().registerRequestsFailed);
+}
+
+// Whether the reset finds the first request pended is up to the threads; the count is not.
+TEST(Faults, ARequestThatFailsIsCountedOnceThoughAResetEndsIt) {
+    constexpr std::uint32_t Pairs = 200;
+    const World world(R"({"kind": "failRequest", "code": "FW_IOCTL_ASYNC_READ", "count": 0,
+                          "pended": true},
+                         {"kind": "busReset", "code": "FW_IOCTL_ASYNC_WRITE", "count": 0})");
+    DriverClient client;
+    for (std::uint32_t i = 0; i < Pairs; ++i) {
+        TestRequest read(FW_IOCTL_ASYNC_READ, MakeReadRecord(PrimaryIdentityAddress, 1), 4);
+        TestRequest write(FW_IOCTL_ASYNC_WRITE, MakeWriteRecord(ControlAddress + 4, {1}), 0);
+
+        ASSERT_EQ(PlatformErrorIoPending, read.Send(client.handle));
+        const bool isPended = write.Send(client.handle) == PlatformErrorIoPending;
+        ASSERT_TRUE(read.Wait());
+        ASSERT_TRUE(!isPended || write.Wait());
+    }
+
+    EXPECT_EQ(2 * Pairs, world.GetState().requestsFailed);
+    EXPECT_EQ(2 * Pairs, world.GetState().registerRequestsFailed);
+}
+
+TEST(Faults, BuffersThatAreRefusedAndThatFailAreCountedApart) {
+    const World world(R"({"kind": "failRequest", "code": "FW_IOCTL_ATTACH_BUFFER", "request": 1},
+                         {"kind": "failRequest", "code": "FW_IOCTL_ATTACH_BUFFER", "request": 2,
+                          "pended": true})");
+    DriverClient client;
+    std::vector<std::uint8_t> buffer(PacketsPerRequest * Stride);
+    TestRequest refused(FW_IOCTL_ATTACH_BUFFER, buffer, buffer.size());
+    TestRequest failed(FW_IOCTL_ATTACH_BUFFER, buffer, buffer.size());
+
+    EXPECT_EQ(31u, refused.Send(client.handle));
+    ASSERT_EQ(PlatformErrorIoPending, failed.Send(client.handle));
+    ASSERT_TRUE(failed.Wait());
+
+    EXPECT_EQ(1u, world.GetState().buffersRefused);
+    EXPECT_EQ(1u, world.GetState().buffersFailed);
 }
 
 TEST(Faults, AFrameUnplugsTheDevice) {
