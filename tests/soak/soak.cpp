@@ -50,7 +50,7 @@ void PartOutputs() {
 struct Options {
     std::uint64_t seconds = 60, minuteSeconds = 60, cameras = 10;
     double faults = 0.001, requestFaults = 0.001;
-    std::string fault;  ///< Of every camera, besides.
+    std::vector<std::string> givenFaults;  ///< Of every camera, besides.
     std::string state;
 };
 
@@ -81,7 +81,7 @@ constexpr OptionRow OptionRows[] = {
      [](const char* text, Options* o) { return ReadRate(text, &o->requestFaults); }},
     {"--fault",
      [](const char* text, Options* o) {
-         o->fault = text;
+         o->givenFaults.emplace_back(text);
          return true;
      }},
     {"--state",
@@ -262,7 +262,7 @@ class Soak {
     /// Once all cameras are listed: they fail those that use them.
     bool AddFaults() const {
         std::vector<std::string> faults = MakeRequestFaults(options.requestFaults);
-        if (!options.fault.empty()) faults.push_back(options.fault);
+        faults.insert(faults.end(), options.givenFaults.begin(), options.givenFaults.end());
         for (std::uint32_t i = 0; i < options.cameras; ++i) {
             for (const std::string& fault : faults) {
                 if (ZentaraSimulation_AddFault(i, fault.c_str(), nullptr, 0) != 0) return false;
@@ -329,7 +329,7 @@ int Run(int count, char** arguments) {
     if (!ReadOptions(count, arguments, &options)) {
         std::fputs(
             "zentara-soak [--seconds N] [--cameras 1-10] [--faults RATE] [--request-faults RATE] "
-            "[--fault JSON] [--state FILE] [--minute SECONDS]\n",
+            "[--fault JSON]... [--state FILE] [--minute SECONDS]\n",
             stderr);
         return 2;
     }

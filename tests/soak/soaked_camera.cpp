@@ -185,12 +185,19 @@ bool SoakedCamera::Restart() {
     return true;
 }
 
-/// A buffer that cannot be attached ends the loop. Registers of which one could not be written may
-/// not be what the library takes them for.
+/// A buffer that cannot be attached ends the loop. A change of which a register could not be
+/// written may leave the camera at another parameter set number than the library: then all its
+/// frames are refused.
 bool SoakedCamera::HasReasonToStall() const {
     const FailedRequests failed = CountFailedRequests();
-    return failed.refused != failedAtStream.refused ||
-           failed.registers != failedAtOpening.registers;
+    if (failed.refused != failedAtStream.refused) return true;
+    return failed.registers != failedAtOpening.registers && HasOtherPsn();
+}
+
+bool SoakedCamera::HasOtherPsn() const {
+    constexpr std::uint32_t PsnMask = 0xFF;
+    ZCamera& camera = *reinterpret_cast<ZCamera*>(handle);
+    return ((camera.GetPSN() ^ GetState(position).psn) & PsnMask) != 0;
 }
 
 bool SoakedCamera::IsStalled(std::chrono::steady_clock::time_point begin) const {
@@ -283,10 +290,11 @@ bool SoakedCamera::MayBeStale(bool isDamaged, std::uint32_t buffersFailed) const
 /// since it was queued.
 void SoakedCamera::ReceiveChange(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
                                  std::uint32_t) {
-    const auto& change = *reinterpret_cast<Change*>(static_cast<std::uintptr_t>(userPrivate));
+    auto& change = *reinterpret_cast<Change*>(static_cast<std::uintptr_t>(userPrivate));
     SoakedCamera& camera = *change.camera;
     if (change.opening != camera.opening) return;
     ++camera.changesMade;
+    change.isMade = true;
     if (!camera.isPlugged) return;
     (void)camera.Tell("a change", errorCode,
                       camera.CountFailedRequests().registers != change.failedBefore);
@@ -301,13 +309,18 @@ void SoakedCamera::QueueAll() {
     for (Slot& slot : slots) Queue(slot);
 }
 
+/// When no frame waits, the change is made at once, and its callback has judged the result.
 void SoakedCamera::QueueChange() {
-    Change& change =
-        changes.emplace_back(Change{this, opening, CountFailedRequests().registers, settings});
+    Change& change = changes.emplace_back();
+    change.camera = this;
+    change.opening = opening;
+    change.failedBefore = CountFailedRequests().registers;
+    change.settings = settings;
     Test::SetWide(change.settings, zprm64Exposure, 100000 * (1 + random() % 20));
-    Expect("Zentara_QueueSettings",
-           Zentara_QueueSettings(handle, &change.settings, ReceiveChange, zcbFrameDone,
-                                 reinterpret_cast<std::uintptr_t>(&change), 0));
+    const ZentaraResult queued =
+        Zentara_QueueSettings(handle, &change.settings, ReceiveChange, zcbFrameDone,
+                              reinterpret_cast<std::uintptr_t>(&change), 0);
+    if (!change.isMade) Expect("Zentara_QueueSettings", queued);
 }
 
 /// False when the camera does not come back in time. What a request has failed is tried again.

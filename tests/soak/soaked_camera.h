@@ -60,6 +60,7 @@ class SoakedCamera {
         std::uint32_t opening = 0;
         std::uint32_t failedBefore = 0;  ///< Reads and writes, when it was queued.
         Zentara_Settings settings{};
+        std::atomic<bool> isMade{false};  ///< Or has been tried: its callback came.
     };
 
     static void Receive(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
@@ -84,6 +85,7 @@ class SoakedCamera {
     bool TakeTurn();
     Slot* Take();
     [[nodiscard]] bool HasReasonToStall() const;
+    [[nodiscard]] bool HasOtherPsn() const;
     bool IsStalled(std::chrono::steady_clock::time_point begin) const;
     bool CountEngine();
     void CountStream();

@@ -232,6 +232,29 @@ TEST(Soak, RefusesMinutesThatAreNone) {
     }
 }
 
+// The entry of the loop is not looked at, so that its failure is no reason for a stop that fails.
+TEST(Soak, FailsWhenAStopFailsBehindARequestThatCannotBeTheReason) {
+    const ProgramResult result =
+        RunSoak({"--seconds", "3", "--cameras", "1", "--faults", "0", "--request-faults", "0",
+                 "--fault", R"({"kind": "failRequest", "code": "FW_IOCTL_STREAM_ENTER"})",
+                 "--fault", R"({"kind": "unplug", "code": "FW_IOCTL_STOP", "request": 1})"});
+
+    EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
+    EXPECT_THAT(result.output, testing::HasSubstr("requestsFailed 1,"));
+    EXPECT_THAT(result.errors, testing::HasSubstr("the stop failed"));
+}
+
+// The upper half of the number of some frames, behind the header of their first packet. The second
+// camera sends no blocks.
+TEST(Soak, FailsWhenAFrameComesUnderAWrongNumber) {
+    const ProgramResult result = RunSoak(
+        {"--seconds", "3", "--cameras", "2", "--faults", "0", "--request-faults", "0", "--fault",
+         R"({"kind": "corruptPacket", "packet": 0, "offset": 8, "bytes": 1, "probability": 0.1})"});
+
+    EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
+    EXPECT_THAT(result.output, testing::HasSubstr("frames came under a wrong number"));
+}
+
 TEST(Soak, RefusesAFaultThatIsNone) {
     const ProgramResult result = RunSoak({"--cameras", "1", "--fault", "none"});
 
