@@ -15,6 +15,7 @@
 #include <cstdlib>
 #include <mutex>
 #include <new>
+#include <thread>
 
 #include "support/rounds.h"
 
@@ -27,12 +28,15 @@ namespace {
 std::atomic<bool> isCounting{false};
 std::atomic<std::int64_t> allocationsLeft{0};  // 0 from the refused one on
 std::atomic<std::int64_t> refusals{0};
+std::atomic<std::thread::id> refusedThread{};
 
 thread_local int uncountedDepth = 0;
 
 bool MayAllocate() {
     if (!isCounting.load() || uncountedDepth != 0) return true;
-    return allocationsLeft.fetch_sub(1) != 1;
+    if (allocationsLeft.fetch_sub(1) != 1) return true;
+    refusedThread = std::this_thread::get_id();
+    return false;
 }
 
 /// Addresses of what is there, in a table of open addresses: it must not allocate. It ends the
@@ -108,6 +112,7 @@ std::size_t CountLiveMappings() {
 
 void BeginAllocations(std::int64_t failing) {
     allocationsLeft = failing;
+    refusedThread = std::thread::id();
     isCounting = true;
 }
 
@@ -123,6 +128,10 @@ void PrintRefusals() {
 
 bool HasRefusedAllocation() {
     return allocationsLeft.load() <= 0;
+}
+
+std::thread::id GetRefusedThread() {
+    return refusedThread;
 }
 
 std::int64_t CountAllocationsLeft() {

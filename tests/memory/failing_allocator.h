@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <thread>
 
 namespace ZV::Test {
 
@@ -16,6 +17,9 @@ bool EndAllocations();
 
 /// The same without ending the counting.
 bool HasRefusedAllocation();
+
+/// Whose allocation was refused since BeginAllocations.
+std::thread::id GetRefusedThread();
 
 /// Prints how many countings have ended with a refusal, since it was last called.
 void PrintRefusals();

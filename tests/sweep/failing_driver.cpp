@@ -3,6 +3,7 @@
 #include <dlfcn.h>
 #include <link.h>
 
+#include <algorithm>
 #include <array>
 #include <atomic>
 #include <chrono>
@@ -61,6 +62,7 @@ struct DriverState {
     std::uint64_t number = 0;
     bool isCounting = false;
     std::array<std::vector<CountedRequest>, std::size(AllSeries)> counted;
+    std::vector<std::thread::id> streamThreads;
     std::atomic<std::uint32_t> failedCode{0};
     std::uint32_t openDevices = 0;
     std::uint32_t reclaimed = 0;
@@ -111,6 +113,9 @@ RequestFailure Count(const KernelRequest& request) {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
     if (!state.isCounting) return RequestFailure::None;
+    if (request.code == FW_IOCTL_STREAM_ENTER) {
+        state.streamThreads.push_back(std::this_thread::get_id());
+    }
     const RequestSeries series = GetSeries(request.code);
     auto& counted = state.counted[static_cast<std::size_t>(series)];
     counted.push_back({request.code, MayPend(request), GetAddress(request)});
@@ -320,6 +325,7 @@ void BeginRequests(RequestFailure failure, RequestSeries series, std::uint64_t n
     state.number = number;
     state.failedCode = 0;
     for (auto& counted : state.counted) counted.clear();
+    state.streamThreads.clear();
     state.isCounting = true;
 }
 
@@ -337,6 +343,13 @@ std::vector<CountedRequest> GetCounted(RequestSeries series) {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
     return state.counted[static_cast<std::size_t>(series)];
+}
+
+bool IsStreamThread(std::thread::id thread) {
+    DriverState& state = GetState();
+    const std::lock_guard hold(state.mutex);
+    return std::find(state.streamThreads.begin(), state.streamThreads.end(), thread) !=
+           state.streamThreads.end();
 }
 
 std::uint32_t CountOpenDevices() {

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <string_view>
+#include <thread>
 #include <vector>
 
 #include "simulation/zentara_simulation.h"
@@ -54,6 +55,9 @@ ModuleLoads GetModuleLoads();
 /// From here on the system names the library's image by a relative path, as it does for one that
 /// was found by such a path.
 void NameImageRelatively();
+
+/// Whether it is the own thread of a stream, since BeginRequests.
+bool IsStreamThread(std::thread::id thread);
 
 /// Handles that are open at the driver.
 std::uint32_t CountOpenDevices();

@@ -73,6 +73,7 @@ class Aborter {
         std::unique_lock lock(mutex);
         client = &waiting;
         isArmed = true;
+        hasAborted = false;
         armedAt = Clock::now();
         changed.notify_all();
     }
@@ -80,6 +81,10 @@ class Aborter {
         std::unique_lock lock(mutex);
         isArmed = false;
         changed.wait(lock, [this] { return !isAborting; });
+    }
+    bool HasAborted() {
+        const std::lock_guard hold(mutex);
+        return hasAborted;
     }
 
   private:
@@ -94,7 +99,7 @@ class Aborter {
             // An abort before the wait for the image does not count, so it is repeated.
             (void)changed.wait_for(lock, milliseconds(5), [this] { return !isArmed; });
             if (!isArmed || !HasWaitedEnough()) continue;
-            isAborting = true;
+            isAborting = hasAborted = true;
             lock.unlock();
             (void)Zentara_Abort(client->GetHandle());
             lock.lock();
@@ -107,7 +112,7 @@ class Aborter {
     std::condition_variable changed;
     const Client* client = nullptr;
     bool isArmed = false;
-    bool isAborting = false;
+    bool isAborting = false, hasAborted = false;
     Clock::time_point armedAt;
     std::thread thread;
 };
@@ -120,6 +125,10 @@ Aborting::Aborting(Client& client) {
 
 Aborting::~Aborting() {
     Aborter::Get().Disarm();
+}
+
+bool Aborting::HasAborted() const {
+    return Aborter::Get().HasAborted();
 }
 
 Client::Client() {
@@ -135,8 +144,7 @@ void Client::Reset() {
     answers = 0;
     listedCount = 0;
     handle = 0;
-    queued = 0;
-    served = 0;
+    BeginQueue();
     strangeCode = 0;
     for (Frame& frame : frames) {
         frame.record = {};
@@ -150,14 +158,22 @@ milliseconds Client::GetPatience() const {
     return !isPatient && HasSomethingFailed() ? ShortPatience : LongPatience;
 }
 
-ZentaraResult Client::Note(const char* name, ZentaraResult result) {
-    if (callCount < calls.size()) calls[callCount++] = {name, result};
+ZentaraResult Client::Note(const char* name, ZentaraResult result, bool wasAborted) {
+    if (callCount < calls.size()) calls[callCount++] = {name, result, wasAborted};
     return result;
 }
 
 void Client::NoteAnswer(const void* bytes, std::size_t count) {
     const std::uint64_t both[] = {answers, CalculateChecksum(bytes, count)};
     answers = CalculateChecksum(both, sizeof both);
+}
+
+std::uint64_t Client::GetImage() const {
+    const Zentara_Frame& frame = frames[0].record;
+    const std::uint64_t parts[] = {
+        frame.format, frame.width, frame.height,
+        CalculateChecksum(frames[0].pixels.data(), std::min(frame.size, BufferBytes))};
+    return CalculateChecksum(parts, sizeof parts);
 }
 
 void Client::NoteFrame(const Zentara_Frame& frame) {
@@ -195,7 +211,7 @@ void Client::Release() {
     Zentara_ReleaseDriver();
 }
 
-void Client::Begin(std::uint32_t imageFormat) {
+void Client::Begin(std::uint32_t imageFormat, std::uint32_t finishedFormat) {
     if (!IsOpen()) return;
     (void)Note("Zentara_ReadDefaultSettings", Zentara_ReadDefaultSettings(handle, &settings));
     // Kept: a register counts as written though its write has failed, and the first setup takes a
@@ -204,6 +220,10 @@ void Client::Begin(std::uint32_t imageFormat) {
     ChooseOthers(&others);
     (void)Note("Zentara_SendSettingsToCam", Zentara_SendSettingsToCam(handle, &others));
     SetWord(settings, zprmImageFormat, imageFormat);
+    if (finishedFormat != 0) {
+        SetWord(settings, zprmPostProcessImageFormat, finishedFormat);
+        SetWord(settings, zprmDoPostProcessing, 1);
+    }
     SetWide(settings, zprm64Exposure, ShortExposureNs);
     SetWide(settings, zprm64ExposureRed, ShortExposureNs);
     SetWide(settings, zprm64ExposureBlue, ShortExposureNs);
@@ -259,7 +279,8 @@ void Client::SendOthers() {
 
 void Client::Grab() {
     const Aborting aborting(*this);
-    (void)Note("Zentara_GrabFrame", Zentara_GrabFrame(handle, &frames[0].record));
+    const ZentaraResult result = Zentara_GrabFrame(handle, &frames[0].record);
+    (void)Note("Zentara_GrabFrame", result, aborting.HasAborted());
     NoteFrame(frames[0].record);
 }
 
@@ -267,7 +288,19 @@ void Client::Serve(std::uint64_t userPrivate, std::uint32_t, std::uint32_t error
                    std::uint32_t flags) {
     auto* const client = reinterpret_cast<Client*>(static_cast<std::uintptr_t>(userPrivate));
     if (!IsFrameCode(errorCode)) client->strangeCode = errorCode;
-    if ((flags & zcbFrameDone) != 0) ++client->served;
+    if ((flags & zcbFrameDone) == 0) return;
+    if (errorCode != zerrNone) ++client->damaged;
+    ++client->served;
+}
+
+void Client::ServeChange(std::uint64_t userPrivate, std::uint32_t, std::uint32_t errorCode,
+                         std::uint32_t) {
+    auto* const client = reinterpret_cast<Client*>(static_cast<std::uintptr_t>(userPrivate));
+    ++(errorCode == zerrNone ? client->changed : client->unchanged);
+}
+
+Client::StreamOutcome Client::GetStream() const {
+    return {queued, served, damaged, changed, unchanged};
 }
 
 std::uint32_t Client::GetStrangeFrameCode() const {
@@ -277,19 +310,33 @@ std::uint32_t Client::GetStrangeFrameCode() const {
     return strangeCode;
 }
 
+void Client::BeginQueue() {
+    queued = 0;
+    served = damaged = 0;
+    changed = unchanged = 0;
+}
+
+void Client::QueueFrame(std::size_t index) {
+    const ZentaraResult result = Zentara_QueueFrame(
+        handle, &frames[index].record, Serve, zcbFrameDone | zcbExposeDone,
+        reinterpret_cast<std::uintptr_t>(this), static_cast<std::uint32_t>(index));
+    if (Note("Zentara_QueueFrame", result) == zerrNone) ++queued;
+}
+
+void Client::QueueChange(std::size_t index) {
+    Zentara_Settings& change = changes[index];
+    change = settings;
+    SetWide(change, zprm64Exposure, ShortExposureNs * (2 + index));
+    (void)Note("Zentara_QueueSettings",
+               Zentara_QueueSettings(handle, &change, ServeChange, zcbFrameDone,
+                                     reinterpret_cast<std::uintptr_t>(this), 0));
+}
+
 void Client::QueueAll() {
-    const auto self = reinterpret_cast<std::uintptr_t>(this);
+    BeginQueue();
     for (std::size_t i = 0; i < frames.size(); ++i) {
-        const ZentaraResult result =
-            Zentara_QueueFrame(handle, &frames[i].record, Serve, zcbFrameDone | zcbExposeDone, self,
-                               static_cast<std::uint32_t>(i));
-        if (Note("Zentara_QueueFrame", result) == zerrNone) ++queued;
-        if (i % 5 != 4) continue;
-        Zentara_Settings& change = changes[i / 5];
-        change = settings;
-        SetWide(change, zprm64Exposure, ShortExposureNs * (2 + i / 5));
-        (void)Note("Zentara_QueueSettings",
-                   Zentara_QueueSettings(handle, &change, nullptr, 0, 0, 0));
+        QueueFrame(i);
+        if (i % 5 == 4) QueueChange(i / 5);
     }
 }
 
@@ -322,17 +369,29 @@ void Client::StartStream() {
     (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 1));
 }
 
+void Client::StreamShortly() {
+    constexpr std::size_t Count = 4;
+    BeginQueue();
+    for (std::size_t i = 0; i < Count; ++i) QueueFrame(i);
+    (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 1));
+    AwaitFrames();
+    (void)Note("Zentara_SetStreaming", Zentara_SetStreaming(handle, 0));
+    (void)Note("Zentara_Abort", Zentara_Abort(handle));
+}
+
 void Client::Balance() {
     SetWord(settings, zprmPostProcessImageFormat, zfmtRGB24);
     SetWord(settings, zprmDoPostProcessing, 1);
     const Aborting aborting(*this);
     Send();
-    (void)Note("Zentara_WhiteBalance", Zentara_WhiteBalance(&settings, 0, 0, Width, Height));
+    const ZentaraResult result = Zentara_WhiteBalance(&settings, 0, 0, Width, Height);
+    (void)Note("Zentara_WhiteBalance", result, aborting.HasAborted());
 }
 
 void Client::Expose() {
     const Aborting aborting(*this);
-    (void)Note("Zentara_AutoExpose", Zentara_AutoExpose(&settings, 0, 0, Width, Height));
+    const ZentaraResult result = Zentara_AutoExpose(&settings, 0, 0, Width, Height);
+    (void)Note("Zentara_AutoExpose", result, aborting.HasAborted());
 }
 
 void Client::ReadTables() {
@@ -368,7 +427,12 @@ void Client::Finish() {
     frames[3].record.height = 2 * grabbed.height;
     (void)Note("Zentara_BayerZoomVert",
                Zentara_BayerZoomVert(zbayerFast, &grabbed, &frames[3].record));
-    for (std::size_t i = 1; i <= 3; ++i) NoteFrame(frames[i].record);
+    NoteFrame(frames[3].record);
+}
+
+Client::FinishedFrames Client::GetFinished() const {
+    return {CalculateChecksum(frames[1].pixels.data(), BufferBytes),
+            CalculateChecksum(frames[2].pixels.data(), BufferBytes)};
 }
 
 bool Client::HasFrameWithError() const {

@@ -23,6 +23,13 @@ class Client {
     struct Call {
         const char* name;
         ZentaraResult result;
+        bool wasAborted;  ///< It waited for an image that did not come.
+    };
+    /// What became of the queued frames of a stream and of the changes among them.
+    struct StreamOutcome {
+        std::uint32_t queued = 0, served = 0;
+        std::uint32_t damaged = 0;                 ///< Of those served.
+        std::uint32_t changed = 0, unchanged = 0;  ///< By the changes' own callbacks.
     };
 
     Client();
@@ -46,7 +53,8 @@ class Client {
 
     /// Puts an image format and a short exposure in force, all else by default. Whatever the camera
     /// was left with, each of its registers is written: other values come first.
-    void Begin(std::uint32_t imageFormat);
+    /// `finishedFormat` is that of post-processing, which is off when there is none.
+    void Begin(std::uint32_t imageFormat, std::uint32_t finishedFormat);
     void ReadSettings();
     void Send();
     /// A send of values that all differ from those in force, as far as the model has more than one,
@@ -57,6 +65,8 @@ class Client {
     /// and waits for the frames.
     void StreamWithChanges();
     void StartStream();
+    /// A few queued frames and no changes.
+    void StreamShortly();
     void Balance();
     void Expose();
 
@@ -80,10 +90,18 @@ class Client {
     /// Nothing was written behind any buffer, and no frame says that it is longer than its own.
     bool HasFramesInOrder() const;
     const Zentara_Frame& GetGrabbed() const { return frames[0].record; }
+    /// A checksum of the grabbed frame but for its number.
+    std::uint64_t GetImage() const;
     bool HasFrameWithError() const;
+    /// Of the last stream.
+    StreamOutcome GetStream() const;
     /// A checksum of what the calls have handed out since Reset beside their results: lists,
     /// settings, tables and images, without the numbers of the frames.
     std::uint64_t GetAnswers() const { return answers; }
+    /// Checksums of the frames that two calls for single frames have made, whose failure no code
+    /// tells.
+    using FinishedFrames = std::array<std::uint64_t, 2>;
+    FinishedFrames GetFinished() const;
 
   private:
     static constexpr std::size_t CallsMax = 256;
@@ -98,11 +116,16 @@ class Client {
 
     void ChooseOthers(Zentara_Settings* block) const;
     std::uint32_t ChooseOtherWord(Zentara_Settings* block, std::uint32_t key) const;
-    ZentaraResult Note(const char* name, ZentaraResult result);
+    ZentaraResult Note(const char* name, ZentaraResult result, bool wasAborted = false);
     void NoteAnswer(const void* bytes, std::size_t count);
     void NoteFrame(const Zentara_Frame& frame);
     static void Serve(std::uint64_t userPrivate, std::uint32_t userData, std::uint32_t errorCode,
                       std::uint32_t flags);
+    static void ServeChange(std::uint64_t userPrivate, std::uint32_t userData,
+                            std::uint32_t errorCode, std::uint32_t flags);
+    void BeginQueue();
+    void QueueFrame(std::size_t index);
+    void QueueChange(std::size_t index);
     void QueueAll();
     void AwaitFrames() const;
 
@@ -118,7 +141,8 @@ class Client {
     std::array<Frame, FrameCount> frames;
     std::uint32_t queued = 0;
     bool isPatient = true;
-    std::atomic<std::uint32_t> served{0};
+    std::atomic<std::uint32_t> served{0}, damaged{0};
+    std::atomic<std::uint32_t> changed{0}, unchanged{0};
     std::atomic<std::uint32_t> strangeCode{0};
 };
 
@@ -141,6 +165,8 @@ class Aborting {
   public:
     explicit Aborting(Client& client);
     ~Aborting();
+    /// Whether it has aborted so far.
+    bool HasAborted() const;
     Aborting(const Aborting&) = delete;
     Aborting& operator=(const Aborting&) = delete;
 };

@@ -1,14 +1,8 @@
 #include "sweep/sweep_round.h"
 
-#include <signal.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
 #include <iterator>
 #include <thread>
 
@@ -17,6 +11,7 @@
 #include "memory/failing_allocator.h"
 #include "support/rounds.h"
 #include "support/wait_until.h"
+#include "sweep/belongings.h"
 #include "sweep/counted_waits.h"
 #include "sweep/told_failures.h"
 
@@ -32,13 +27,14 @@ using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
 constexpr std::uint32_t WaitDivisor = 1000;
-constexpr unsigned RoundSecondsMax = IsSanitized ? 240 : 60;
 /// A call that ends is allowed so long, on a machine with other work.
 constexpr milliseconds CallLimit(IsSanitized ? 20'000 : 5'000);
 /// So long may it wait, on the wait clock, for what does not come: a few times five seconds.
 constexpr std::uint64_t WaitedLimitMs = 30'000;
 /// The client that aborts, and the driver's thread that ends late requests.
 constexpr std::size_t HelperThreads = 2;
+/// Kept: a change behind the last frame waits for an exposure that may not come.
+constexpr std::uint32_t LeastChanges = 3;
 constexpr std::int64_t NoAllocation = std::int64_t{1} << 40;
 
 constexpr ZentaraResult KnownResults[] = {
@@ -61,73 +57,15 @@ Client& GetClient() {
     return *client;
 }
 
-std::size_t CountEntries(const char* folder) {
-    std::error_code ignored;
-    const std::filesystem::directory_iterator entries(folder, ignored);
-    return static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
-}
-
-/// Ends the process when a round does not end.
-class Watchdog {
-  public:
-    explicit Watchdog(const std::string& text) {
-        (void)std::snprintf(m_text, sizeof m_text, "\nThe round hangs: %s\n", text.c_str());
-        (void)signal(SIGALRM, [](int) {
-            (void)!write(STDERR_FILENO, m_text, std::strlen(m_text));
-            abort();
-        });
-        (void)alarm(RoundSecondsMax);
-    }
-    ~Watchdog() { (void)alarm(0); }
-    Watchdog(const Watchdog&) = delete;
-    Watchdog& operator=(const Watchdog&) = delete;
-
-  private:
-    static char m_text[256];
-};
-char Watchdog::m_text[256];
-
-/// The story must go on as if nothing had happened: the failure is one of time alone.
-bool IsHarmless(const Round& round) {
-    if (round.failure == Failure::CompletesLate) return true;
-    return round.failure == Failure::AnsweredAtOnce && round.series == RequestSeries::Calls &&
-           round.code != FW_IOCTL_ASYNC_READ;
-}
-
-/// The driver takes back what a camera has reserved that can never be freed.
-bool LeavesReservations(const Round& round, const Story& story) {
-    if (IsHarmless(round)) return false;
-    // Kept: an unplugged device answers no freeing; the driver has taken all back by then.
-    if (round.failure == Failure::DeviceGone) return true;
-    // Kept: an opening that failed leaves what it has reserved; its device is closed with it.
-    if (story.begins == Stage::Loaded &&
-        (round.code == FW_IOCTL_ALLOC_CHANNEL || round.code == FW_IOCTL_ALLOC_RESOURCES)) {
-        return true;
-    }
-    // Kept: a stop or a freeing that fails ends the camera's close, and a release tries once.
-    constexpr std::uint32_t Codes[] = {FW_IOCTL_ASYNC_WRITE,    FW_IOCTL_STOP,
-                                       FW_IOCTL_DETACH_BUFFERS, FW_IOCTL_FREE_RESOURCES,
-                                       FW_IOCTL_FREE_CHANNEL,   FW_IOCTL_FREE_BANDWIDTH};
-    if (story.ends != Stage::Unloaded) return false;
-    if (round.failure == Failure::NoMemory) return true;  // all that it takes is for that write
-    return std::find(std::begin(Codes), std::end(Codes), round.code) != std::end(Codes);
-}
-
-/// Whether the camera must go on without being listed and opened anew.
-bool LeavesAWorkingCamera(const Round& round, const Story& story) {
-    if (round.failure == Failure::DeviceGone) return false;
-    if (story.begins != Stage::Loaded) return true;
-    // Kept: what is read at once is in the order of the bus, and the camera is set up by it.
-    if (round.failure == Failure::AnsweredAtOnce) return round.code != FW_IOCTL_ASYNC_READ;
-    // Kept: a thread that cannot be made is not noticed, and a camera without it has no images.
-    return round.failure != Failure::NoMemory;
-}
-
 /// One round, from load to release.
 class Runner {
   public:
-    Runner(std::size_t cameraIndex, std::size_t storyIndex)
-        : camera(SweepCameras[cameraIndex]), story(Stories[storyIndex]), client(GetClient()) {
+    /// `goodImage` as CountedStory has it.
+    Runner(std::size_t cameraIndex, std::size_t storyIndex, std::uint64_t goodImage = 0)
+        : camera(SweepCameras[cameraIndex]),
+          story(Stories[storyIndex]),
+          client(GetClient()),
+          image(goodImage) {
         SetWaitClockDivisor(WaitDivisor);
         SelectCamera(cameraIndex);
     }
@@ -139,12 +77,16 @@ class Runner {
     bool Prepare();
     void Run(bool isPatient);
     void CheckResults(const CountedStory* expected);
+    void CheckStream(const Round* round, const CountedStory& counted);
     void CheckIsTold(const Round& round, const CountedStory& counted);
     void CheckIsToldOrDone(const CountedStory& counted);
     void CheckWhatIsLeft(const Round* round);
     std::vector<ZentaraResult> GetResults() const;
     /// Of the story alone.
     std::uint64_t GetAnswers() const { return client.GetAnswers(); }
+    Client::FinishedFrames GetFinished() const { return client.GetFinished(); }
+    /// Of the grabs behind it.
+    std::uint64_t GetImage() const { return image; }
 
     std::vector<std::string> problems;
 
@@ -153,6 +95,10 @@ class Runner {
     template <typename Work>
     void RunBounded(const char* what, Work work);
     bool HasGoodCalls(std::size_t from, const char* where);
+    bool IsToldByACall(const CountedStory& counted) const;
+    void Begin();
+    void CheckImage(const char* where);
+    void StreamShortly(const char* where);
     void CloseForGood(const Round* round);
     void TakeEveryLock();
     void LoadStill();
@@ -165,8 +111,14 @@ class Runner {
     const Story& story;
     Client& client;
     std::size_t firstCall = 0;  ///< Of the story.
+    std::uint64_t image;        ///< 0 before the first.
     const std::uint32_t reclaimedAtBegin = CountReclaimed();
 };
+
+/// The calls that finish a single frame want one that is not finished.
+void Runner::Begin() {
+    client.Begin(camera.imageFormat, story.begins == Stage::Grabbed ? 0 : camera.finishedFormat);
+}
 
 bool Runner::Prepare() {
     client.Reset();
@@ -175,7 +127,7 @@ bool Runner::Prepare() {
     if (story.begins > Stage::Loaded) {
         client.List();
         client.Open();
-        client.Begin(camera.imageFormat);
+        Begin();
     }
     if (story.begins == Stage::Grabbed) client.Grab();
     if (story.begins == Stage::Streaming) client.StartStream();
@@ -222,18 +174,31 @@ void Runner::CheckResults(const CountedStory* expected) {
     if (client.GetStrangeFrameCode() != 0) {
         Complain("a frame has the code " + std::to_string(client.GetStrangeFrameCode()));
     }
-    if (expected == nullptr || GetResults() == expected->results) return;
+    if (expected == nullptr) return;
+    if (client.GetAnswers() != expected->answers) {
+        Complain("an answer is not that without the failure");
+    }
+    if (GetResults() == expected->results) return;
     std::string text = "the calls do not answer as without the failure:";
     for (const ZentaraResult result : GetResults()) text += " " + std::to_string(result);
     Complain(text);
 }
 
+/// A code of a call that has none without the failure. What only an abort has ended tells nothing.
+bool Runner::IsToldByACall(const CountedStory& counted) const {
+    for (std::size_t i = firstCall; i < client.CountCalls(); ++i) {
+        const Client::Call& call = client.GetCall(i);
+        if (call.result == zerrNone || call.wasAborted) continue;
+        const std::size_t number = i - firstCall;
+        const bool isUsual = number < counted.results.size() && counted.results[number] != zerrNone;
+        if (!isUsual) return true;
+    }
+    return false;
+}
+
 /// A failure that a call of the story must answer with a code.
 void Runner::CheckIsTold(const Round& round, const CountedStory& counted) {
-    if (!MustBeTold(round, counted)) return;
-    for (const ZentaraResult result : GetResults()) {
-        if (result != zerrNone) return;
-    }
+    if (!MustBeTold(round, counted) || IsToldByACall(counted)) return;
     if (!client.HasCamera()) return;  // left out of the list
     char text[80];
     std::snprintf(text, sizeof text, "no call tells of it (register 0x%X)",
@@ -245,10 +210,13 @@ void Runner::CheckIsTold(const Round& round, const CountedStory& counted) {
 void Runner::CheckIsToldOrDone(const CountedStory& counted) {
     const std::vector<ZentaraResult> results = GetResults();
     if (counted.results.empty()) return;  // not counted: a process's first story
-    const bool isTold =
-        std::any_of(results.begin(), results.end(), [](auto result) { return result != 0; });
-    if (isTold || !client.HasCamera() || client.HasFrameWithError()) return;
+    if (IsToldByACall(counted) || !client.HasCamera() || client.HasFrameWithError()) return;
+    if (MayMissImage(story)) return;
     if (results != counted.results) Complain("memory is missing: calls are left out");
+    const Client::FinishedFrames finished = client.GetFinished();
+    if (finished[0] != counted.finished[0] && finished[1] != counted.finished[1]) {
+        Complain("memory is missing once, and two finished frames are others");
+    }
     if (client.GetAnswers() != counted.answers) {
         Complain("memory is missing: no call tells of it, and an answer is another");
     }
@@ -262,6 +230,26 @@ void Runner::CheckIsToldOrDone(const CountedStory& counted) {
                       request.code, request.address);
         Complain(text);
     }
+}
+
+/// All queued frames come, and the changes among them are made, unless the failure may keep them.
+void Runner::CheckStream(const Round* round, const CountedStory& counted) {
+    if (story.name != "stream") return;
+    const Client::StreamOutcome stream = client.GetStream();
+    const bool isWhole = stream.served == Client::FrameCount && stream.damaged == 0;
+    bool isGood = isWhole && stream.unchanged == 0 && stream.changed >= LeastChanges;
+    if (GetFailedCode() != 0 && !IsHarmless(*round)) {
+        if (MayEndStream(*round) || IsToldByACall(counted)) return;
+        isGood = stream.unchanged != 0 ? isWhole || IsStreamStopped(*round)
+                                       : isWhole && IsUntoldInStream(*round);
+    }
+    // Kept: without memory a start, a change or the stream's own thread may end it without a word.
+    if (HasRefusedAllocation()) return;
+    if (isGood) return;
+    Complain("of " + std::to_string(stream.queued) + " frames " + std::to_string(stream.served) +
+             " come, " + std::to_string(stream.damaged) + " damaged; " +
+             std::to_string(stream.changed) + " changes are made, " +
+             std::to_string(stream.unchanged) + " have failed");
 }
 
 template <typename Work>
@@ -312,15 +300,13 @@ void Runner::UseStill(const Round* round) {
     if (!client.IsOpen() || story.ends != Stage::Opened) return;
     if (round != nullptr && !LeavesAWorkingCamera(*round, story)) return;
     const std::size_t from = client.CountCalls();
-    client.Begin(camera.imageFormat);
+    Begin();
     // Kept: a stop may leave an image behind, a damaged one too; the next stream begins with it.
     client.Grab();
     client.Grab();
     if (!HasGoodCalls(from, "used further")) return;
-    if (client.GetGrabbed().errorCode != zerrNone || client.GetGrabbed().width == 0) {
-        Complain("used further: the frame is bad, error " +
-                 std::to_string(client.GetGrabbed().errorCode));
-    }
+    CheckImage("used further");
+    if (HasStreamed(story) || story.begins == Stage::Loaded) StreamShortly("used further");
 }
 
 void Runner::UseAgain(const char* where) {
@@ -329,15 +315,41 @@ void Runner::UseAgain(const char* where) {
     if (!client.HasCamera()) return Complain(std::string(where) + ": no camera is listed");
     client.Open();
     const std::uint32_t reclaimed = CountReclaimed();
-    client.Begin(camera.imageFormat);
+    Begin();
     client.Grab();
-    client.Close();
-    if (!HasGoodCalls(from, where)) return;
-    CheckReclaimed(reclaimed, where);
-    if (client.GetGrabbed().errorCode != zerrNone || client.GetGrabbed().width == 0) {
-        Complain(std::string(where) + ": the frame is bad");
+    if (HasGoodCalls(from, where)) {
+        CheckImage(where);
+        if (HasStreamed(story)) StreamShortly(where);
     }
+    const std::size_t last = client.CountCalls();
+    client.Close();
+    if (!HasGoodCalls(last, where)) return;
+    CheckReclaimed(reclaimed, where);
     if (CountOpenDevices() != 0) Complain(std::string(where) + ": a device is left open");
+}
+
+/// The scene stands still: every good image is the same.
+void Runner::CheckImage(const char* where) {
+    const Zentara_Frame& grabbed = client.GetGrabbed();
+    if (grabbed.errorCode != zerrNone || grabbed.width == 0) {
+        Complain(std::string(where) + ": the frame is bad, error " +
+                 std::to_string(grabbed.errorCode));
+        return;
+    }
+    if (image == 0) image = client.GetImage();
+    if (image != client.GetImage()) Complain(std::string(where) + ": the image is another");
+}
+
+void Runner::StreamShortly(const char* where) {
+    const std::size_t from = client.CountCalls();
+    client.StreamShortly();
+    if (!HasGoodCalls(from, where)) return;
+    const Client::StreamOutcome stream = client.GetStream();
+    // Kept: the stop of the grab may have left a damaged one behind.
+    if (stream.served == stream.queued && stream.damaged <= 1) return;
+    Complain(std::string(where) + ": of " + std::to_string(stream.queued) + " frames " +
+             std::to_string(stream.served) + " come, " + std::to_string(stream.damaged) +
+             " damaged");
 }
 
 /// The driver takes back what a closed handle has reserved, which hides that nobody has freed it.
@@ -392,28 +404,6 @@ void Runner::CheckWhatIsLeft(const Round* round) {
     }
 }
 
-struct Belongings {
-    std::size_t threads = CountEntries("/proc/self/task");
-    std::size_t files = CountEntries("/proc/self/fd");
-};
-
-/// What the process has when no library is loaded, once all helpers have begun.
-const Belongings& GetOwnBelongings() {
-    static const Belongings own;
-    return own;
-}
-
-void CheckBelongings(const Belongings& own, std::vector<std::string>* problems) {
-    Belongings now;
-    const bool isBack = WaitUntil([&] {
-        now = Belongings{};
-        return now.threads <= own.threads && now.files <= own.files;
-    });
-    if (isBack) return;
-    problems->push_back("left behind: " + std::to_string(now.threads - own.threads) +
-                        " threads and " + std::to_string(now.files - own.files) + " files");
-}
-
 std::size_t FindStory(std::string_view name) {
     const auto* const found = std::find_if(std::begin(Stories), std::end(Stories),
                                            [&](const Story& story) { return story.name == name; });
@@ -458,7 +448,7 @@ constexpr RequestFailure ConvertFailure(Failure failure) {
 }
 
 RoundOutcome RunStory(const Round& round, const CountedStory& counted) {
-    Runner runner(round.camera, round.story);
+    Runner runner(round.camera, round.story, counted.image);
     RoundOutcome outcome;
     if (runner.Prepare()) {
         const bool isRequest = round.failure != Failure::NoMemory;
@@ -469,6 +459,7 @@ RoundOutcome RunStory(const Round& round, const CountedStory& counted) {
         EndRequests();
         outcome.code = GetFailedCode();
         runner.CheckResults(IsHarmless(round) ? &counted : nullptr);
+        runner.CheckStream(&round, counted);
         if (outcome.hasFailed) runner.CheckIsTold(round, counted);
         const bool missesMemory = outcome.hasFailed && !isRequest;
         if (missesMemory && TellsOfMissingMemory(Stories[round.story])) {
@@ -510,9 +501,12 @@ CountedStory CountStory(std::size_t camera, std::size_t story) {
         }
         counted.results = runner.GetResults();
         counted.answers = runner.GetAnswers();
+        counted.finished = runner.GetFinished();
+        runner.CheckStream(nullptr, counted);
     }
     runner.CheckResults(nullptr);
     runner.CheckWhatIsLeft(nullptr);
+    counted.image = runner.GetImage();
     counted.problems = runner.problems;
     counted.problems.insert(counted.problems.end(), problems.begin(), problems.end());
     CheckBelongings(GetOwnBelongings(), &counted.problems);

@@ -41,6 +41,8 @@ struct Round {
 struct CountedStory {
     std::vector<ZentaraResult> results;
     std::uint64_t answers = 0;  ///< Client::GetAnswers of it.
+    Client::FinishedFrames finished{};
+    std::uint64_t image = 0;  ///< Client::GetImage of every good grab.
     std::vector<CountedRequest> requests[std::size(AllSeries)];
     std::int64_t allocations = 0;
     std::vector<std::string> problems;

@@ -15,26 +15,26 @@ constexpr std::string_view OtherCamera =
     R"(, {"model": "Folary", "sensor": {"width": 64, "height": 48, "noise": false}})";
 
 const SweepCamera SweepCameras[16] = {
-    {"mono", "mono", "", "", zfmtMono8, "", true},
-    {"old", "old", "", "", zfmtMono8, "", true},
-    {"rotated", "rotated", "", R"(, "idlePackets": false)", zfmtMono16, "", true},
-    {"folary", "folary", "", "", zfmtBayer8, "", true},
-    {"metrona", "metrona", "", R"(, "idlePackets": false)", zfmtMono16, "", true},
-    {"intensified", "intensified", "", R"(, "writes": "atOnce")", zfmtMono8, "", true},
+    {"mono", "mono", "", "", zfmtMono8, "", 0, true},
+    {"old", "old", "", "", zfmtMono8, "", 0, true},
+    {"rotated", "rotated", "", R"(, "idlePackets": false)", zfmtMono16, "", 0, true},
+    {"folary", "folary", "", "", zfmtBayer8, "", zfmtRGB24, true},
+    {"metrona", "metrona", "", R"(, "idlePackets": false)", zfmtMono16, "", 0, true},
+    {"intensified", "intensified", "", R"(, "writes": "atOnce")", zfmtMono8, "", 0, true},
     {"colour", "colour", "", R"(, "versions": {"status": "1.1", "command": "1.1"})", zfmtBayer8, "",
-     true},
+     zfmtRGB24, true},
     {"wheel", "model:SolvaneG2", "", R"(, "versions": {"control": "2.3", "configuration": "2.7"})",
-     zfmtRGBPlane8, "", true},
-    {"s400", "model:SolvaneF1", "", R"(, "speed": 400, "streamingVersion": 0)", zfmtMono16, "",
+     zfmtRGBPlane8, "", zfmtRGB24, true},
+    {"s400", "model:SolvaneF1", "", R"(, "speed": 400, "streamingVersion": 0)", zfmtMono16, "", 0,
      true},
-    {"tirel", "model:TirelM1", "", R"(, "streamingVersion": 2)", zfmtMono8, "", true},
-    {"dithered", "model:PellanB1", "", "", zfmtMono16, "", false},
-    {"multiplied", "model:SolvaneJ1", "", "", zfmtMono8, "", false},
+    {"tirel", "model:TirelM1", "", R"(, "streamingVersion": 2)", zfmtMono8, "", 0, true},
+    {"dithered", "model:PellanB1", "", "", zfmtMono16, "", 0, false},
+    {"multiplied", "model:SolvaneJ1", "", "", zfmtMono8, "", 0, false},
     // By its sensor it answers as another model.
-    {"masked", "mono", R"(, "id": 46)", "", zfmtMono8, "", false},
-    {"two", "mono", "", "", zfmtMono8, OtherCamera, false},
-    {"logged", "mono", "", "", zfmtMono8, "", false, LogTarget::File},
-    {"told", "mono", "", "", zfmtMono8, "", false, LogTarget::DebuggerOutput},
+    {"masked", "mono", R"(, "id": 46)", "", zfmtMono8, "", 0, false},
+    {"two", "mono", "", "", zfmtMono8, OtherCamera, 0, false},
+    {"logged", "mono", "", "", zfmtMono8, "", 0, false, LogTarget::File},
+    {"told", "mono", "", "", zfmtMono8, "", 0, false, LogTarget::DebuggerOutput},
 };
 
 namespace {

@@ -18,7 +18,9 @@ struct SweepCamera {
     std::string_view extra;     ///< Further keys of the camera.
     std::uint32_t imageFormat;  ///< In which the stories begin.
     std::string_view others;    ///< Further cameras.
-    bool hasAllStories;         ///< Else those that go another way with this one.
+    /// Of post-processing, which is on where it changes the frames; else none.
+    std::uint32_t finishedFormat;
+    bool hasAllStories;  ///< Else those that go another way with this one.
     LogTarget log = LogTarget::None;
 };
 
