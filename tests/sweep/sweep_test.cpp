@@ -239,6 +239,9 @@ class Sweeper {
         return RunRound(round, plan.stories.at({round.camera, round.story}));
     }
     static bool MustBeReached(const Round& round);
+    static bool IsMissed(const Round& round, const RoundOutcome& outcome) {
+        return !outcome.hasFailed && outcome.problems.empty() && MustBeReached(round);
+    }
 
     const Plan& plan;  // borrowed from the test
     Tally tally;
@@ -260,10 +263,9 @@ bool Sweeper::MustBeReached(const Round& round) {
 
 void Sweeper::Run(const Round& round) {
     RoundOutcome outcome = RunOnce(round);
-    if (!outcome.hasFailed && outcome.problems.empty() && MustBeReached(round)) {
-        outcome = RunOnce(round);
-        if (!outcome.hasFailed) outcome.problems.emplace_back("what is to fail does not come");
-    }
+    // The last allocations of an opening are those of its threads, which may come too late.
+    for (int i = 0; i < ExtraRoundsMax && IsMissed(round, outcome); ++i) outcome = RunOnce(round);
+    if (IsMissed(round, outcome)) outcome.problems.emplace_back("what is to fail does not come");
     // What is made once and stays is no leak.
     if (outcome.leaked != 0 && RunOnce(round).leaked != 0) {
         outcome.problems.push_back(std::to_string(outcome.leaked) + " allocations are left");

@@ -18,11 +18,12 @@ struct UntoldWrite {
 /// Kept: their results are dropped. Of the first setup: the order of bytes, the region that a
 /// change of the binning brings along, the analogue registers. Of a start: the parameter set
 /// number. Of a send: bit depth, that region, real-time video, the wheel and the tweaked register.
+/// A balance sends.
 constexpr UntoldWrite UntoldWrites[] = {
     {"grab", "", 1, 1},   {"balance", "", 1, 1},     {"stream", "", 1, 1},
     {"list", "", 1, 1},   {"list", "", 3, 4},        {"list", "tirel", 34, 40},
     {"send", "", 1, 1},   {"send", "", 3, 4},        {"send", "folary", 2, 2},
-    {"send", "", 12, 12}, {"send", "tirel", 35, 35},
+    {"send", "", 12, 12}, {"send", "tirel", 35, 35}, {"balance", "wheel", 12, 12},
 };
 constexpr std::uint32_t ControlAddress = 0xD0002000;
 constexpr std::uint32_t SetNumberAddress = 0xD0002004;
