@@ -120,12 +120,10 @@ bool SoakedCamera::Judge(const char* call, ZentaraResult result,
     return Tell(call, result, CountFailedRequests().all != failedBefore.all);
 }
 
-/// Of a stream that was to end: a request has failed since `failedAtStop`, or the loop has left by
-/// itself, as it does when a buffer cannot be attached.
+/// Of a stream that was to end. A change stops and starts it as well, tells nothing of what fails
+/// in that start, and leaves it to the end that comes behind.
 bool SoakedCamera::JudgeEnd(const char* call, ZentaraResult result) {
-    const FailedRequests failed = CountFailedRequests();
-    return Tell(call, result,
-                failed.all != failedAtStop.all || failed.refused != failedAtStream.refused);
+    return Judge(call, result, failedAtStream);
 }
 
 /// For a call that sends no request, or none that may fail.
@@ -415,16 +413,14 @@ void SoakedCamera::CountChanges() {
 
 bool SoakedCamera::BeginStream() {
     stream = ZentaraProgram::StreamSums(1);
-    failedAtStream = failedAtStop = CountFailedRequests();
+    if (!hasTrouble) failedAtStream = CountFailedRequests();
     const ZentaraResult begun = Zentara_SetStreaming(handle, 1);
-    hasTrouble = begun != zerrNone;
+    if (begun != zerrNone) hasTrouble = true;
     return Judge("Zentara_SetStreaming", begun, failedAtStream);
 }
 
-/// What has failed to begin or to end in good order may fail to end once more, for the same reason.
 /// The stream of a camera that is gone cannot be stopped in good order.
 bool SoakedCamera::EndStream() {
-    if (!hasTrouble) failedAtStop = CountFailedRequests();
     const ZentaraResult stopped = Zentara_SetStreaming(handle, 0);
     if (stopped != zerrNone) hasTrouble = true;
     return !isPlugged || JudgeEnd("the stop", stopped);

@@ -116,9 +116,10 @@ class SoakedCamera {
     std::uint64_t taken = 0;
     std::atomic<std::uint32_t> opening{0};
     std::atomic<bool> isPlugged{true};
-    /// When this opening was listed, when its stream began, and when that was to end.
-    FailedRequests failedAtOpening, failedAtStream, failedAtStop;
-    bool hasTrouble = false;          ///< The stream has failed to begin or to end.
+    /// When this opening was listed, and when its stream began: the first one that has failed to
+    /// begin or to end, since the next may fail for the same reason.
+    FailedRequests failedAtOpening, failedAtStream;
+    bool hasTrouble = false;          ///< There is such a stream.
     std::uint32_t failedCounted = 0;  ///< Of all, those taken over into the sums.
     std::uint64_t served = 0;
     ZentaraProgram::StreamSums stream{1};
