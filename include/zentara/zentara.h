@@ -722,10 +722,10 @@ ZENTARA_API ZentaraResult Zentara_GetCameraModelString(ZentaraHandle handle, cha
  * The frame's errorCode tells any trouble with the image, the result does not: an image that the
  * camera's filter wheel or post-processing made larger than bufferSize gives result 0, errorCode
  * zerrBufferTooSmall, size 0 and untouched pixels, with width, height and format telling what was
- * needed. The same code with a size that is not 0 is no matter of bufferSize: the library has been
- * too short of memory for the image. It comes as far as it got, by width, height and format of a
- * single colour of the wheel or still a mosaic, and is not to be relied on; the next one is whole
- * if there is memory again. Frames of a stream tell of both in the same way.
+ * needed. The same code with a size that is not 0 is no matter of bufferSize: the camera has sent
+ * more than the frame holds, or the library has been too short of memory for the image, which then
+ * comes as far as it got, by width, height and format of a single colour of the wheel or still a
+ * mosaic. It is not to be relied on. Frames of a stream tell of all this in the same way.
  *
  * 8 not loaded; 9 `handle` null; 2 `frame` null; 9 not open; 9 open in another process; 21 the
  * queue is not empty; 18 bufferSize is smaller than the camera's image; a camera's failure (15, 16
