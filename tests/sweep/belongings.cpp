@@ -42,8 +42,9 @@ void CheckBelongings(const Belongings& own, std::vector<std::string>* problems) 
         return now.threads <= own.threads && now.files <= own.files;
     });
     if (isBack) return;
-    problems->push_back("left behind: " + std::to_string(now.threads - own.threads) +
-                        " threads and " + std::to_string(now.files - own.files) + " files");
+    problems->push_back("left behind: " + std::to_string(now.threads) + " threads where " +
+                        std::to_string(own.threads) + " were, " + std::to_string(now.files) +
+                        " files for " + std::to_string(own.files));
 }
 
 Watchdog::Watchdog(const std::string& text) {

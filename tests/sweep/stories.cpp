@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <mutex>
 #include <thread>
+#include <utility>
 
 #include "memory/failing_allocator.h"
 #include "support/rounds.h"
@@ -20,6 +21,8 @@ namespace {
 using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
+/// Patience is counted in spells, so that a machine which stands still for longer uses up one.
+constexpr milliseconds Spell(5);
 /// How long a client waits for an image once something has failed, if it is not patient.
 constexpr milliseconds ShortPatience(IsSanitized ? 400 : 60);
 /// Far more than any story takes.
@@ -75,6 +78,7 @@ class Aborter {
         isArmed = true;
         hasAborted = false;
         armedAt = Clock::now();
+        spells = 0;
         changed.notify_all();
     }
     void Disarm() {
@@ -90,14 +94,18 @@ class Aborter {
   private:
     Aborter() : thread([this] { Run(); }) {}
 
-    bool HasWaitedEnough() const { return Clock::now() - armedAt > client->GetPatience(); }
+    /// Looked at once in a spell.
+    bool HasWaitedEnough() {
+        spells = HasSomethingFailed() ? spells + 1 : 0;
+        return spells * Spell > client->GetPatience() || Clock::now() - armedAt > LongPatience;
+    }
     void Run() {
         const UncountedAllocations uncounted;
         std::unique_lock lock(mutex);
         while (true) {
             changed.wait(lock, [this] { return isArmed; });
             // An abort before the wait for the image does not count, so it is repeated.
-            (void)changed.wait_for(lock, milliseconds(5), [this] { return !isArmed; });
+            (void)changed.wait_for(lock, Spell, [this] { return !isArmed; });
             if (!isArmed || !HasWaitedEnough()) continue;
             isAborting = hasAborted = true;
             lock.unlock();
@@ -114,6 +122,7 @@ class Aborter {
     bool isArmed = false;
     bool isAborting = false, hasAborted = false;
     Clock::time_point armedAt;
+    int spells = 0;  ///< Since something failed.
     std::thread thread;
 };
 
@@ -313,7 +322,7 @@ std::uint32_t Client::GetStrangeFrameCode() const {
 void Client::BeginQueue() {
     queued = 0;
     served = damaged = 0;
-    changed = unchanged = 0;
+    changed = unchanged = changesDue = 0;
 }
 
 void Client::QueueFrame(std::size_t index) {
@@ -338,18 +347,22 @@ void Client::QueueAll() {
         QueueFrame(i);
         if (i % 5 == 4) QueueChange(i / 5);
     }
+    changesDue = ChangesDue;
 }
 
 void Client::AwaitFrames() const {
-    std::uint32_t lastServed = served;
-    auto lastChange = Clock::now();
+    std::uint32_t lastCome = 0;
+    int spells = 0;
+    auto spellBegan = Clock::now();
     // What was asked for may be dropped for good once something has failed.
     (void)WaitUntil(
         [&] {
-            if (served >= queued) return true;
-            if (served != lastServed) lastChange = Clock::now();
-            lastServed = served;
-            return Clock::now() - lastChange > GetPatience();
+            const std::uint32_t changes = changed + unchanged;
+            if (served >= queued && changes >= changesDue) return true;
+            if (std::exchange(lastCome, served + changes) != served + changes) spells = 0;
+            if (Clock::now() - spellBegan < Spell) return false;
+            spellBegan = Clock::now();
+            return ++spells * Spell > GetPatience();
         },
         2 * LongPatience);
 }

@@ -19,6 +19,9 @@ class Client {
     static constexpr std::uint32_t Width = 64;
     static constexpr std::uint32_t Height = 48;
     static constexpr std::size_t FrameCount = 20;
+    /// Of the four changes of a stream. Kept: the one behind the last frame waits for an exposure
+    /// that may not come.
+    static constexpr std::uint32_t ChangesDue = 3;
 
     struct Call {
         const char* name;
@@ -139,7 +142,7 @@ class Client {
     Zentara_Settings others{};
     std::array<Zentara_Settings, 4> changes{};
     std::array<Frame, FrameCount> frames;
-    std::uint32_t queued = 0;
+    std::uint32_t queued = 0, changesDue = 0;
     bool isPatient = true;
     std::atomic<std::uint32_t> served{0}, damaged{0};
     std::atomic<std::uint32_t> changed{0}, unchanged{0};

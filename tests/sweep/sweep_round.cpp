@@ -33,8 +33,6 @@ constexpr milliseconds CallLimit(IsSanitized ? 20'000 : 5'000);
 constexpr std::uint64_t WaitedLimitMs = 30'000;
 /// The client that aborts, and the driver's thread that ends late requests.
 constexpr std::size_t HelperThreads = 2;
-/// Kept: a change behind the last frame waits for an exposure that may not come.
-constexpr std::uint32_t LeastChanges = 3;
 constexpr std::int64_t NoAllocation = std::int64_t{1} << 40;
 
 constexpr ZentaraResult KnownResults[] = {
@@ -237,7 +235,7 @@ void Runner::CheckStream(const Round* round, const CountedStory& counted) {
     if (story.name != "stream") return;
     const Client::StreamOutcome stream = client.GetStream();
     const bool isWhole = stream.served == Client::FrameCount && stream.damaged == 0;
-    bool isGood = isWhole && stream.unchanged == 0 && stream.changed >= LeastChanges;
+    bool isGood = isWhole && stream.unchanged == 0 && stream.changed >= Client::ChangesDue;
     if (GetFailedCode() != 0 && !IsHarmless(*round)) {
         if (MayEndStream(*round) || IsToldByACall(counted)) return;
         isGood = stream.unchanged != 0 ? isWhole || IsStreamStopped(*round)
