@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <atomic>
 #include <memory>
+#include <set>
 #include <string>
 #include <thread>
 #include <utility>
@@ -36,15 +37,17 @@ void ExpectCallbacksInOrder(const std::vector<FlowEvent>& events) {
     }
 }
 
-/// Change n was queued behind frame n.
+/// Change n was queued behind frame n. Kept: the exposure callbacks of two frames may meet, one of
+/// them made up for by its image.
 void ExpectChangesBehindTheirFrames(const std::vector<FlowEvent>& events) {
-    std::uint32_t exposed = 0;
+    std::set<std::uint32_t> exposed;
     std::uint32_t nextChange = 0;
     for (const FlowEvent& event : events) {
-        if (event.kind == FlowEvent::Kind::Exposure) exposed = event.userData + 1;
+        if (event.kind == FlowEvent::Kind::Exposure) exposed.insert(event.userData);
         if (event.kind != FlowEvent::Kind::Settings) continue;
         EXPECT_EQ(nextChange, event.userData) << "a change came out of turn";
-        EXPECT_LT(event.userData, exposed) << "a change came before its frame was exposed";
+        EXPECT_EQ(1U, exposed.count(event.userData))
+            << "change " << event.userData << " came before its frame was exposed";
         EXPECT_ZERR(zerrNone, event.errorCode);
         nextChange = event.userData + 1;
     }
