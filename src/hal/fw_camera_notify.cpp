@@ -52,14 +52,15 @@ HALStatus FWCameraEnableNotification(HALCamera camera) {
     FWDeviceContext* const context = GetFWContext(camera);
     if (context == nullptr || !context->device.IsOpen()) return HALDeviceNotOpen;
     if (!EndNotification(*context)) return HALWriteFailed;
-    const MutexHold hold(context->deviceMutex);
-    if (!SendPlain(*context, FW_IOCTL_NOTIFY_ENABLE)) return HALWriteFailed;
     std::unique_ptr<NotificationRequest> request(new (std::nothrow) NotificationRequest);
     if (request == nullptr || request->overlapped == nullptr) return HALWriteFailed;
+    const MutexHold hold(context->deviceMutex);
+    if (!SendPlain(*context, FW_IOCTL_NOTIFY_ENABLE)) return HALWriteFailed;
     context->notification = std::move(request);
     context->notifying.store(1, std::memory_order_relaxed);
     (void)HAL_ThreadCreate(RunNotificationLoop, context, &context->notifyThread);
     if (IsHALThreadStarted(context->notifyThread)) return HALOk;
+    (void)SendPlain(*context, FW_IOCTL_NOTIFY_DISABLE);  // there is nobody to be told
     return EndNotification(*context) ? HALWriteFailed : HALThreadNotTerminated;
 }
 

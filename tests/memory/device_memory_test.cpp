@@ -2,13 +2,16 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <new>
 #include <string>
 #include <string_view>
 #include <thread>
+#include <vector>
 
 #include "camera/test_camera.h"
+#include "hal/control_records.h"
 #include "hal/frame_gate.h"
 #include "hal/fw_camera.h"
 #include "hal/fw_device_context.h"
@@ -135,6 +138,10 @@ TEST(DeviceWithoutMemory, ForItsNotificationsSaysSoAndCanBeEnabledLater) {
         EXPECT_EQ(hasRefused ? HALWriteFailed : HALOk, status);
         EXPECT_EQ(hasRefused ? 0 : 1, context.notifying.load());
         EXPECT_EQ(hasRefused, context.notifyThread == nullptr);
+        const std::vector<std::uint32_t> codes = hal.TakeCodes();
+        const auto enabled = std::count(codes.begin(), codes.end(), FW_IOCTL_NOTIFY_ENABLE);
+        const auto disabled = std::count(codes.begin(), codes.end(), FW_IOCTL_NOTIFY_DISABLE);
+        EXPECT_EQ(hasRefused ? 0 : 1, enabled - disabled) << "the driver notifies nobody";
         refused += hasRefused ? 1 : 0;
     }
     EXPECT_FALSE(hasRefused);
