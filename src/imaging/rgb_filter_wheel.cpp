@@ -210,7 +210,7 @@ FilterResult ZRGBFilterWheel::Collect(const ZInImageBufferStruct& in, ZOutImageB
     if (in.camera == nullptr || in.camera->GetImageFormat() != CameraRGBFilter) {
         return FilterDeclined;
     }
-    if (lacksPlanes) MakePlanes(widthMax, heightMax);
+    if (lackedPlaneBytes != 0) MakePlanesOf(lackedPlaneBytes);
     if (!IsInTurn(in)) return FilterNothingYet;
     const FilterResult stored = Store(in);
     if (stored != FilterDone) return stored;
@@ -288,22 +288,26 @@ void ZRGBFilterWheel::DropSet() {
 }
 
 void ZRGBFilterWheel::MakePlanes(std::uint32_t width, std::uint32_t height) {
+    MakePlanesOf(std::uint64_t{width} * height * SampleBytesMax);
+}
+
+void ZRGBFilterWheel::MakePlanesOf(std::uint64_t planeBytes) {
     if (buffersAllocated) return;
     // A frame that came while there were none may have begun a set.
     DropSet();
-    const std::uint64_t planeBytes = std::uint64_t{width} * height * SampleBytesMax;
     if (planeBytes == 0) return;
     buffersAllocated = std::all_of(shots.begin(), shots.end(), [planeBytes](Shot& shot) {
         return shot.plane.AllocateAhead(planeBytes);
     });
-    if (!buffersAllocated) FreePlanes();
-    lacksPlanes = !buffersAllocated;
+    if (buffersAllocated) return;
+    FreePlanes();
+    lackedPlaneBytes = planeBytes;
 }
 
 void ZRGBFilterWheel::FreePlanes() {
     for (Shot& shot : shots) shot.plane.Free();
     buffersAllocated = false;
-    lacksPlanes = false;
+    lackedPlaneBytes = 0;
 }
 
 }  // namespace ZV

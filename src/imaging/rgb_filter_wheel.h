@@ -73,6 +73,7 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     FilterResult Pack(const ZInImageBufferStruct& in, ZOutImageBufferStruct& out) const;
     void DropSet();
     void MakePlanes(std::uint32_t width, std::uint32_t height);
+    void MakePlanesOf(std::uint64_t planeBytes);
     void FreePlanes();
 
     std::atomic<std::uint32_t> outputFormat;
@@ -82,7 +83,7 @@ class ZENTARA_API ZRGBFilterWheel : public ZImageFilter {
     std::uint16_t nextColour = 0;
     std::array<Shot, 3> shots;  // Red, green, blue.
     bool buffersAllocated = false;
-    bool lacksPlanes = false;  // For want of memory when they were to be made.
+    std::uint64_t lackedPlaneBytes = 0;  // Of each, for want of memory when they were to be made.
     std::uint32_t widthMax = 0;
     std::uint32_t heightMax = 0;
 };

@@ -275,6 +275,20 @@ TEST_F(WheelWithoutMemory, TellsOfEachFrameUntilThereIsSome) {
     EXPECT_EQ(1, wheel.GetRedCount());
 }
 
+TEST_F(WheelWithoutMemory, MakesPlanesOfTheSizeThatThereWasNoneFor) {
+    pipeline.Setup(4, 2);
+    (void)wheel.Init(1, 1);
+    wheel.FreeBuffers();
+    BeginAllocations(1);
+    (void)wheel.AllocateBuffers(4, 2);
+    ASSERT_TRUE(EndAllocations());
+    pipeline.AddFilter(&bystander);
+
+    EXPECT_EQ(FilterNothingYet, Take(PatternRed));
+    EXPECT_EQ(1, wheel.GetRedCount());
+    EXPECT_EQ(FrameStatusGood, image.GetErrorCode());
+}
+
 TEST_F(WheelWithoutMemory, MakesNoPlanesThatWereLetGoOnPurpose) {
     pipeline.Setup(4, 2);
     (void)wheel.Init(4, 2);
