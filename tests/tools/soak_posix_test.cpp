@@ -232,11 +232,11 @@ TEST(Soak, RefusesMinutesThatAreNone) {
     }
 }
 
-// The entry of the loop is not looked at, so that its failure is no reason for a stop that fails.
+// What has failed before the stream began is no reason for a stop that fails.
 TEST(Soak, FailsWhenAStopFailsBehindARequestThatCannotBeTheReason) {
     const ProgramResult result =
         RunSoak({"--seconds", "3", "--cameras", "1", "--faults", "0", "--request-faults", "0",
-                 "--fault", R"({"kind": "failRequest", "code": "FW_IOCTL_STREAM_ENTER"})",
+                 "--fault", R"({"kind": "failRequest", "code": "FW_IOCTL_ALLOC_RESOURCES"})",
                  "--fault", R"({"kind": "unplug", "code": "FW_IOCTL_STOP", "request": 1})"});
 
     EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
