@@ -23,7 +23,7 @@ using std::chrono::milliseconds;
 
 /// Patience is counted in spells, so that a machine which stands still for longer uses up one.
 constexpr milliseconds Spell(5);
-/// How long a client waits for an image once something has failed, if it is not patient.
+/// How long a client waits for an image that may stay away once something has failed.
 constexpr milliseconds ShortPatience(IsSanitized ? 400 : 60);
 /// Far more than any story takes.
 constexpr milliseconds LongPatience(IsSanitized ? 60'000 : 20'000);
@@ -97,7 +97,7 @@ class Aborter {
     /// Looked at once in a spell.
     bool HasWaitedEnough() {
         spells = HasSomethingFailed() ? spells + 1 : 0;
-        return spells * Spell > client->GetPatience() || Clock::now() - armedAt > LongPatience;
+        return client->HasWaitedEnough(spells * Spell) || Clock::now() - armedAt > LongPatience;
     }
     void Run() {
         const UncountedAllocations uncounted;
@@ -163,8 +163,11 @@ void Client::Reset() {
     }
 }
 
-milliseconds Client::GetPatience() const {
-    return !isPatient && HasSomethingFailed() ? ShortPatience : LongPatience;
+bool Client::HasWaitedEnough(milliseconds waited) const {
+    if (waited > LongPatience) return true;
+    if (waited <= ShortPatience || mayGiveUp == nullptr || !HasSomethingFailed()) return false;
+    const UncountedAllocations uncounted;
+    return mayGiveUp();
 }
 
 ZentaraResult Client::Note(const char* name, ZentaraResult result, bool wasAborted) {
@@ -362,7 +365,7 @@ void Client::AwaitFrames() const {
             if (std::exchange(lastCome, served + changes) != served + changes) spells = 0;
             if (Clock::now() - spellBegan < Spell) return false;
             spellBegan = Clock::now();
-            return ++spells * Spell > GetPatience();
+            return HasWaitedEnough(++spells * Spell);
         },
         2 * LongPatience);
 }

@@ -5,7 +5,9 @@
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "zentara/zentara.h"
@@ -42,10 +44,12 @@ class Client {
     /// Forgets the last round. Nothing of the library may know of it any more.
     void Reset();
 
-    /// Whether calls that wait for an image soon give up: something is to fail. Else they wait for
-    /// as long as any story takes.
-    void SetPatient(bool isPatientNow) { isPatient = isPatientNow; }
-    std::chrono::milliseconds GetPatience() const;
+    /// Asked by who waits for an image in vain once something has failed: whether it may stay away.
+    /// Null: nothing may. May be asked by a thread of its own; in a story that waits for queued
+    /// frames by the caller's alone.
+    void SetGivingUp(std::function<bool()> mayGiveUpNow) { mayGiveUp = std::move(mayGiveUpNow); }
+    /// Who may not give up waits for as long as any story takes.
+    bool HasWaitedEnough(std::chrono::milliseconds waited) const;
 
     void Load();
     /// The first camera of the list, or none.
@@ -143,7 +147,7 @@ class Client {
     std::array<Zentara_Settings, 4> changes{};
     std::array<Frame, FrameCount> frames;
     std::uint32_t queued = 0, changesDue = 0;
-    bool isPatient = true;
+    std::function<bool()> mayGiveUp;
     std::atomic<std::uint32_t> served{0}, damaged{0};
     std::atomic<std::uint32_t> changed{0}, unchanged{0};
     std::atomic<std::uint32_t> strangeCode{0};

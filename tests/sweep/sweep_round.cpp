@@ -3,8 +3,10 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
+#include <functional>
 #include <iterator>
 #include <thread>
+#include <utility>
 
 #include "hal/control_records.h"
 #include "hal/platform/clock.h"
@@ -73,7 +75,9 @@ class Runner {
 
     /// False when the camera could not be brought there.
     bool Prepare();
-    void Run(bool isPatient);
+    /// `mayGiveUp` as Client::SetGivingUp has it.
+    void Run(std::function<bool()> mayGiveUp = nullptr);
+    bool MayGiveUp(const Round& round, const CountedStory& counted) const;
     void CheckResults(const CountedStory* expected);
     void CheckStream(const Round* round, const CountedStory& counted);
     void CheckIsTold(const Round& round, const CountedStory& counted);
@@ -94,6 +98,8 @@ class Runner {
     void RunBounded(const char* what, Work work);
     bool HasGoodCalls(std::size_t from, const char* where);
     bool IsToldByACall(const CountedStory& counted) const;
+    bool HasStreamedWithoutMemory(const CountedStory& counted) const;
+    bool IsStoppedWithoutMemory(const CountedStory& counted) const;
     void Begin();
     void CheckImage(const char* where);
     void StreamShortly(const char* where);
@@ -133,13 +139,13 @@ bool Runner::Prepare() {
     return HasGoodCalls(0, "before the story");
 }
 
-void Runner::Run(bool isPatient) {
-    client.SetPatient(isPatient);
+void Runner::Run(std::function<bool()> mayGiveUp) {
+    client.SetGivingUp(std::move(mayGiveUp));
     const auto run = [this] { story.run(client); };
     // Where images are waited for the client ends the call itself.
     if (story.ends == Stage::Opened) run();
     if (story.ends != Stage::Opened) RunBounded("the story", run);
-    client.SetPatient(true);
+    client.SetGivingUp(nullptr);
 }
 
 bool Runner::HasGoodCalls(std::size_t from, const char* where) {
@@ -236,18 +242,44 @@ void Runner::CheckStream(const Round* round, const CountedStory& counted) {
     const Client::StreamOutcome stream = client.GetStream();
     const bool isWhole = stream.served == Client::FrameCount && stream.damaged == 0;
     bool isGood = isWhole && stream.unchanged == 0 && stream.changed >= Client::ChangesDue;
-    if (GetFailedCode() != 0 && !IsHarmless(*round)) {
+    if (HasRefusedAllocation()) {
+        isGood = HasStreamedWithoutMemory(counted);
+    } else if (GetFailedCode() != 0 && !IsHarmless(*round)) {
         if (MayEndStream(*round) || IsToldByACall(counted)) return;
-        isGood = stream.unchanged != 0 ? isWhole || IsStreamStopped(*round)
-                                       : isWhole && IsUntoldInStream(*round);
+        if (round->series == RequestSeries::Calls) {
+            isGood = stream.unchanged != 0 ? isWhole || IsStreamStopped(*round)
+                                           : isWhole && IsUntoldInStream(*round);
+        }
     }
-    // Kept: without memory a start, a change or the stream's own thread may end it without a word.
-    if (HasRefusedAllocation()) return;
     if (isGood) return;
     Complain("of " + std::to_string(stream.queued) + " frames " + std::to_string(stream.served) +
              " come, " + std::to_string(stream.damaged) + " damaged; " +
              std::to_string(stream.changed) + " changes are made, " +
              std::to_string(stream.unchanged) + " have failed");
+}
+
+/// Missing memory costs an image at most, which says so, unless the stream may end.
+bool Runner::HasStreamedWithoutMemory(const CountedStory& counted) const {
+    const Client::StreamOutcome stream = client.GetStream();
+    const bool goesOn = stream.served == Client::FrameCount && stream.damaged <= 1 &&
+                        stream.changed >= Client::ChangesDue;
+    return goesOn || IsStoppedWithoutMemory(counted);
+}
+
+/// By a call, by a change, or in a way that nobody tells.
+bool Runner::IsStoppedWithoutMemory(const CountedStory& counted) const {
+    return IsToldByACall(counted) || client.GetStream().unchanged != 0 ||
+           MayEndWithoutMemory(counted);
+}
+
+/// Whether images may stay away, from what has happened in the round so far.
+bool Runner::MayGiveUp(const Round& round, const CountedStory& counted) const {
+    if (IsHarmless(round)) return false;
+    const bool isOfCalls =
+        round.failure == Failure::NoMemory || round.series == RequestSeries::Calls;
+    if (story.name != "stream") return isOfCalls || MayEndStream(round);
+    if (round.failure == Failure::NoMemory) return IsStoppedWithoutMemory(counted);
+    return MayEndStream(round) || IsToldByACall(counted) || (isOfCalls && IsStreamStopped(round));
 }
 
 template <typename Work>
@@ -416,7 +448,7 @@ std::vector<std::string> RunFirst() {
     Runner runner(0, FindStory("grab"));
     (void)runner.Prepare();
     BeginRequests(RequestFailure::CompletesLate, RequestSeries::Calls, 1);
-    runner.Run(true);
+    runner.Run();
     EndRequests();
     runner.CheckWhatIsLeft(nullptr);
     (void)WaitUntil([&] { return Belongings{}.threads <= before.threads + HelperThreads; });
@@ -450,9 +482,11 @@ RoundOutcome RunStory(const Round& round, const CountedStory& counted) {
     RoundOutcome outcome;
     if (runner.Prepare()) {
         const bool isRequest = round.failure != Failure::NoMemory;
+        // Made before allocations are counted.
+        std::function<bool()> mayGiveUp = [&] { return runner.MayGiveUp(round, counted); };
         BeginRequests(ConvertFailure(round.failure), round.series, isRequest ? round.number : 0);
         BeginAllocations(isRequest ? NoAllocation : static_cast<std::int64_t>(round.number));
-        runner.Run(IsHarmless(round));
+        runner.Run(std::move(mayGiveUp));
         outcome.hasFailed = EndAllocations() || GetFailedCode() != 0;
         EndRequests();
         outcome.code = GetFailedCode();
@@ -490,7 +524,7 @@ CountedStory CountStory(std::size_t camera, std::size_t story) {
     if (runner.Prepare()) {
         BeginRequests(RequestFailure::None, RequestSeries::Calls, 0);
         BeginAllocations(NoAllocation);
-        runner.Run(true);
+        runner.Run();
         counted.allocations = NoAllocation - CountAllocationsLeft();
         (void)EndAllocations();
         EndRequests();

@@ -35,6 +35,14 @@ constexpr std::uint32_t CommandAddress = 0xD0005004;
 constexpr std::uint32_t StartAddresses[] = {SetNumberAddress, 0xD0002050, TakeOverAddress,
                                             CommandAddress};
 
+/// What a start sends, a stop, or both, and nothing else does.
+constexpr CountedRequest StartRequests[] = {
+    {.code = FW_IOCTL_LISTEN},
+    {.code = FW_IOCTL_STOP},
+    {.code = FW_IOCTL_ASYNC_WRITE, .address = SetNumberAddress},
+    {.code = FW_IOCTL_ASYNC_WRITE, .address = CommandAddress},
+};
+
 bool IsUntoldWrite(std::string_view story, const SweepCamera& camera,
                    const CountedRequest& request) {
     if (request.code != FW_IOCTL_ASYNC_WRITE) return false;
@@ -63,6 +71,8 @@ bool IsUntold(const Story& story, const SweepCamera& camera, const CountedReques
 bool MustBeTold(const Round& round, const CountedStory& counted) {
     const Story& story = Stories[round.story];
     const SweepCamera& camera = SweepCameras[round.camera];
+    // Kept: a close and a release drop the results of what they end, and an automatic exposure
+    // those of its images: it goes on to the exposure in force.
     constexpr std::string_view TellingStories[] = {"list", "send", "grab", "stream", "balance"};
     const bool isFailure = round.failure == Failure::Fails ||
                            round.failure == Failure::CompletesInError ||
@@ -120,8 +130,12 @@ bool LeavesAWorkingCamera(const Round& round, const Story& story) {
 }
 
 bool MayEndStream(const Round& round) {
-    if (round.series != RequestSeries::Calls || round.failure == Failure::DeviceGone) return true;
+    if (round.failure == Failure::DeviceGone) return true;
+    // Kept: the loop leaves when a buffer that it hands back is refused.
+    if (round.series == RequestSeries::Stream) return round.failure == Failure::Fails;
+    if (round.series == RequestSeries::Switches) return false;
     const CountedRequest request = GetFailed(round);
+    if (request.code == FW_IOCTL_ASYNC_READ) return false;
     if (request.code != FW_IOCTL_ASYNC_WRITE) return true;
     return std::find(std::begin(StartAddresses), std::end(StartAddresses), request.address) !=
                std::end(StartAddresses) &&
@@ -162,6 +176,20 @@ bool MayMissImage(const Story& story) {
     const std::vector<CountedRequest> sent = GetCounted(RequestSeries::Calls);
     return std::none_of(sent.begin(), sent.end(),
                         [](const auto& request) { return request.address == SetNumberAddress; });
+}
+
+bool MayEndWithoutMemory(const CountedStory& counted) {
+    if (IsStreamThread(GetRefusedThread())) return true;
+    const std::vector<CountedRequest> sent = GetCounted(RequestSeries::Calls);
+    return std::any_of(std::begin(StartRequests), std::end(StartRequests), [&](const auto& kind) {
+        const auto isOfKind = [&](const auto& request) {
+            return request.code == kind.code && request.address == kind.address;
+        };
+        const auto count = [&](const std::vector<CountedRequest>& requests) {
+            return std::count_if(requests.begin(), requests.end(), isOfKind);
+        };
+        return count(sent) < count(counted.requests[0]);
+    });
 }
 
 std::vector<CountedRequest> ListLeftOut(const CountedStory& counted) {
