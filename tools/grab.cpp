@@ -3,6 +3,7 @@
 #include <fmt/format.h>
 
 #include <chrono>
+#include <optional>
 
 #include "capture.h"
 #include "grab_watch.h"
@@ -12,12 +13,22 @@
 namespace ZentaraProgram {
 namespace {
 
+/// From the end of an exposure on. A camera that takes longer begins an exposure that is cut off
+/// when the image has come.
+constexpr std::chrono::seconds ReadoutTime{5};
+
+/// How often a camera in the mode of the software trigger is given one. A wheel waits for one
+/// before each exposure of an image.
+std::optional<GrabWatch::Clock::duration> GetTriggerPeriod(const CaptureFacts& facts) {
+    if (!facts.isSoftwareTriggered) return std::nullopt;
+    if (facts.exposures > 1) return GrabWatch::Clock::duration::zero();
+    return ReadoutTime + std::chrono::nanoseconds(facts.exposureNs);
+}
+
 /// One image into `buffer`; `hasTimedOut` tells why none came.
 ZentaraResult Grab(const Camera& camera, const CaptureFacts& facts, double timeoutSeconds,
                    FrameBuffer* buffer, bool* hasTimedOut) {
-    const TriggerHelp help = facts.exposures > 1 ? TriggerHelp::EachImage : TriggerHelp::Once;
-    GrabWatch watch(camera.GetHandle(), timeoutSeconds,
-                    facts.isSoftwareTriggered ? help : TriggerHelp::None);
+    GrabWatch watch(camera.GetHandle(), timeoutSeconds, GetTriggerPeriod(facts));
     const ZentaraResult result = Zentara_GrabFrame(camera.GetHandle(), &buffer->frame);
     watch.Finish();
     *hasTimedOut = watch.HasAborted();

@@ -5,13 +5,13 @@
 namespace ZentaraProgram {
 namespace {
 
-using Clock = std::chrono::steady_clock;
 constexpr std::chrono::milliseconds Poll{50};
 
 }  // namespace
 
-GrabWatch::GrabWatch(ZentaraHandle handle, double timeoutSeconds, TriggerHelp triggerHelp)
-    : camera(handle), limit(timeoutSeconds), help(triggerHelp), thread([this] { Watch(); }) {}
+GrabWatch::GrabWatch(ZentaraHandle handle, double timeoutSeconds,
+                     std::optional<Clock::duration> triggerPeriod)
+    : camera(handle), limit(timeoutSeconds), period(triggerPeriod), thread([this] { Watch(); }) {}
 
 void GrabWatch::Finish() {
     {
@@ -39,10 +39,9 @@ void GrabWatch::Watch() {
 }
 
 void GrabWatch::Trigger() {
-    if (help == TriggerHelp::None) return;
+    if (!period || Clock::now() < nextTrigger) return;
     // Refused until the grab has begun to wait.
-    const bool isTriggered = Zentara_Trigger(camera) == zerrNone;
-    if (isTriggered && help == TriggerHelp::Once) help = TriggerHelp::None;
+    if (Zentara_Trigger(camera) == zerrNone) nextTrigger = Clock::now() + *period;
 }
 
 }  // namespace ZentaraProgram

@@ -3,23 +3,25 @@
 #include <chrono>
 #include <condition_variable>
 #include <mutex>
+#include <optional>
 #include <thread>
 
 #include "zentara/zentara.h"
 
 namespace ZentaraProgram {
 
-/// What a camera in the mode of the software trigger is given by a watch: EachImage where the grab
-/// takes more than one exposure.
-enum class TriggerHelp { None, Once, EachImage };
-
 /// Looks after a grab from a thread of its own. It gives the trigger that a camera in the mode of
-/// the software trigger waits for. A grab that gets no image it ends: after the time-out or an
-/// interrupt it aborts again and again until the grab has come back, since an abort that comes
-/// before the wait is lost.
+/// the software trigger waits for, and gives it again: the stream of a grab takes a trigger a
+/// little before the camera does, and that one is lost. A grab that gets no image it ends: after
+/// the time-out or an interrupt it aborts again and again until the grab has come back, since an
+/// abort that comes before the wait is lost.
 class GrabWatch {
   public:
-    GrabWatch(ZentaraHandle handle, double timeoutSeconds, TriggerHelp triggerHelp);
+    using Clock = std::chrono::steady_clock;
+
+    /// Triggers each time that `triggerPeriod` has passed since the last one; without it, never.
+    GrabWatch(ZentaraHandle handle, double timeoutSeconds,
+              std::optional<Clock::duration> triggerPeriod);
     ~GrabWatch() { Finish(); }
     GrabWatch(const GrabWatch&) = delete;
     GrabWatch& operator=(const GrabWatch&) = delete;
@@ -35,7 +37,8 @@ class GrabWatch {
 
     ZentaraHandle camera;
     std::chrono::duration<double> limit;
-    TriggerHelp help;  // the watch's thread alone
+    std::optional<Clock::duration> period;
+    Clock::time_point nextTrigger = Clock::now();  // the watch's thread alone
     std::mutex mutex;
     std::condition_variable changed;
     bool isFinished = false;  // guarded by mutex

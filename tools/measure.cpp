@@ -4,6 +4,7 @@
 
 #include <array>
 #include <charconv>
+#include <optional>
 #include <string_view>
 
 #include "frame_size.h"
@@ -117,8 +118,9 @@ ExitCode Measure(Measurement measurement, const MeasureOptions& options, Session
         PrintError(problem);
         return ExitWrongUse;
     }
-    GrabWatch watch(camera.GetHandle(), options.timeoutSeconds,
-                    IsSoftwareTriggered(*settings) ? TriggerHelp::EachImage : TriggerHelp::None);
+    std::optional<GrabWatch::Clock::duration> triggerPeriod;
+    if (IsSoftwareTriggered(*settings)) triggerPeriod = GrabWatch::Clock::duration::zero();
+    GrabWatch watch(camera.GetHandle(), options.timeoutSeconds, triggerPeriod);
     ZentaraResult result = (settings->*row.run)(region);
     watch.Finish();
     if (IsInterrupted()) return ExitInterrupted;

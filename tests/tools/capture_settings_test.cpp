@@ -1,6 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <nlohmann/json.hpp>
 #include <numeric>
 
@@ -21,9 +22,10 @@ class CaptureSettings : public testing::Test {
   protected:
     explicit CaptureSettings() { UseScenario("colour"); }
 
-    void UseScenario(const std::string& base) {
+    void UseScenario(const std::string& base, const std::string& faults = "") {
         WriteFile(GetScenario(), R"({"base": ")" + base + R"(", "timeScale": 0, "cameras": [
-            {"sensor": {"noise": false}, "scene": {"kind": "flat", "level": 0.1}}]})");
+            {"sensor": {"noise": false}, "scene": {"kind": "flat", "level": 0.1}, "faults": [)" +
+                                     faults + "]}]}");
     }
     [[nodiscard]] std::string GetScenario() const { return folder.GetPath("scenario.json"); }
 
@@ -142,6 +144,14 @@ TEST_F(CaptureSettings, InTheModeOfTheSoftwareTriggerEachImageIsTriggered) {
     const ProgramResult result = Run(stream);
     EXPECT_EQ(0, result.exitCode) << result.errors;
     EXPECT_THAT(result.output, testing::StartsWith("3 frames"));
+}
+
+TEST_F(CaptureSettings, AGrabTriggersAgainWhenTheImageOfItsTriggerDoesNotCome) {
+    UseScenario("mono", R"({"kind": "losePacket", "frame": 1, "packet": 0})");
+
+    const std::string path = Grab("a.fits", {"--set", "trigger-type=software", "--timeout", "60"});
+
+    EXPECT_TRUE(std::filesystem::exists(path));
 }
 
 TEST_F(CaptureSettings, TheNumberOfTheCameraMayStandBehindASetting) {
