@@ -442,6 +442,7 @@ void Device::AddState(ZentaraSimulationState* state) const {
     state->registerRequestsFailed += registerRequestsFailed;
     state->buffersRefused += buffersRefused;
     state->buffersFailed += buffersFailed;
+    state->packetsCorrupted += packetsCorrupted;
     state->framesBegun += framesBegun;
     state->psn = settings.psn;
     state->framesExposed += framesExposed;

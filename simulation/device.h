@@ -200,6 +200,7 @@ class Device {
     bool isEnding = false;
     std::uint32_t requestsServed = 0, requestsFailed = 0;
     std::uint32_t registerRequestsFailed = 0, buffersRefused = 0, buffersFailed = 0;
+    std::uint32_t packetsCorrupted = 0;
     std::uint64_t framesExposed = 0, framesSent = 0, framesBegun = 0;
     std::uint32_t wheelStep = 0;
     std::uint64_t cycles = 0;

@@ -296,6 +296,7 @@ Device::CycleResult Device::SendPacket(const Handle& listener) {
     std::uint8_t* payload = GetPayload(*listener);
     std::uint32_t length = sender.packets->Next(payload);
     ++sender.packet;
+    if (HasFault(matches, FaultKind::CorruptPacket)) ++packetsCorrupted;
     DamagePacket(matches, payload, &length);
     if (HasFault(matches, FaultKind::RepeatPacket)) sender.repeat.assign(payload, payload + length);
     if (sender.packets->IsFinished()) FinishFrame();

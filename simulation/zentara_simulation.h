@@ -56,6 +56,8 @@ struct ZentaraSimulationState {
     /// Numbers that frames have used up: one that begins anew takes another.
     std::uint64_t framesBegun;
     std::uint32_t psn;  ///< Parameter set number in force, of one camera alone.
+    /// Packets that corruptPacket has met.
+    std::uint32_t packetsCorrupted;
 };
 
 /// 0, or 1 for a camera that is not there. `camera` 0xFFFFFFFF sums over all.
