@@ -17,7 +17,7 @@ struct SoakSums {
     std::uint64_t frames = 0, bytes = 0, gaps = 0, missing = 0, damaged = 0, repeats = 0;
     std::uint64_t misnumbered = 0;   ///< As the numbers of the frames alone tell.
     std::uint64_t wrongNumbers = 0;  ///< No loss explains them, by what the camera has numbered.
-    std::uint64_t staleNumbers = 0;  ///< Likewise, of a stream whose packets explain them.
+    std::uint64_t staleNumbers = 0;  ///< Likewise, but packets that went wrong explain them.
     /// Of the engine: what became of the frames that began. Those delivered came to the client, but
     /// for the ones without a taker.
     std::uint64_t begun = 0, delivered = 0, heldBack = 0, dropped = 0, refused = 0, bad = 0,

@@ -5,6 +5,7 @@
 #include <cstdio>
 
 #include "camera/morvane_fw_camera.h"
+#include "hal/stream_format.h"
 #include "simulation/zentara_simulation.h"
 #include "support/settings_words.h"
 #include "support/wait_until.h"
@@ -27,6 +28,11 @@ constexpr auto LookInterval = 100ms;
 constexpr auto ListLimit = 10s;
 constexpr int ClosesMax = 3;
 constexpr std::uint32_t AllCameras = 0xFFFFFFFF;
+/// Of the frames of the soak.
+constexpr std::uint64_t PacketsPerFrame = 33;
+/// Twice what fits the ring of requests: frames are cut short, and requests are filled twice.
+constexpr std::uint64_t FramesPerTurn =
+    2 * StreamRequestCount * PacketsPerRequest / PacketsPerFrame;
 
 ZentaraSimulationState GetState(std::uint32_t camera) {
     ZentaraSimulationState state{};
@@ -36,6 +42,10 @@ ZentaraSimulationState GetState(std::uint32_t camera) {
 
 std::uint32_t CountFailed(std::uint32_t camera) {
     return GetState(camera).requestsFailed;
+}
+
+PacketTroubles GetTroubles(const ZentaraSimulationState& state) {
+    return {state.framesBegun, state.buffersFailed, state.packetsCorrupted};
 }
 
 /// Cameras that are unplugged or plugged in.
@@ -78,9 +88,9 @@ SoakedCamera::SoakedCamera(std::uint32_t cameraPosition, std::uint32_t cameraId,
                            std::uint32_t streamingVersion, std::mutex& allMutex)
     : position(cameraPosition),
       uniqueId(cameraId),
-      hasBlocks(streamingVersion == 0),
       listMutex(allMutex),
-      random(cameraPosition) {
+      random(cameraPosition),
+      staleNumbers(streamingVersion == 0, FramesPerTurn) {
     for (Slot& slot : slots) slot.camera = this;
 }
 
@@ -96,8 +106,7 @@ void SoakedCamera::Count(std::uint64_t SoakSums::*sum) {
 
 FailedRequests SoakedCamera::CountFailedRequests() const {
     const ZentaraSimulationState state = GetState(position);
-    return {state.requestsFailed, state.registerRequestsFailed, state.buffersRefused,
-            state.buffersFailed};
+    return {state.requestsFailed, state.registerRequestsFailed, state.buffersRefused};
 }
 
 /// A call may fail, with a code of the table, when there is a reason. True for none that has
@@ -265,23 +274,17 @@ void SoakedCamera::JudgeNumber(const Zentara_Frame& frame) {
     const ZentaraSimulationState state = GetState(position);
     const bool isDamaged = frame.errorCode != zerrNone;
     const std::uint64_t last = numbers.GetLast();
+    staleNumbers.Add(GetTroubles(state), last);
     const auto verdict = numbers.Judge(frame.frameNumber, isDamaged, state.framesBegun);
     if (verdict != FrameNumbers::Verdict::Wrong) return;
-    if (MayBeStale(isDamaged, state.buffersFailed)) return Count(&SoakSums::staleNumbers);
+    if (staleNumbers.MayBe(frame.frameNumber, isDamaged, last)) {
+        return Count(&SoakSums::staleNumbers);
+    }
     std::fprintf(
         stderr, "camera %u: frame %u with code %u came behind %llu, when there were %llu\n",
         position, frame.frameNumber, frame.errorCode, static_cast<unsigned long long>(last),
         static_cast<unsigned long long>(state.framesBegun));
     Count(&SoakSums::wrongNumbers);
-}
-
-/// In streaming version 0 a header of damaged packets is taken wherever its marks seem to be, and a
-/// buffer that fails twice in its turn holds old packets that are taken once more, the number with
-/// its bytes exchanged. The other versions take the tail mark off a first packet: it passes once.
-bool SoakedCamera::MayBeStale(bool isDamaged, std::uint32_t buffersFailed) const {
-    constexpr std::uint32_t FailuresOfOneBuffer = 2;
-    if (!hasBlocks) return false;
-    return isDamaged || buffersFailed - failedAtStream.buffers >= FailuresOfOneBuffer;
 }
 
 /// The sending of a change fails when the camera is gone, or a read or write of its registers has
@@ -350,7 +353,9 @@ bool SoakedCamera::OpenListed(std::uint32_t cameraId, const FailedRequests& fail
     Prepare();
     hasTrouble = false;
     const std::lock_guard hold(doneMutex);
-    numbers.Begin(GetState(position).framesBegun);
+    const ZentaraSimulationState state = GetState(position);
+    numbers.Begin(state.framesBegun);
+    staleNumbers.Begin(GetTroubles(state));
     return true;
 }
 

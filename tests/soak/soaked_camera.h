@@ -13,6 +13,7 @@
 
 #include "soak/frame_numbers.h"
 #include "soak/soak_sums.h"
+#include "soak/stale_numbers.h"
 #include "tools/stream_sums.h"
 #include "zentara/zentara.h"
 
@@ -23,7 +24,6 @@ struct FailedRequests {
     std::uint32_t all = 0;
     std::uint32_t registers = 0;  ///< Of those the reads and writes.
     std::uint32_t refused = 0;    ///< Buffers of a stream, by the call itself.
-    std::uint32_t buffers = 0;    ///< Buffers at their end, also those that a bus reset has cut.
 };
 
 /// One camera that streams for as long as the soak lasts, on a thread of its own. Its frames
@@ -99,10 +99,8 @@ class SoakedCamera {
     void Expect(const char* call, ZentaraResult result);
     void Count(std::uint64_t SoakSums::*sum);
     void JudgeNumber(const Zentara_Frame& frame);
-    [[nodiscard]] bool MayBeStale(bool isDamaged, std::uint32_t buffersFailed) const;
 
     const std::uint32_t position, uniqueId;
-    const bool hasBlocks;  ///< As streaming version 0.
     std::mutex& listMutex;
     std::mt19937 random;
     ZentaraHandle handle{};  ///< 0 while the camera is not open.
@@ -126,8 +124,9 @@ class SoakedCamera {
 
     std::mutex doneMutex;
     std::condition_variable arrived;
-    std::deque<Slot*> done;  // guarded by doneMutex
-    FrameNumbers numbers;    // guarded by doneMutex
+    std::deque<Slot*> done;     // guarded by doneMutex
+    FrameNumbers numbers;       // guarded by doneMutex
+    StaleNumbers staleNumbers;  // guarded by doneMutex
 
     mutable std::mutex sumsMutex;
     SoakSums sums;  // guarded by sumsMutex

@@ -1,11 +1,14 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <numeric>
+#include <vector>
 
 #include "soak/frame_numbers.h"
 #include "soak/process_usage.h"
 #include "soak/soak_sums.h"
+#include "soak/stale_numbers.h"
 #include "support/scoped_variable.h"
 #include "tools/program.h"
 
@@ -15,9 +18,11 @@ namespace {
 
 using ZV::Soak::FrameNumbers;
 using ZV::Soak::GrowthJudge;
+using ZV::Soak::PacketTroubles;
 using ZV::Soak::ProcessUsage;
 using ZV::Soak::SoakState;
 using ZV::Soak::SoakSums;
+using ZV::Soak::StaleNumbers;
 
 /// A soak as scripts/soak runs it, with the waits of a camera that has gone short.
 ProgramResult RunSoak(const std::vector<std::string>& options) {
@@ -122,6 +127,107 @@ TEST(FrameNumbersTest, TakesANumberTwiceWhenOneOfTheFramesIsDamaged) {
     EXPECT_EQ(FrameNumbers::Verdict::Good, numbers.Judge(101, true, 110));
     EXPECT_EQ(FrameNumbers::Verdict::Repeated, numbers.Judge(101, false, 110));
     EXPECT_EQ(FrameNumbers::Verdict::Wrong, numbers.Judge(101, false, 110));
+}
+
+/// What went wrong, by the number of the frame that the camera had begun by then.
+struct TroublePlan {
+    std::vector<std::uint64_t> failures, corruptions;
+
+    PacketTroubles CountTo(std::uint64_t used) const {
+        const auto count = [=](const std::vector<std::uint64_t>& numbers) {
+            return static_cast<std::uint32_t>(std::count_if(
+                numbers.begin(), numbers.end(), [=](auto number) { return number <= used; }));
+        };
+        return {used, count(failures), count(corruptions)};
+    }
+};
+
+struct StaleRow {
+    const char* story;
+    bool isDamaged;
+    std::uint64_t number;
+    TroublePlan plan;
+    bool mayBe;
+};
+
+constexpr bool Blocks = true, Plain = false, Damaged = true, Whole = false;
+constexpr std::uint64_t FramesPerTurn = 10, Last = 65545, Used = Last + 4;
+constexpr std::uint64_t OneTurn = Last - FramesPerTurn, TwoTurns = Last - 2 * FramesPerTurn;
+constexpr std::uint16_t AnyNumber = 1234;
+
+std::uint64_t Exchange(std::uint64_t number) {
+    return (number & 0xFF) << 8 | (number >> 8 & 0xFF);
+}
+
+/// Each frame comes when the camera has begun the same number of frames behind it.
+void ExpectVerdicts(bool hasBlocks, const std::vector<StaleRow>& rows) {
+    for (const StaleRow& row : rows) {
+        StaleNumbers stale(hasBlocks, FramesPerTurn);
+        stale.Begin(row.plan.CountTo(Last - 100));
+        for (std::uint64_t last = Last - 100; last <= Last; ++last) {
+            stale.Add(row.plan.CountTo(last + Used - Last), last);
+        }
+
+        const auto number = static_cast<std::uint16_t>(row.number);
+        EXPECT_EQ(row.mayBe, stale.MayBe(number, row.isDamaged, Last)) << row.story;
+    }
+}
+
+TEST(StaleNumbersTest, ExcusesAnyDamagedFrameOfBlocksWhilePacketsCanBeTakenForHeaders) {
+    ExpectVerdicts(Blocks,
+                   {{"no trouble", Damaged, AnyNumber, {{}, {}}, false},
+                    {"read twice", Damaged, AnyNumber, {{OneTurn}, {}}, true},
+                    {"read twice, a turn before", Damaged, AnyNumber, {{OneTurn - 1}, {}}, false},
+                    {"read twice, whole", Whole, AnyNumber, {{OneTurn, Last}, {}}, false},
+                    {"corrupted", Damaged, AnyNumber, {{}, {Last}}, true},
+                    {"corrupted before the last", Damaged, AnyNumber, {{}, {Last - 1}}, false},
+                    {"corrupted, whole", Whole, AnyNumber, {{}, {Last, Last}}, false}});
+}
+
+TEST(StaleNumbersTest, ExcusesAWholeFrameOfBlocksByTwoFailuresAndANumberOfTwoTurns) {
+    const TroublePlan twice{{TwoTurns, Last}, {}}, early{{TwoTurns - 1, Last}, {}};
+    const TroublePlan once{{Last}, {}};
+    ExpectVerdicts(Blocks, {{"the first", Whole, Exchange(TwoTurns), twice, true},
+                            {"before the first", Whole, Exchange(TwoTurns - 1), twice, false},
+                            {"the last", Whole, Exchange(Used), twice, true},
+                            {"behind the last", Whole, Exchange(Used + 1), twice, false},
+                            {"not exchanged", Whole, TwoTurns, twice, false},
+                            {"failed too early", Whole, Exchange(TwoTurns), early, false},
+                            {"failed once", Whole, Exchange(TwoTurns), once, false}});
+}
+
+TEST(StaleNumbersTest, ExcusesADamagedFrameOfOtherVersionsByAFailureAndANumberOfOneTurn) {
+    const TroublePlan once{{Last}, {}}, early{{Last - 1}, {}}, twice{{TwoTurns, Last}, {}};
+    ExpectVerdicts(Plain, {{"the one before", Damaged, Last - 1, once, true},
+                           {"the first", Damaged, OneTurn, once, true},
+                           {"before the first", Damaged, OneTurn - 1, once, false},
+                           {"failed before the last", Damaged, Last - 1, early, false},
+                           {"whole", Whole, Last - 1, once, false},
+                           {"read thrice", Whole, Exchange(TwoTurns), twice, false},
+                           {"corrupted", Damaged, Last - 1, {{}, {Last}}, false}});
+}
+
+TEST(StaleNumbersTest, BlamesNothingFromBeforeItsBegin) {
+    StaleNumbers stale(Blocks, FramesPerTurn);
+    stale.Begin({100, 5, 5});
+
+    stale.Add({101, 5, 5}, 100);
+    EXPECT_FALSE(stale.MayBe(AnyNumber, Damaged, 100));
+
+    stale.Add({101, 6, 5}, 100);
+    EXPECT_TRUE(stale.MayBe(AnyNumber, Damaged, 100));
+}
+
+// What went wrong between two looks may have done so at the end of that time.
+TEST(StaleNumbersTest, ExcusesByAllThatWentWrongSinceTheLookBefore) {
+    StaleNumbers stale(Blocks, FramesPerTurn);
+    stale.Begin({100, 0, 0});
+    stale.Add({989, 0, 0}, 950);
+    stale.Add({1000, 1, 0}, 989);
+
+    EXPECT_TRUE(stale.MayBe(AnyNumber, Damaged, 1000));
+    EXPECT_TRUE(stale.MayBe(AnyNumber, Damaged, 1010));
+    EXPECT_FALSE(stale.MayBe(AnyNumber, Damaged, 1011));
 }
 
 TEST(SoakStateTest, GoesOnWhereTheFormerRunEnded) {
@@ -250,6 +356,19 @@ TEST(Soak, FailsWhenAFrameComesUnderAWrongNumber) {
     const ProgramResult result = RunSoak(
         {"--seconds", "3", "--cameras", "2", "--faults", "0", "--request-faults", "0", "--fault",
          R"({"kind": "corruptPacket", "packet": 0, "offset": 8, "bytes": 1, "probability": 0.1})"});
+
+    EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
+    EXPECT_THAT(result.output, testing::HasSubstr("frames came under a wrong number"));
+}
+
+// A tenth of all buffers fails; the frames between them are whole.
+TEST(Soak, FailsWhenAWholeFrameOfBlocksComesUnderANumberThatNoFailedBufferHolds) {
+    const ProgramResult result = RunSoak(
+        {"--seconds", "3", "--cameras", "1", "--faults", "0", "--request-faults", "0", "--fault",
+         R"({"kind": "failRequest", "code": "FW_IOCTL_ATTACH_BUFFER", "pended": true,
+             "probability": 0.1})",
+         "--fault",
+         R"({"kind": "corruptPacket", "packet": 0, "offset": 10, "bytes": 1, "probability": 0.1})"});
 
     EXPECT_EQ(1, result.exitCode) << result.output << result.errors;
     EXPECT_THAT(result.output, testing::HasSubstr("frames came under a wrong number"));
