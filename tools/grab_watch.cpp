@@ -5,13 +5,13 @@
 namespace ZentaraProgram {
 namespace {
 
+using Clock = std::chrono::steady_clock;
 constexpr std::chrono::milliseconds Poll{50};
 
 }  // namespace
 
-GrabWatch::GrabWatch(ZentaraHandle handle, double timeoutSeconds,
-                     std::optional<Clock::duration> triggerPeriod)
-    : camera(handle), limit(timeoutSeconds), period(triggerPeriod), thread([this] { Watch(); }) {}
+GrabWatch::GrabWatch(ZentaraHandle handle, double timeoutSeconds, bool givesTriggers)
+    : camera(handle), limit(timeoutSeconds), triggers(givesTriggers), thread([this] { Watch(); }) {}
 
 void GrabWatch::Finish() {
     {
@@ -31,17 +31,11 @@ void GrabWatch::Watch() {
         if (isOver) {
             hasAborted = true;
             (void)Zentara_Abort(camera);  // The grab's own result tells how it ended.
-        } else {
-            Trigger();
+        } else if (triggers) {
+            (void)Zentara_Trigger(camera);  // Refused until the call has begun to wait.
         }
         lock.lock();
     }
-}
-
-void GrabWatch::Trigger() {
-    if (!period || Clock::now() < nextTrigger) return;
-    // Refused until the grab has begun to wait.
-    if (Zentara_Trigger(camera) == zerrNone) nextTrigger = Clock::now() + *period;
 }
 
 }  // namespace ZentaraProgram

@@ -4,7 +4,6 @@
 
 #include <array>
 #include <charconv>
-#include <optional>
 #include <string_view>
 
 #include "frame_size.h"
@@ -118,9 +117,7 @@ ExitCode Measure(Measurement measurement, const MeasureOptions& options, Session
         PrintError(problem);
         return ExitWrongUse;
     }
-    std::optional<GrabWatch::Clock::duration> triggerPeriod;
-    if (IsSoftwareTriggered(*settings)) triggerPeriod = GrabWatch::Clock::duration::zero();
-    GrabWatch watch(camera.GetHandle(), options.timeoutSeconds, triggerPeriod);
+    GrabWatch watch(camera.GetHandle(), options.timeoutSeconds, IsSoftwareTriggered(*settings));
     ZentaraResult result = (settings->*row.run)(region);
     watch.Finish();
     if (IsInterrupted()) return ExitInterrupted;

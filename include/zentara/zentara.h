@@ -782,9 +782,8 @@ ZENTARA_API ZentaraResult Zentara_QueueSettings(ZentaraHandle handle, Zentara_Se
 ZENTARA_API ZentaraResult Zentara_SetStreaming(ZentaraHandle handle, uint32_t enable);
 
 /**
- * Triggers one frame by software. Writes to the camera. Beside a Zentara_SetStreaming or a
- * Zentara_GrabFrame that is still turning streaming on, it may come before the camera waits for it,
- * and is lost: trigger again when no image comes.
+ * Triggers one frame by software. Writes to the camera. Beside a call or a queued change that turns
+ * streaming on, or off and on again, it may come when the camera does not wait for it, and is lost.
  *
  * 8 not loaded; 9 `handle` null; 9 not open; 24 streaming is off; 9 open in another process; 1 the
  * trigger mode is not ztrigSoftware; a camera's failure (15, 16 or 30).

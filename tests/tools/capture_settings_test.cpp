@@ -1,7 +1,6 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <filesystem>
 #include <nlohmann/json.hpp>
 #include <numeric>
 
@@ -146,12 +145,14 @@ TEST_F(CaptureSettings, InTheModeOfTheSoftwareTriggerEachImageIsTriggered) {
     EXPECT_THAT(result.output, testing::StartsWith("3 frames"));
 }
 
-TEST_F(CaptureSettings, AGrabTriggersAgainWhenTheImageOfItsTriggerDoesNotCome) {
-    UseScenario("mono", R"({"kind": "losePacket", "frame": 1, "packet": 0})");
+TEST_F(CaptureSettings, ATriggeredImageThatDoesNotComeEndsWithCode1) {
+    UseScenario("mono", R"({"kind": "losePacket", "packet": 0, "count": 0})");
 
-    const std::string path = Grab("a.fits", {"--set", "trigger-type=software", "--timeout", "60"});
+    const ProgramResult result = Run({"grab", "-o", folder.GetPath("a.fits"), "--set",
+                                      "trigger-type=software", "--timeout", "0.5"});
 
-    EXPECT_TRUE(std::filesystem::exists(path));
+    EXPECT_EQ(1, result.exitCode);
+    EXPECT_THAT(result.errors, HasSubstr("no image came within 0.5 s"));
 }
 
 TEST_F(CaptureSettings, TheNumberOfTheCameraMayStandBehindASetting) {
