@@ -116,9 +116,12 @@ RequestFailure Count(const KernelRequest& request) {
     if (request.code == FW_IOCTL_STREAM_ENTER) {
         state.streamThreads.push_back(std::this_thread::get_id());
     }
+    const auto& threads = state.streamThreads;
+    const bool isOfStream =
+        std::find(threads.begin(), threads.end(), std::this_thread::get_id()) != threads.end();
     const RequestSeries series = GetSeries(request.code);
     auto& counted = state.counted[static_cast<std::size_t>(series)];
-    counted.push_back({request.code, MayPend(request), GetAddress(request)});
+    counted.push_back({request.code, MayPend(request), GetAddress(request), isOfStream});
     if (series != state.series || counted.size() != state.number) return RequestFailure::None;
     state.failedCode = request.code;
     return state.failure;
@@ -343,13 +346,6 @@ std::vector<CountedRequest> GetCounted(RequestSeries series) {
     DriverState& state = GetState();
     const std::lock_guard hold(state.mutex);
     return state.counted[static_cast<std::size_t>(series)];
-}
-
-bool IsStreamThread(std::thread::id thread) {
-    DriverState& state = GetState();
-    const std::lock_guard hold(state.mutex);
-    return std::find(state.streamThreads.begin(), state.streamThreads.end(), thread) !=
-           state.streamThreads.end();
 }
 
 std::uint32_t CountOpenDevices() {

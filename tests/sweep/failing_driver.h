@@ -2,7 +2,6 @@
 
 #include <cstdint>
 #include <string_view>
-#include <thread>
 #include <vector>
 
 #include "simulation/zentara_simulation.h"
@@ -32,6 +31,7 @@ struct CountedRequest {
     std::uint32_t code = 0;
     bool mayPend = false;
     std::uint32_t address = 0;  ///< Of the register that is written.
+    bool isOfStream = false;    ///< Sent by a stream's own thread.
 
     bool operator==(const CountedRequest&) const = default;
 };
@@ -55,9 +55,6 @@ ModuleLoads GetModuleLoads();
 /// From here on the system names the library's image by a relative path, as it does for one that
 /// was found by such a path.
 void NameImageRelatively();
-
-/// Whether it is the own thread of a stream, since BeginRequests.
-bool IsStreamThread(std::thread::id thread);
 
 /// Handles that are open at the driver.
 std::uint32_t CountOpenDevices();

@@ -26,7 +26,7 @@ constexpr milliseconds Spell(5);
 /// How long a client waits for an image that may stay away once something has failed.
 constexpr milliseconds ShortPatience(IsSanitized ? 400 : 60);
 /// Far more than any story takes.
-constexpr milliseconds LongPatience(IsSanitized ? 60'000 : 20'000);
+constexpr milliseconds LongPatience(IsSanitized ? 40'000 : 10'000);
 constexpr std::uint64_t ShortExposureNs = 2'000'000;
 /// Behind them stands the camera's handle, another with each opening.
 constexpr std::size_t SettingsBytesBeforeHandle = 244;
@@ -97,7 +97,7 @@ class Aborter {
     /// Looked at once in a spell.
     bool HasWaitedEnough() {
         spells = HasSomethingFailed() ? spells + 1 : 0;
-        return client->HasWaitedEnough(spells * Spell) || Clock::now() - armedAt > LongPatience;
+        return client->GivesUpAfter(spells * Spell) || Clock::now() - armedAt > LongPatience;
     }
     void Run() {
         const UncountedAllocations uncounted;
@@ -163,8 +163,7 @@ void Client::Reset() {
     }
 }
 
-bool Client::HasWaitedEnough(milliseconds waited) const {
-    if (waited > LongPatience) return true;
+bool Client::GivesUpAfter(milliseconds waited) const {
     if (waited <= ShortPatience || mayGiveUp == nullptr || !HasSomethingFailed()) return false;
     const UncountedAllocations uncounted;
     return mayGiveUp();
@@ -326,6 +325,7 @@ void Client::BeginQueue() {
     queued = 0;
     served = damaged = 0;
     changed = unchanged = changesDue = 0;
+    hasGivenUp = false;
 }
 
 void Client::QueueFrame(std::size_t index) {
@@ -353,7 +353,7 @@ void Client::QueueAll() {
     changesDue = ChangesDue;
 }
 
-void Client::AwaitFrames() const {
+void Client::AwaitFrames() {
     std::uint32_t lastCome = 0;
     int spells = 0;
     auto spellBegan = Clock::now();
@@ -365,7 +365,9 @@ void Client::AwaitFrames() const {
             if (std::exchange(lastCome, served + changes) != served + changes) spells = 0;
             if (Clock::now() - spellBegan < Spell) return false;
             spellBegan = Clock::now();
-            return HasWaitedEnough(++spells * Spell);
+            const milliseconds waited = ++spells * Spell;
+            hasGivenUp = GivesUpAfter(waited);
+            return hasGivenUp || waited > LongPatience;
         },
         2 * LongPatience);
 }

@@ -48,8 +48,10 @@ class Client {
     /// Null: nothing may. May be asked by a thread of its own; in a story that waits for queued
     /// frames by the caller's alone.
     void SetGivingUp(std::function<bool()> mayGiveUpNow) { mayGiveUp = std::move(mayGiveUpNow); }
-    /// Who may not give up waits for as long as any story takes.
-    bool HasWaitedEnough(std::chrono::milliseconds waited) const;
+    /// Who does not give up waits for as long as any story takes.
+    bool GivesUpAfter(std::chrono::milliseconds waited) const;
+    /// Whether it has given up the frames that were queued last.
+    bool HasGivenUp() const { return hasGivenUp; }
 
     void Load();
     /// The first camera of the list, or none.
@@ -134,7 +136,7 @@ class Client {
     void QueueFrame(std::size_t index);
     void QueueChange(std::size_t index);
     void QueueAll();
-    void AwaitFrames() const;
+    void AwaitFrames();
 
     std::array<Call, CallsMax> calls{};
     std::size_t callCount = 0;
@@ -148,6 +150,7 @@ class Client {
     std::array<Frame, FrameCount> frames;
     std::uint32_t queued = 0, changesDue = 0;
     std::function<bool()> mayGiveUp;
+    bool hasGivenUp = false;
     std::atomic<std::uint32_t> served{0}, damaged{0};
     std::atomic<std::uint32_t> changed{0}, unchanged{0};
     std::atomic<std::uint32_t> strangeCode{0};

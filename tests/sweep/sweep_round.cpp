@@ -99,7 +99,7 @@ class Runner {
     bool HasGoodCalls(std::size_t from, const char* where);
     bool IsToldByACall(const CountedStory& counted) const;
     bool HasStreamedWithoutMemory(const CountedStory& counted) const;
-    bool IsStoppedWithoutMemory(const CountedStory& counted) const;
+    bool IsToldOfStream(const CountedStory& counted) const;
     void Begin();
     void CheckImage(const char* where);
     void StreamShortly(const char* where);
@@ -236,6 +236,12 @@ void Runner::CheckIsToldOrDone(const CountedStory& counted) {
     }
 }
 
+/// All queued frames come, one of them damaged at the most, and the changes among them are made.
+bool HasStreamedOn(const Client::StreamOutcome& stream) {
+    return stream.served == Client::FrameCount && stream.damaged <= 1 && stream.unchanged == 0 &&
+           stream.changed >= Client::ChangesDue;
+}
+
 /// All queued frames come, and the changes among them are made, unless the failure may keep them.
 void Runner::CheckStream(const Round* round, const CountedStory& counted) {
     if (story.name != "stream") return;
@@ -246,6 +252,9 @@ void Runner::CheckStream(const Round* round, const CountedStory& counted) {
         isGood = HasStreamedWithoutMemory(counted);
     } else if (GetFailedCode() != 0 && !IsHarmless(*round)) {
         if (MayEndStream(*round) || IsToldByACall(counted)) return;
+        if (round->series == RequestSeries::Stream) {
+            isGood = HasStreamedOn(stream);  // what the buffer still holds may damage one
+        }
         if (round->series == RequestSeries::Calls) {
             isGood = stream.unchanged != 0 ? isWhole || IsStreamStopped(*round)
                                            : isWhole && IsUntoldInStream(*round);
@@ -260,26 +269,22 @@ void Runner::CheckStream(const Round* round, const CountedStory& counted) {
 
 /// Missing memory costs an image at most, which says so, unless the stream may end.
 bool Runner::HasStreamedWithoutMemory(const CountedStory& counted) const {
-    const Client::StreamOutcome stream = client.GetStream();
-    const bool goesOn = stream.served == Client::FrameCount && stream.damaged <= 1 &&
-                        stream.changed >= Client::ChangesDue;
-    return goesOn || IsStoppedWithoutMemory(counted);
+    return HasStreamedOn(client.GetStream()) || client.HasGivenUp() || IsToldOfStream(counted);
 }
 
-/// By a call, by a change, or in a way that nobody tells.
-bool Runner::IsStoppedWithoutMemory(const CountedStory& counted) const {
-    return IsToldByACall(counted) || client.GetStream().unchanged != 0 ||
-           MayEndWithoutMemory(counted);
+bool Runner::IsToldOfStream(const CountedStory& counted) const {
+    return IsToldByACall(counted) || client.GetStream().unchanged != 0;
 }
 
 /// Whether images may stay away, from what has happened in the round so far.
 bool Runner::MayGiveUp(const Round& round, const CountedStory& counted) const {
     if (IsHarmless(round)) return false;
-    const bool isOfCalls =
-        round.failure == Failure::NoMemory || round.series == RequestSeries::Calls;
+    const bool isMemory = round.failure == Failure::NoMemory;
+    const bool isOfCalls = isMemory || round.series == RequestSeries::Calls;
     if (story.name != "stream") return isOfCalls || MayEndStream(round);
-    if (round.failure == Failure::NoMemory) return IsStoppedWithoutMemory(counted);
-    return MayEndStream(round) || IsToldByACall(counted) || (isOfCalls && IsStreamStopped(round));
+    if (isMemory) return IsToldOfStream(counted) || !IsStreamStarted();
+    if (MayEndStream(round) || IsToldByACall(counted)) return true;
+    return isOfCalls && client.GetStream().unchanged != 0 && IsStreamStopped(round);
 }
 
 template <typename Work>

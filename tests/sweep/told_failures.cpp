@@ -35,11 +35,11 @@ constexpr std::uint32_t CommandAddress = 0xD0005004;
 constexpr std::uint32_t StartAddresses[] = {SetNumberAddress, 0xD0002050, TakeOverAddress,
                                             CommandAddress};
 
-/// What a start sends, a stop, or both, and nothing else does.
+/// Of what a start sends, in this order. Kept: it goes on without the camera's new parameter set
+/// number, and its frames are discarded.
 constexpr CountedRequest StartRequests[] = {
-    {.code = FW_IOCTL_LISTEN},
-    {.code = FW_IOCTL_STOP},
     {.code = FW_IOCTL_ASYNC_WRITE, .address = SetNumberAddress},
+    {.code = FW_IOCTL_LISTEN},
     {.code = FW_IOCTL_ASYNC_WRITE, .address = CommandAddress},
 };
 
@@ -131,10 +131,12 @@ bool LeavesAWorkingCamera(const Round& round, const Story& story) {
 
 bool MayEndStream(const Round& round) {
     if (round.failure == Failure::DeviceGone) return true;
-    // Kept: the loop leaves when a buffer that it hands back is refused.
-    if (round.series == RequestSeries::Stream) return round.failure == Failure::Fails;
     if (round.series == RequestSeries::Switches) return false;
     const CountedRequest request = GetFailed(round);
+    // Kept: the loop leaves when a buffer that it hands back is refused.
+    if (round.series == RequestSeries::Stream) {
+        return round.failure == Failure::Fails && request.isOfStream;
+    }
     if (request.code == FW_IOCTL_ASYNC_READ) return false;
     if (request.code != FW_IOCTL_ASYNC_WRITE) return true;
     return std::find(std::begin(StartAddresses), std::end(StartAddresses), request.address) !=
@@ -169,8 +171,6 @@ bool TellsOfMissingMemory(const Story& story) {
 }
 
 bool MayMissImage(const Story& story) {
-    // Kept: a stream's own thread leaves without the memory for its next buffer.
-    if (IsStreamThread(GetRefusedThread())) return true;
     if (story.name != "grab") return false;
     // Kept: a start goes on without the camera's new parameter set number, and its frames are bad.
     const std::vector<CountedRequest> sent = GetCounted(RequestSeries::Calls);
@@ -178,18 +178,19 @@ bool MayMissImage(const Story& story) {
                         [](const auto& request) { return request.address == SetNumberAddress; });
 }
 
-bool MayEndWithoutMemory(const CountedStory& counted) {
-    if (IsStreamThread(GetRefusedThread())) return true;
+bool IsStreamStarted() {
     const std::vector<CountedRequest> sent = GetCounted(RequestSeries::Calls);
-    return std::any_of(std::begin(StartRequests), std::end(StartRequests), [&](const auto& kind) {
-        const auto isOfKind = [&](const auto& request) {
-            return request.code == kind.code && request.address == kind.address;
-        };
-        const auto count = [&](const std::vector<CountedRequest>& requests) {
-            return std::count_if(requests.begin(), requests.end(), isOfKind);
-        };
-        return count(sent) < count(counted.requests[0]);
+    const auto stop = std::find_if(sent.rbegin(), sent.rend(), [](const auto& request) {
+        return request.code == FW_IOCTL_STOP;
     });
+    auto next = stop.base();
+    for (const CountedRequest& part : StartRequests) {
+        next = std::find_if(next, sent.end(), [&](const auto& request) {
+            return request.code == part.code && request.address == part.address;
+        });
+        if (next == sent.end()) return false;
+    }
+    return true;
 }
 
 std::vector<CountedRequest> ListLeftOut(const CountedStory& counted) {

@@ -44,10 +44,9 @@ bool TellsOfMissingMemory(const Story& story);
 /// word.
 bool MayMissImage(const Story& story);
 
-/// Of the stream that has just run without some memory: whether it may end without a word. Kept:
-/// its own thread leaves without the memory for its next buffer, and a change that has stopped it
-/// does not tell of a start that has failed; such a start, or its stop, is not complete.
-bool MayEndWithoutMemory(const CountedStory& counted);
+/// Whether a start has been sent whole behind the last stop. Kept: a change that has stopped the
+/// stream does not tell of a start that has failed.
+bool IsStreamStarted();
 
 /// Requests of callers that the story sends without a failure and has not sent now.
 std::vector<CountedRequest> ListLeftOut(const CountedStory& counted);
