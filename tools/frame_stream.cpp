@@ -5,14 +5,10 @@
 #include <algorithm>
 #include <utility>
 
+#include "interrupt.h"
 #include "output.h"
 
 namespace ZentaraProgram {
-namespace {
-
-constexpr std::chrono::milliseconds Poll{50};
-
-}  // namespace
 
 FrameStream::FrameStream(ZentaraHandle openCamera, const CaptureFacts& captureFacts,
                          const StreamOptions& streamOptions, StreamCalls streamCalls)
@@ -72,7 +68,7 @@ void FrameStream::TriggerRest() {
 }
 
 ExitCode FrameStream::Step(ZentaraResult* result) {
-    Slot* slot = ring.Take(Poll);
+    Slot* slot = ring.Take(InterruptPoll);
     sums.seconds = GetSeconds();
     if (slot != nullptr) {
         lastFrame = Clock::now();

@@ -15,7 +15,6 @@ namespace ZentaraProgram {
 namespace {
 
 using Clock = std::chrono::steady_clock;
-constexpr std::chrono::milliseconds Poll{50};
 
 /// One image of a capture, and why none came.
 struct Grabbed {
@@ -38,7 +37,7 @@ Grabbed Grab(const Camera& camera, const CaptureFacts& facts, double timeoutSeco
 ZentaraResult AwaitTriggered(ZentaraHandle camera, const CaptureFacts& facts, Clock::time_point end,
                              FrameRing* ring) {
     ZentaraResult result = Zentara_Trigger(camera);
-    while (result == zerrNone && ring->Take(Poll) == nullptr) {
+    while (result == zerrNone && ring->Take(InterruptPoll) == nullptr) {
         if (Clock::now() >= end || IsInterrupted()) return zerrBusy;
         if (facts.exposures > 1) result = Zentara_Trigger(camera);
     }

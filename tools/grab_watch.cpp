@@ -6,7 +6,6 @@ namespace ZentaraProgram {
 namespace {
 
 using Clock = std::chrono::steady_clock;
-constexpr std::chrono::milliseconds Poll{50};
 
 }  // namespace
 
@@ -25,7 +24,7 @@ void GrabWatch::Finish() {
 void GrabWatch::Watch() {
     const Clock::time_point end = Clock::now() + std::chrono::duration_cast<Clock::duration>(limit);
     std::unique_lock lock(mutex);
-    while (!changed.wait_for(lock, Poll, [this] { return isFinished; })) {
+    while (!changed.wait_for(lock, InterruptPoll, [this] { return isFinished; })) {
         const bool isOver = Clock::now() >= end || IsInterrupted();
         lock.unlock();
         if (isOver) {
