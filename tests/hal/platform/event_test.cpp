@@ -30,13 +30,12 @@ class EventTest : public testing::Test {
     [[nodiscard]] bool StartTwoWaiters() {
         for (auto& waiter : waiters) {
             waiter = std::make_unique<TestThread>([this, &waiter] {
-                isStarted.wait(false);
+                if (!WaitUntil([this] { return isStarted.load(); })) return;
                 waiter->AnnounceWait();
                 if (WaitForEvent(event, WaitingLimitMs) == WaitOutcome::Signalled) ++released;
             });
         }
         isStarted.store(true);
-        isStarted.notify_all();
         return waiters[0]->WaitUntilAsleep() && waiters[1]->WaitUntilAsleep();
     }
 
