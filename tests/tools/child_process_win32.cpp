@@ -3,6 +3,7 @@
 #include <cwchar>
 
 #include "tools/child_process.h"
+#include "windows/support/process_start.h"
 
 namespace ZentaraTest {
 namespace {
@@ -85,9 +86,11 @@ ChildProcess StartProcess(const ProcessStart& start) {
     streams.hStdOutput = CreateOutput(start.output);
     streams.hStdError = CreateOutput(start.errors);
     PROCESS_INFORMATION made{};
-    const BOOL isStarted = CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE,
-                                          CREATE_NO_WINDOW | CREATE_UNICODE_ENVIRONMENT,
-                                          environment.data(), nullptr, &streams, &made);
+    const bool isStarted = ZV::Test::StartProcessDespiteLosses([&] {
+        return CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE,
+                              CREATE_NO_WINDOW | CREATE_UNICODE_ENVIRONMENT, environment.data(),
+                              nullptr, &streams, &made);
+    });
     CloseHandle(streams.hStdOutput);
     CloseHandle(streams.hStdError);
     if (!isStarted) return NoProcess;

@@ -8,6 +8,7 @@
 #include "support/scoped_variable.h"
 #include "support/temporary_folder.h"
 #include "support/wait_until.h"
+#include "windows/support/process_start.h"
 
 // A process may end at any moment, loaded or streaming, and gives nothing back. Windows ends the
 // other threads first, with whatever locks they hold, and tells the libraries on what is left.
@@ -52,9 +53,10 @@ class EndingClient {
         start.hStdError = GetStdHandle(STD_ERROR_HANDLE);
         const std::string program = GetClientPath();
         std::string line = "\"" + program + "\" " + std::to_string(moment) + " " + way;
-        EXPECT_TRUE(CreateProcessA(program.c_str(), line.data(), nullptr, nullptr,
-                                   /*bInheritHandles=*/TRUE, 0, nullptr, nullptr, &start, &process))
-            << GetLastError();
+        EXPECT_TRUE(StartProcessDespiteLosses([&] {
+            return CreateProcessA(program.c_str(), line.data(), nullptr, nullptr,
+                                  /*bInheritHandles=*/TRUE, 0, nullptr, nullptr, &start, &process);
+        })) << GetLastError();
         CloseHandle(writeEnd);
     }
     ~EndingClient() {

@@ -4,6 +4,7 @@
 
 #include "support/wait_until.h"
 #include "windows/road/test_driver.h"
+#include "windows/support/process_start.h"
 
 namespace ZV::Test {
 namespace {
@@ -19,17 +20,11 @@ bool MakePipe(HANDLE* reading, HANDLE* writing, bool isReadByChild) {
     return SetHandleInformation(isReadByChild ? *writing : *reading, HANDLE_FLAG_INHERIT, 0);
 }
 
-/// On a busy machine Wine may lose a process in its start.
 bool Create(std::string* line, STARTUPINFOA* start, PROCESS_INFORMATION* started) {
-    constexpr int Tries = 3;
-    for (int i = 0; i < Tries; ++i) {
-        if (CreateProcessA(nullptr, line->data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
-                           start, started)) {
-            return true;
-        }
-        if (GetLastError() != ERROR_INTERNAL_ERROR) return false;
-    }
-    return false;
+    return StartProcessDespiteLosses([&] {
+        return CreateProcessA(nullptr, line->data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
+                              start, started);
+    });
 }
 
 void CloseAndClear(HANDLE* handle) {

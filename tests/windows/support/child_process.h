@@ -5,6 +5,8 @@
 
 #include <string>
 
+#include "windows/support/process_start.h"
+
 namespace ZV::Test {
 
 [[nodiscard]] inline std::string GetOwnPath() {
@@ -45,11 +47,12 @@ class ChildProcess {
         start.hStdOutput = options.standardOutput;
         start.hStdError = GetStdHandle(STD_ERROR_HANDLE);
         SetEnvironmentVariableA(ChildWordVariable, options.word.c_str());
-        EXPECT_TRUE(CreateProcessA(options.program.c_str(), line.data(), nullptr, nullptr,
-                                   /*bInheritHandles=*/TRUE,
-                                   options.hasConsole ? DWORD{CREATE_NO_WINDOW} : 0, nullptr,
-                                   nullptr, &start, &process))
-            << GetLastError();
+        const DWORD flags = options.hasConsole ? DWORD{CREATE_NO_WINDOW} : 0;
+        EXPECT_TRUE(StartProcessDespiteLosses([&] {
+            return CreateProcessA(options.program.c_str(), line.data(), nullptr, nullptr,
+                                  /*bInheritHandles=*/TRUE, flags, nullptr, nullptr, &start,
+                                  &process);
+        })) << GetLastError();
         SetEnvironmentVariableA(ChildWordVariable, nullptr);
     }
     /// Ends a child that still runs.
