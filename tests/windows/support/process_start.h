@@ -4,8 +4,8 @@
 
 namespace ZV::Test {
 
-/// Repeats `create`, which calls CreateProcess, while the system loses the process in its start, as
-/// Wine does now and then.
+/// Calls `create`, which calls CreateProcess, again when the system has lost the process in its
+/// start, as Wine does now and then; three times at most. The last error is that of the last try.
 template <typename Create>
 [[nodiscard]] bool StartProcessDespiteLosses(Create create) {
     constexpr int Tries = 3;
