@@ -127,11 +127,13 @@ ZentaraResult MakeChange(EventService& service, const QueueEntry& change) {
     return Zentara_SendSettingsToCam(change.camera, change.settings);
 }
 
-/// Applies the settings change behind a frame whose pixels are still on the way, so that it is in
-/// force for the next exposure.
-void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold, EventService& service) {
+/// Applies the settings change behind `frame`, whose pixels are still on the way, so that it is in
+/// force for the next exposure. An image that came meanwhile has seen to that change; the one that
+/// would be in its place then belongs to a later exposure.
+void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold, EventService& service,
+                        const QueueEntry& frame) {
     if (context.abortRequested != 0 || context.sendInProgress != 0) return;
-    const EntryHold change(context, service.TakeChange(/*index=*/1, /*countMin=*/2));
+    const EntryHold change(context, service.TakeChange(&frame));
     if (!change) return;
     ZentaraResult result = zerrNone;
     queueHold.RunReleased([&] { result = MakeChange(service, *change); });
@@ -148,11 +150,10 @@ void ServeExposure(CameraContext& context) {
         return;
     }
     EventService service(context, EventService::Kind::Exposure);
-    std::uint32_t index = 0;
-    const EntryHold chosen(context, HoldExposedEntry(context, &index));
+    const EntryHold chosen(context, HoldExposedEntry(context));
     if (!chosen || chosen->kind != QueueKindFrame) return;
     if ((chosen->flags & zcbExposeDone) != 0) CallExposeDone(context, queueHold, service, *chosen);
-    if (index == 0) ApplySettingsEarly(context, queueHold, service);
+    ApplySettingsEarly(context, queueHold, service, *chosen);
 }
 
 // ---- An image has arrived ----
@@ -232,7 +233,7 @@ void ServeImage(CameraContext& context, ZExImage* image, std::uint16_t status, b
     if (!entry) return;
     // Kept: a change that is the last entry stays. At the next image it is taken out as the entry
     // itself, dropped without being sent, and that image is dropped with it.
-    const EntryHold change(context, service.TakeChange(/*index=*/0, /*countMin=*/2));
+    const EntryHold change(context, service.TakeChange(/*frame=*/nullptr));
     *hasTaker = entry->kind == QueueKindFrame;
     if (*hasTaker) DeliverFrame(context, *entry, image, status);
     if (!change) return;

@@ -76,11 +76,10 @@ QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index) {
     return entry;
 }
 
-QueueEntry* HoldExposedEntry(CameraContext& context, std::uint32_t* index) {
+QueueEntry* HoldExposedEntry(CameraContext& context) {
     const std::lock_guard hold(context.queueMutex);
     if (context.queueCount == 0) return nullptr;
-    *index = FindExposedEntry(context);
-    QueueEntry* const entry = context.queue[*index];
+    QueueEntry* const entry = context.queue[FindExposedEntry(context)];
     ++entry->holdCount;
     return entry;
 }
@@ -91,10 +90,12 @@ QueueEntry* TakeFirstEntry(CameraContext& context) {
     return TakeEntryAt(context, 0);
 }
 
-QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index, std::uint32_t countMin,
+QueueEntry* TakeSettingsEntry(CameraContext& context, const QueueEntry* frame,
                               std::uint64_t* ticket) {
     const std::lock_guard hold(context.queueMutex);
-    if (context.queueCount < countMin || index >= context.queueCount) return nullptr;
+    const std::uint32_t index = frame != nullptr ? 1 : 0;
+    if (context.queueCount < 2) return nullptr;
+    if (frame != nullptr && context.queue[0] != frame) return nullptr;
     if (context.queue[index]->kind != QueueKindSettings) return nullptr;
     *ticket = ++context.changesTaken;
     return TakeEntryAt(context, index);

@@ -21,20 +21,22 @@ namespace ZV {
 /// The entry at `index`, held for the caller; null at or beyond the count.
 [[nodiscard]] QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index);
 
-/// The entry that an ended exposure belongs to, held for the caller, and its place: the first one,
-/// or the one behind it if the first has had its exposure callback already, with one settings
-/// change in between passed over. Null when the queue is empty.
-[[nodiscard]] QueueEntry* HoldExposedEntry(CameraContext& context, std::uint32_t* index);
+/// The entry that an ended exposure belongs to, held for the caller: the first one, or the one
+/// behind it if the first has had its exposure callback already, with one settings change in
+/// between passed over. Null when the queue is empty.
+[[nodiscard]] QueueEntry* HoldExposedEntry(CameraContext& context);
 
 /// Takes the entry at index 0 out and hands the queue's hold to the caller; null when the queue is
 /// empty.
 [[nodiscard]] QueueEntry* TakeFirstEntry(CameraContext& context);
 
-/// Takes the entry at `index` out if it is a settings change and the queue has at least `countMin`
-/// entries, and hands the queue's hold to the caller; else null, and the queue stays as it is.
-/// `*ticket`, which is guarded by queueMutex, receives its place among all changes taken, from 1.
-[[nodiscard]] QueueEntry* TakeSettingsEntry(CameraContext& context, std::uint32_t index,
-                                            std::uint32_t countMin, std::uint64_t* ticket);
+/// Takes the settings change behind `frame` out, or the first entry where `frame` is null, and
+/// hands the queue's hold to the caller. Null, and the queue stays as it is, when that entry is no
+/// settings change, when it is the last one and `frame` is null, and when `frame` is not, or no
+/// longer, the first entry. `*ticket`, which is guarded by queueMutex, receives the change's place
+/// among all that were taken, from 1.
+[[nodiscard]] QueueEntry* TakeSettingsEntry(CameraContext& context, const QueueEntry* frame,
+                                            std::uint64_t* ticket);
 
 /// Lets go of an entry. Null is ignored.
 void LetGoOfEntry(CameraContext& context, QueueEntry* entry);

@@ -63,8 +63,8 @@ void EventService::AwaitExposeDone(const QueueEntry& entry) {
     (void)WaitForLimit(context.serviceChanged, lock, ExposureLimitMs, isOver);  // kept: goes on
 }
 
-QueueEntry* EventService::TakeChange(std::uint32_t index, std::uint32_t countMin) {
-    return TakeSettingsEntry(context, index, countMin, &changeTicket);
+QueueEntry* EventService::TakeChange(const QueueEntry* frame) {
+    return TakeSettingsEntry(context, frame, &changeTicket);
 }
 
 /// Under queueMutex.

@@ -33,7 +33,7 @@ class EventService {
     /// Takes a settings change out of the queue as TakeSettingsEntry does. Changes are made, and
     /// their callbacks called, in the order in which they are taken, whichever thread takes them: a
     /// change is in hand until the service ends.
-    [[nodiscard]] QueueEntry* TakeChange(std::uint32_t index, std::uint32_t countMin);
+    [[nodiscard]] QueueEntry* TakeChange(const QueueEntry* frame);
     /// Waits until no other thread has an earlier change in hand.
     void AwaitEarlierChanges();
 

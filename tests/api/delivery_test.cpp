@@ -332,6 +332,36 @@ TEST_F(Delivery, AChangeTakenEarlyWaitsForTheOneBeforeItAndIsNotLost) {
     EXPECT_EQ(1u, CountQueued());
 }
 
+TEST_F(Delivery, AnExposureWhoseFrameHasBeenDeliveredLeavesTheNextFramesChangeAlone) {
+    constexpr std::uint32_t Frame0 = 0, Frame1 = 1, Change1 = 101;
+    ClientFrame second(ImageBytes);
+    SlowClient client;
+    const auto queueFrame = [&](Zentara_Frame* queued, std::uint32_t userData) {
+        ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, queued, SlowClient::Record,
+                                                 zcbExposeDone | zcbFrameDone, client.GetPrivate(),
+                                                 userData));
+    };
+    queueFrame(frame.Get(), Frame0);
+    queueFrame(second.Get(), Frame1);
+    ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, &settings, SlowClient::Record, zcbFrameDone,
+                                                client.GetPrivate(), Change1));
+
+    std::thread exposure([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return client.isInside.load(); }));
+    {
+        // Behind its callback the exposure waits for this lock.
+        const SemaphoreHold hold(*GetContext().queueLock);
+        client.mayGoOn = true;
+        ReceiveImage();
+    }
+    exposure.join();
+
+    EXPECT_EQ((std::vector<std::uint32_t>{Frame0, Frame0}), client.GetHeard());
+    EXPECT_EQ(2u, CountQueued());
+    EndExposure();
+    EXPECT_EQ((std::vector<std::uint32_t>{Frame0, Frame0, Frame1, Change1}), client.GetHeard());
+}
+
 TEST_F(Delivery, AnImageWithoutAQueuedFrameIsDropped) {
     ReceiveImage();
 

@@ -62,21 +62,49 @@ TEST_F(EntryQueue, AFullQueueIsTakenWholeInOrder) {
     EXPECT_EQ(nullptr, TakeFirstEntry(context));
 }
 
-TEST_F(EntryQueue, OnlyASettingsEntryIsTakenFromTheMiddle) {
+TEST_F(EntryQueue, OnlyTheSettingsEntryBehindTheFirstFrameIsTakenFromTheMiddle) {
     std::uint64_t ticket = 0;
     ASSERT_TRUE(Append(0));
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, context.queue[0], &ticket)) << "a lone frame";
     ASSERT_TRUE(Append(1, QueueKindSettings));
     ASSERT_TRUE(Append(2));
+    ASSERT_TRUE(Append(3, QueueKindSettings));
 
-    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 0, 2, &ticket));
-    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 1, 4, &ticket));
-    EXPECT_EQ(nullptr, TakeSettingsEntry(context, 3, 2, &ticket));
-    QueueEntry* const taken = TakeSettingsEntry(context, 1, 2, &ticket);
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, nullptr, &ticket)) << "the first is a frame";
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, context.queue[2], &ticket)) << "not the first";
+    QueueEntry* const taken = TakeSettingsEntry(context, context.queue[0], &ticket);
 
     ASSERT_NE(nullptr, taken);
     EXPECT_EQ(1u, taken->userData);
-    EXPECT_EQ((std::vector<std::uint32_t>{0, 2}), GetOrder());
+    EXPECT_EQ((std::vector<std::uint32_t>{0, 2, 3}), GetOrder());
     EXPECT_EQ(1u, ticket) << "one that is not taken gets no place";
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, context.queue[0], &ticket)) << "a frame follows";
+    LetGoOfEntry(context, taken);
+}
+
+TEST_F(EntryQueue, NoSettingsEntryIsTakenForAFrameThatHasLeft) {
+    std::uint64_t ticket = 0;
+    ASSERT_TRUE(Append(0));
+    ASSERT_TRUE(Append(1));
+    ASSERT_TRUE(Append(2, QueueKindSettings));
+    QueueEntry* const first = TakeFirstEntry(context);
+
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, first, &ticket));
+
+    EXPECT_EQ((std::vector<std::uint32_t>{1, 2}), GetOrder());
+    LetGoOfEntry(context, first);
+}
+
+TEST_F(EntryQueue, AFirstSettingsEntryIsTakenUnlessItIsTheLast) {
+    std::uint64_t ticket = 0;
+    ASSERT_TRUE(Append(0, QueueKindSettings));
+    EXPECT_EQ(nullptr, TakeSettingsEntry(context, nullptr, &ticket));
+    ASSERT_TRUE(Append(1));
+
+    QueueEntry* const taken = TakeSettingsEntry(context, nullptr, &ticket);
+
+    ASSERT_NE(nullptr, taken);
+    EXPECT_EQ((std::vector<std::uint32_t>{1}), GetOrder());
     LetGoOfEntry(context, taken);
 }
 
@@ -102,13 +130,12 @@ TEST_F(EntryQueue, AnIndexBeyondTheQueueHoldsNothing) {
 
 TEST_F(EntryQueue, AnExposureBelongsToTheFirstEntryThatHasNotHadItsCallback) {
     const auto find = [&] {
-        std::uint32_t index = 99;
-        LetGoOfEntry(context, HoldExposedEntry(context, &index));
-        return index;
+        QueueEntry* const entry = HoldExposedEntry(context);
+        const std::uint32_t number = entry->userData;
+        LetGoOfEntry(context, entry);
+        return number;
     };
-    std::uint32_t index = 99;
-    EXPECT_EQ(nullptr, HoldExposedEntry(context, &index));
-    EXPECT_EQ(99u, index);
+    EXPECT_EQ(nullptr, HoldExposedEntry(context));
 
     ASSERT_TRUE(Append(0));
     EXPECT_EQ(0u, find());
@@ -139,7 +166,9 @@ class SharedEntryQueue : public EntryQueue {
         taker = std::thread([this] {
             while (!isAppended || GetQueueCount(context) != 0) {
                 std::uint64_t ticket = 0;
-                Keep(changes, TakeSettingsEntry(context, 1, 2, &ticket));
+                QueueEntry* const first = HoldEntry(context, 0);
+                Keep(changes, TakeSettingsEntry(context, first, &ticket));
+                LetGoOfEntry(context, first);
                 Keep(firsts, TakeFirstEntry(context));
             }
         });

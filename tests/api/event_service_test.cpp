@@ -220,11 +220,11 @@ TEST_F(Services, ChangesAreMadeInTheOrderInWhichTheyWereTaken) {
     ASSERT_TRUE(AppendEntry(context, change));
     ASSERT_TRUE(AppendEntry(context, change));
     std::optional<EventService> earlier(std::in_place, context, EventService::Kind::Image);
-    LetGoOfEntry(context, earlier->TakeChange(1, 2));
+    LetGoOfEntry(context, earlier->TakeChange(context.queue[0]));
 
     Waiter later([&] {
         EventService service(context, EventService::Kind::Exposure);
-        QueueEntry* const taken = service.TakeChange(1, 2);
+        QueueEntry* const taken = service.TakeChange(context.queue[0]);
         EXPECT_NE(nullptr, taken) << "a change in hand elsewhere keeps none in the queue";
         service.AwaitEarlierChanges();
         LetGoOfEntry(context, taken);
@@ -244,8 +244,8 @@ TEST_F(Services, AChangeIsNotKeptFromBeingMadeByALaterOne) {
     ASSERT_TRUE(AppendEntry(context, change));
     EventService earlier(context, EventService::Kind::Exposure);
     EventService later(context, EventService::Kind::Image);
-    LetGoOfEntry(context, earlier.TakeChange(1, 2));
-    LetGoOfEntry(context, later.TakeChange(1, 2));
+    LetGoOfEntry(context, earlier.TakeChange(context.queue[0]));
+    LetGoOfEntry(context, later.TakeChange(context.queue[0]));
 
     Waiter waiter([&] { earlier.AwaitEarlierChanges(); });
 
