@@ -20,8 +20,7 @@
 // Hand-overs. Each of the two stands in the context's list of services while it works: a frame
 // callback waits there for the exposure callback of its frame, and an abort for what was begun
 // before it, so that no callback comes late. Changes of settings that the two take out of the queue
-// are made one after the other: ExposeDone leaves the next one in the queue while ImageReceived has
-// one in hand, and ImageReceived waits for ExposeDone.
+// are made one after the other: who has taken the later one waits for the earlier one.
 
 namespace ZV {
 
@@ -128,8 +127,8 @@ ZentaraResult MakeChange(EventService& service, const QueueEntry& change) {
 }
 
 /// Applies the settings change behind `frame`, whose pixels are still on the way, so that it is in
-/// force for the next exposure. An image that came meanwhile has seen to that change; the one that
-/// would be in its place then belongs to a later exposure.
+/// force for the next exposure. Behind an image that has taken the frame out meanwhile, the change
+/// in that place belongs to a later exposure.
 void ApplySettingsEarly(CameraContext& context, QueueHold& queueHold, EventService& service,
                         const QueueEntry& frame) {
     if (context.abortRequested != 0 || context.sendInProgress != 0) return;
@@ -150,10 +149,11 @@ void ServeExposure(CameraContext& context) {
         return;
     }
     EventService service(context, EventService::Kind::Exposure);
-    const EntryHold chosen(context, HoldExposedEntry(context));
+    bool isFirst = false;
+    const EntryHold chosen(context, HoldExposedEntry(context, &isFirst));
     if (!chosen || chosen->kind != QueueKindFrame) return;
     if ((chosen->flags & zcbExposeDone) != 0) CallExposeDone(context, queueHold, service, *chosen);
-    ApplySettingsEarly(context, queueHold, service, *chosen);
+    if (isFirst) ApplySettingsEarly(context, queueHold, service, *chosen);
 }
 
 // ---- An image has arrived ----

@@ -76,10 +76,12 @@ QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index) {
     return entry;
 }
 
-QueueEntry* HoldExposedEntry(CameraContext& context) {
+QueueEntry* HoldExposedEntry(CameraContext& context, bool* isFirst) {
     const std::lock_guard hold(context.queueMutex);
     if (context.queueCount == 0) return nullptr;
-    QueueEntry* const entry = context.queue[FindExposedEntry(context)];
+    const std::uint32_t index = FindExposedEntry(context);
+    *isFirst = index == 0;
+    QueueEntry* const entry = context.queue[index];
     ++entry->holdCount;
     return entry;
 }

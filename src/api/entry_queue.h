@@ -21,10 +21,10 @@ namespace ZV {
 /// The entry at `index`, held for the caller; null at or beyond the count.
 [[nodiscard]] QueueEntry* HoldEntry(CameraContext& context, std::uint32_t index);
 
-/// The entry that an ended exposure belongs to, held for the caller: the first one, or the one
-/// behind it if the first has had its exposure callback already, with one settings change in
-/// between passed over. Null when the queue is empty.
-[[nodiscard]] QueueEntry* HoldExposedEntry(CameraContext& context);
+/// The entry that an ended exposure belongs to, held for the caller: the first one, which
+/// `*isFirst` tells, or the one behind it if the first has had its exposure callback already, with
+/// one settings change in between passed over. Null when the queue is empty.
+[[nodiscard]] QueueEntry* HoldExposedEntry(CameraContext& context, bool* isFirst);
 
 /// Takes the entry at index 0 out and hands the queue's hold to the caller; null when the queue is
 /// empty.

@@ -362,6 +362,30 @@ TEST_F(Delivery, AnExposureWhoseFrameHasBeenDeliveredLeavesTheNextFramesChangeAl
     EXPECT_EQ((std::vector<std::uint32_t>{Frame0, Frame0, Frame1, Change1}), client.GetHeard());
 }
 
+TEST_F(Delivery, AnExposureOfASecondFrameLeavesItsChangeAloneWhenTheFrameBecomesTheFirst) {
+    constexpr std::uint32_t Frame1 = 1, Frame0 = 0, Change0 = 100;
+    ClientFrame second(ImageBytes);
+    SlowClient client;
+    const auto queueFrame = [&](Zentara_Frame* queued, std::uint32_t userData) {
+        ASSERT_ZERR(zerrNone, Zentara_QueueFrame(handle, queued, SlowClient::Record, zcbExposeDone,
+                                                 client.GetPrivate(), userData));
+    };
+    queueFrame(frame.Get(), Frame1);
+    queueFrame(second.Get(), Frame0);
+    ASSERT_ZERR(zerrNone, Zentara_QueueSettings(handle, &settings, SlowClient::Record, zcbFrameDone,
+                                                client.GetPrivate(), Change0));
+    EndExposure();
+
+    std::thread exposure([&] { EndExposure(); });
+    EXPECT_TRUE(WaitUntil([&] { return client.isInside.load(); }));
+    ReceiveImage();
+    client.mayGoOn = true;
+    exposure.join();
+
+    EXPECT_EQ((std::vector<std::uint32_t>{Frame1, Frame0}), client.GetHeard());
+    EXPECT_EQ(2u, CountQueued());
+}
+
 TEST_F(Delivery, AnImageWithoutAQueuedFrameIsDropped) {
     ReceiveImage();
 

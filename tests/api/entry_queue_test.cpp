@@ -130,12 +130,15 @@ TEST_F(EntryQueue, AnIndexBeyondTheQueueHoldsNothing) {
 
 TEST_F(EntryQueue, AnExposureBelongsToTheFirstEntryThatHasNotHadItsCallback) {
     const auto find = [&] {
-        QueueEntry* const entry = HoldExposedEntry(context);
+        bool isFirst = false;
+        QueueEntry* const entry = HoldExposedEntry(context, &isFirst);
         const std::uint32_t number = entry->userData;
+        EXPECT_EQ(number == 0, isFirst);
         LetGoOfEntry(context, entry);
         return number;
     };
-    EXPECT_EQ(nullptr, HoldExposedEntry(context));
+    bool isFirst = false;
+    EXPECT_EQ(nullptr, HoldExposedEntry(context, &isFirst));
 
     ASSERT_TRUE(Append(0));
     EXPECT_EQ(0u, find());
@@ -167,7 +170,7 @@ class SharedEntryQueue : public EntryQueue {
             while (!isAppended || GetQueueCount(context) != 0) {
                 std::uint64_t ticket = 0;
                 QueueEntry* const first = HoldEntry(context, 0);
-                Keep(changes, TakeSettingsEntry(context, first, &ticket));
+                if (first != nullptr) Keep(changes, TakeSettingsEntry(context, first, &ticket));
                 LetGoOfEntry(context, first);
                 Keep(firsts, TakeFirstEntry(context));
             }
