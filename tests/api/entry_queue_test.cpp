@@ -137,8 +137,9 @@ TEST_F(EntryQueue, AnExposureBelongsToTheFirstEntryThatHasNotHadItsCallback) {
         LetGoOfEntry(context, entry);
         return number;
     };
-    bool isFirst = false;
+    bool isFirst = true;
     EXPECT_EQ(nullptr, HoldExposedEntry(context, &isFirst));
+    EXPECT_TRUE(isFirst) << "an empty queue says nothing";
 
     ASSERT_TRUE(Append(0));
     EXPECT_EQ(0u, find());
